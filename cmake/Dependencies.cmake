@@ -1,0 +1,12 @@
+# The libraries that the products lean on; the Debian packages that bring them stand in packaging/packages.
+find_package(PkgConfig REQUIRED)
+pkg_check_modules(LUCENE REQUIRED IMPORTED_TARGET GLOBAL liblucene++)
+pkg_check_modules(JSONCPP REQUIRED IMPORTED_TARGET GLOBAL jsoncpp)
+find_package(ZLIB REQUIRED)
+find_package(Boost 1.74 REQUIRED COMPONENTS filesystem system thread)
+find_package(Threads REQUIRED)
+
+# The index library and what its headers pull in, as system headers: their warnings are not ours.
+add_library(quorelastic_lucene INTERFACE)
+target_include_directories(quorelastic_lucene SYSTEM INTERFACE ${LUCENE_INCLUDE_DIRS})
+target_link_libraries(quorelastic_lucene INTERFACE PkgConfig::LUCENE Boost::filesystem Boost::system Boost::thread)

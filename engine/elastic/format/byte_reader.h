@@ -1,0 +1,75 @@
+#pragma once
+
+#include <cstddef>
+#include <cstdint>
+#include <memory>
+#include <span>
+#include <string>
+#include <vector>
+
+#include "elastic/format/byte_source.h"
+
+namespace vantrel::elastic::format {
+
+// A buffered cursor over a byte source that decodes the primitives of index files:
+//
+//   Int    4 bytes, big-endian, signed          VInt   1 to 5 bytes, 7 bits each, lowest first, high bit =
+//   more Long   8 bytes, big-endian, signed          VLong  1 to 9 bytes, the same String VInt length in
+//   bytes, then UTF-8
+//
+// Every read is checked against the end of the source. What lies beyond it, or does not fit its type, is
+// reported by IndexDamagedError at the offset where the value begins. For one thread at a time.
+class ByteReader {
+ public:
+  static constexpr size_t kDefaultBufferSize = size_t{16} << 10;
+
+  // The buffer is allocated by the first read, and never larger than the source.
+  explicit ByteReader(std::shared_ptr<const ByteSource> source, size_t buffer_size = kDefaultBufferSize);
+
+  const std::string& name() const { return source_->name(); }
+  uint64_t size() const { return source_->size(); }
+  uint64_t offset() const { return buffer_start_ + position_; }
+  uint64_t remaining() const { return size() - offset(); }
+
+  // Moves to `offset`, which may be the end but not past it.
+  void Seek(uint64_t offset);
+  void Skip(uint64_t count);
+
+  uint8_t ReadByte() {
+    if (position_ == filled_) Refill(1);
+    return buffer_[position_++];
+  }
+  int32_t ReadInt();
+  int64_t ReadLong();
+
+  uint32_t ReadVInt() {
+    if (position_ < filled_ && buffer_[position_] < 0x80) return buffer_[position_++];
+    return ReadLongVInt();
+  }
+  uint64_t ReadVLong() {
+    if (position_ < filled_ && buffer_[position_] < 0x80) return buffer_[position_++];
+    return ReadLongVLong();
+  }
+
+  void ReadBytes(std::span<uint8_t> out);
+
+  // A string; throws also when it is not valid UTF-8.
+  std::string ReadString();
+
+  // Throws IndexDamagedError about this source.
+  [[noreturn]] void Damaged(uint64_t offset, const std::string& problem) const;
+
+ private:
+  uint32_t ReadLongVInt();
+  uint64_t ReadLongVLong();
+  void Refill(uint64_t wanted);
+
+  std::shared_ptr<const ByteSource> source_;
+  size_t buffer_size_;
+  std::vector<uint8_t> buffer_;
+  uint64_t buffer_start_ = 0;  // offset in the source of buffer_[0]
+  size_t position_ = 0;        // next byte in buffer_
+  size_t filled_ = 0;          // valid bytes in buffer_
+};
+
+}  // namespace vantrel::elastic::format

@@ -1,0 +1,192 @@
+#include "elastic/format/commit.h"
+
+#include <zlib.h>
+
+#include <algorithm>
+#include <exception>
+#include <optional>
+#include <utility>
+
+#include "elastic/format/byte_reader.h"
+#include "elastic/format/file_names.h"
+#include "vantrel/elastic/index_error.h"
+
+namespace vantrel::elastic::format {
+namespace {
+
+// Format numbers, each named after what it brought.
+constexpr int32_t kWithGenerations = -2;
+constexpr int32_t kWithSingleNorms = -3;
+constexpr int32_t kWithSharedStores = -4;
+constexpr int32_t kWithChecksum = -5;
+constexpr int32_t kWithDeletionCount = -6;
+constexpr int32_t kWithHasPositions = -7;
+constexpr int32_t kWithUserData = -8;
+constexpr int32_t kWithDiagnostics = -9;
+
+void SkipString(ByteReader& reader) { reader.Skip(reader.ReadVInt()); }
+
+void SkipStringMap(ByteReader& reader) {
+  for (int32_t left = reader.ReadInt(); left > 0; --left) {
+    SkipString(reader);
+    SkipString(reader);
+  }
+}
+
+void SkipNormGenerations(ByteReader& reader) {
+  const uint64_t start = reader.offset();
+  const int32_t count = reader.ReadInt();
+  if (count < -1) reader.Damaged(start, "count of norm generations is " + std::to_string(count));
+  if (count > 0) reader.Skip(static_cast<uint64_t>(count) * 8);
+}
+
+SegmentInfo::Compound ReadCompound(ByteReader& reader) {
+  const uint8_t value = reader.ReadByte();
+  if (value == 1) return SegmentInfo::Compound::kYes;
+  return value == 0xff ? SegmentInfo::Compound::kNo : SegmentInfo::Compound::kLookForFile;
+}
+
+std::string ReadSegmentName(ByteReader& reader) {
+  const uint64_t start = reader.offset();
+  std::string name = reader.ReadString();
+  if (!IsSegmentName(name)) reader.Damaged(start, "segment name is not '_' and a number in base 36");
+  return name;
+}
+
+SegmentInfo ReadSegment(ByteReader& reader, int32_t format) {
+  SegmentInfo segment;
+  segment.name = ReadSegmentName(reader);
+  const uint64_t count_start = reader.offset();
+  segment.document_count = reader.ReadInt();
+  if (segment.document_count < 0) {
+    reader.Damaged(count_start, "document count is " + std::to_string(segment.document_count));
+  }
+  if (format > kWithGenerations) {
+    segment.deletions_generation = SegmentInfo::kLookForDeletions;
+    return segment;
+  }
+  const uint64_t generation_start = reader.offset();
+  segment.deletions_generation = reader.ReadLong();
+  if (segment.deletions_generation < SegmentInfo::kNoDeletions) {
+    reader.Damaged(generation_start,
+                   "generation of deletions is " + std::to_string(segment.deletions_generation));
+  }
+  if (format <= kWithSharedStores && reader.ReadInt() != -1) {
+    ReadSegmentName(reader);
+    reader.ReadByte();
+  }
+  if (format <= kWithSingleNorms) reader.ReadByte();
+  SkipNormGenerations(reader);
+  segment.compound = ReadCompound(reader);
+  if (format <= kWithDeletionCount) reader.ReadInt();
+  if (format <= kWithHasPositions) reader.ReadByte();
+  if (format <= kWithDiagnostics) SkipStringMap(reader);
+  return segment;
+}
+
+void SkipUserData(ByteReader& reader, int32_t format) {
+  if (format <= kWithDiagnostics) {
+    SkipStringMap(reader);
+  } else if (format == kWithUserData && reader.ReadByte() != 0) {
+    SkipString(reader);
+  }
+}
+
+void CheckChecksum(const ByteSource& source, ByteReader& reader) {
+  const uint64_t end = reader.offset();
+  uLong checksum = crc32(0, nullptr, 0);
+  std::vector<uint8_t> piece(ByteReader::kDefaultBufferSize);
+  for (uint64_t offset = 0; offset < end;) {
+    const auto length = static_cast<size_t>(std::min<uint64_t>(piece.size(), end - offset));
+    source.ReadAt(offset, std::span(piece.data(), length));
+    checksum = crc32(checksum, piece.data(), static_cast<uInt>(length));
+    offset += length;
+  }
+  const auto expected = static_cast<uint64_t>(reader.ReadLong());
+  if (expected != checksum) {
+    reader.Damaged(
+        end, "checksum is " + std::to_string(checksum) + ", but the file says " + std::to_string(expected));
+  }
+}
+
+// The newest generation in the folder, -1 without any.
+int64_t ListedGeneration(const Folder& folder) {
+  int64_t newest = -1;
+  for (const std::string& name : folder.List()) {
+    if (!name.starts_with(kSegments) || name == kSegmentsGen) continue;
+    const std::optional<int64_t> generation = CommitGeneration(name);
+    if (!generation.has_value()) {
+      throw IndexError(folder.path() + "/" + name, "name stands for a commit, but holds no generation");
+    }
+    newest = std::max(newest, *generation);
+  }
+  return newest;
+}
+
+// What segments.gen says, -1 where it is missing, torn or unreadable: it is but a hint.
+//   Int -2, Long generation, Long the same generation
+int64_t HintedGeneration(const Folder& folder) {
+  try {
+    ByteReader reader(folder.Open(std::string(kSegmentsGen)));
+    if (reader.ReadInt() != kWithGenerations) return -1;
+    const int64_t first = reader.ReadLong();
+    return first == reader.ReadLong() ? first : -1;
+  } catch (const IndexError&) {
+    return -1;
+  }
+}
+
+int64_t NewestGeneration(const Folder& folder) {
+  return std::max(ListedGeneration(folder), HintedGeneration(folder));
+}
+
+}  // namespace
+
+Commit ReadCommit(std::shared_ptr<const ByteSource> source, int64_t generation) {
+  ByteReader reader(source);
+  Commit commit;
+  commit.generation = generation;
+  int32_t format = reader.ReadInt();
+  if (format < kWithDiagnostics) {
+    reader.Damaged(0, "format is " + std::to_string(format) + ", but -9 is the newest known");
+  }
+  if (format < 0) {
+    reader.ReadLong();
+    reader.ReadInt();
+  }
+  const uint64_t count_start = reader.offset();
+  const int32_t count = reader.ReadInt();
+  if (count < 0) reader.Damaged(count_start, "segment count is " + std::to_string(count));
+  for (int32_t i = 0; i < count; ++i) commit.segments.push_back(ReadSegment(reader, format));
+  if (format < 0) SkipUserData(reader, format);
+  if (format <= kWithChecksum) CheckChecksum(*source, reader);
+  return commit;
+}
+
+void UseNewestCommit(const Folder& folder, const std::function<void(Commit)>& use) {
+  const auto use_generation = [&](int64_t generation) {
+    use(ReadCommit(folder.Open(CommitFileName(generation)), generation));
+  };
+  int64_t generation = NewestGeneration(folder);
+  if (generation < 0) throw IndexError(folder.path(), "no index in this folder: it holds no segments file");
+  for (;;) {
+    std::exception_ptr failure;
+    try {
+      return use_generation(generation);
+    } catch (const IndexError&) {
+      failure = std::current_exception();
+    }
+    if (generation > 1 && folder.Exists(CommitFileName(generation - 1))) {
+      try {
+        return use_generation(generation - 1);
+      } catch (const IndexError&) {
+        // The newer commit's failure says more.
+      }
+    }
+    const int64_t newest = NewestGeneration(folder);
+    if (newest <= generation) std::rethrow_exception(failure);
+    generation = newest;
+  }
+}
+
+}  // namespace vantrel::elastic::format

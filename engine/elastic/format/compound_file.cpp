@@ -1,0 +1,56 @@
+#include "elastic/format/compound_file.h"
+
+#include <utility>
+
+#include "elastic/format/byte_reader.h"
+#include "vantrel/elastic/index_error.h"
+
+namespace vantrel::elastic::format {
+namespace {
+
+class PartSource : public ByteSource {
+ public:
+  PartSource(std::shared_ptr<const ByteSource> whole, const std::string& name, uint64_t offset, uint64_t size)
+      : whole_(std::move(whole)), name_(whole_->name() + " (" + name + ")"), offset_(offset), size_(size) {}
+
+  const std::string& name() const override { return name_; }
+  uint64_t size() const override { return size_; }
+  void ReadAt(uint64_t offset, std::span<uint8_t> out) const override {
+    whole_->ReadAt(offset_ + offset, out);
+  }
+
+ private:
+  std::shared_ptr<const ByteSource> whole_;
+  std::string name_;
+  uint64_t offset_;
+  uint64_t size_;
+};
+
+}  // namespace
+
+CompoundFile::CompoundFile(std::shared_ptr<const ByteSource> source) : source_(std::move(source)) {
+  ByteReader reader(source_);
+  Part* last = nullptr;
+  uint64_t last_offset = 0;
+  for (uint32_t left = reader.ReadVInt(); left > 0; --left) {
+    const uint64_t start = reader.offset();
+    const int64_t offset = reader.ReadLong();
+    if (offset < 0 || static_cast<uint64_t>(offset) > reader.size() ||
+        static_cast<uint64_t>(offset) < last_offset) {
+      reader.Damaged(start, "sub-file begins at " + std::to_string(offset) + ", but must lie between " +
+                                std::to_string(last_offset) + " and " + std::to_string(reader.size()));
+    }
+    if (last != nullptr) last->size = static_cast<uint64_t>(offset) - last->offset;
+    last_offset = static_cast<uint64_t>(offset);
+    last = &parts_.insert_or_assign(reader.ReadString(), Part{last_offset, 0}).first->second;
+  }
+  if (last != nullptr) last->size = reader.size() - last->offset;
+}
+
+std::shared_ptr<const ByteSource> CompoundFile::Open(const std::string& name) const {
+  const auto part = parts_.find(name);
+  if (part == parts_.end()) throw IndexError(source_->name(), "compound file holds no '" + name + "'");
+  return std::make_shared<PartSource>(source_, name, part->second.offset, part->second.size);
+}
+
+}  // namespace vantrel::elastic::format

@@ -1,0 +1,47 @@
+#include "elastic/format/file_names.h"
+
+#include <algorithm>
+#include <array>
+#include <charconv>
+
+namespace vantrel::elastic::format {
+namespace {
+
+constexpr int kBase = 36;
+
+bool IsBase36(std::string_view text) {
+  return !text.empty() && std::all_of(text.begin(), text.end(), [](char c) {
+    return (c >= '0' && c <= '9') || (c >= 'a' && c <= 'z');
+  });
+}
+
+std::string ToBase36(int64_t number) {
+  std::array<char, 16> digits{};
+  const auto end = std::to_chars(digits.data(), digits.data() + digits.size(), number, kBase).ptr;
+  return {digits.data(), end};
+}
+
+}  // namespace
+
+std::optional<int64_t> CommitGeneration(std::string_view name) {
+  if (name == kSegments) return 0;
+  if (!name.starts_with(kSegments) || name.substr(kSegments.size(), 1) != "_") return std::nullopt;
+  const std::string_view digits = name.substr(kSegments.size() + 1);
+  int64_t generation = 0;
+  if (!IsBase36(digits)) return std::nullopt;
+  const auto [end, error] = std::from_chars(digits.begin(), digits.end(), generation, kBase);
+  if (error != std::errc() || end != digits.end()) return std::nullopt;
+  return generation;
+}
+
+std::string CommitFileName(int64_t generation) {
+  return generation == 0 ? std::string(kSegments) : std::string(kSegments) + "_" + ToBase36(generation);
+}
+
+bool IsSegmentName(std::string_view name) { return name.starts_with('_') && IsBase36(name.substr(1)); }
+
+std::string DeletionsFileName(const std::string& segment, int64_t generation) {
+  return generation == 0 ? segment + ".del" : segment + "_" + ToBase36(generation) + ".del";
+}
+
+}  // namespace vantrel::elastic::format

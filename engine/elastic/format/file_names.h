@@ -1,0 +1,31 @@
+#pragma once
+
+#include <cstdint>
+#include <optional>
+#include <string>
+#include <string_view>
+
+namespace vantrel::elastic::format {
+
+// File names of an index. A generation stands in a name in base 36, lower case:
+//
+//   segments          a commit of generation 0 (the oldest layout)
+//   segments_N        a commit of generation N, 1 or more
+//   segments.gen      a hint at the newest generation
+//   _S.ext            a file of segment _S, where S is a number in base 36
+//   _S_N.del          the deleted documents of segment _S, generation N
+inline constexpr std::string_view kSegments = "segments";
+inline constexpr std::string_view kSegmentsGen = "segments.gen";
+
+// The generation of a commit's file; nothing when `name` is no such name.
+std::optional<int64_t> CommitGeneration(std::string_view name);
+
+std::string CommitFileName(int64_t generation);
+
+// "_" and a number in base 36: what may stand for a segment in a path without leaving the folder.
+bool IsSegmentName(std::string_view name);
+
+// Generation 0 names the file without a generation.
+std::string DeletionsFileName(const std::string& segment, int64_t generation);
+
+}  // namespace vantrel::elastic::format

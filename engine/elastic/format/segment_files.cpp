@@ -1,0 +1,46 @@
+#include "elastic/format/segment_files.h"
+
+#include <optional>
+#include <utility>
+
+#include "elastic/format/compound_file.h"
+#include "elastic/format/file_names.h"
+
+namespace vantrel::elastic::format {
+namespace {
+
+bool IsCompound(const Folder& folder, const SegmentInfo& info, const std::string& compound_name) {
+  if (info.compound == SegmentInfo::Compound::kLookForFile) return folder.Exists(compound_name);
+  return info.compound == SegmentInfo::Compound::kYes;
+}
+
+bool HasDeletions(const Folder& folder, const SegmentInfo& info, const std::string& deletions_name) {
+  if (info.deletions_generation == SegmentInfo::kLookForDeletions) return folder.Exists(deletions_name);
+  return info.deletions_generation != SegmentInfo::kNoDeletions;
+}
+
+}  // namespace
+
+SegmentFiles OpenSegment(const Folder& folder, SegmentInfo info) {
+  const std::string compound_name = info.name + ".cfs";
+  std::optional<CompoundFile> compound;
+  if (IsCompound(folder, info, compound_name)) compound.emplace(folder.Open(compound_name));
+  const auto open = [&](const char* extension) {
+    const std::string name = info.name + extension;
+    return compound.has_value() ? compound->Open(name) : folder.Open(name);
+  };
+
+  SegmentFiles files;
+  files.field_infos = open(".fnm");
+  files.terms = open(".tis");
+  files.terms_index = open(".tii");
+  const std::string deletions_name = DeletionsFileName(info.name, info.deletions_generation);
+  if (HasDeletions(folder, info, deletions_name)) {
+    files.postings = open(".frq");
+    files.deletions = folder.Open(deletions_name);  // never within the compound file
+  }
+  files.info = std::move(info);
+  return files;
+}
+
+}  // namespace vantrel::elastic::format

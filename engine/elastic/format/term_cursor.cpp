@@ -1,0 +1,136 @@
+#include "elastic/format/term_cursor.h"
+
+#include <limits>
+#include <utility>
+
+#include "elastic/format/text.h"
+#include "elastic/format/utf16_text.h"
+
+namespace vantrel::elastic::format {
+namespace {
+
+// Format numbers, each named after what it brought.
+constexpr int32_t kWithFormat = -1;
+constexpr int32_t kWithSkipLevels = -3;
+constexpr int32_t kWithUtf8 = -4;
+
+constexpr int32_t kNeverSkips = std::numeric_limits<int32_t>::max();
+constexpr size_t kBufferSize = size_t{64} << 10;
+
+}  // namespace
+
+TermCursor::TermCursor(std::shared_ptr<const ByteSource> source, File file, uint32_t field_count,
+                       int32_t document_count)
+    : reader_(std::move(source), kBufferSize),
+      file_(file),
+      field_count_(field_count),
+      document_count_(document_count) {
+  ReadHeader();
+}
+
+void TermCursor::ReadHeader() {
+  const int32_t first = reader_.ReadInt();
+  if (first < kWithUtf8) {
+    reader_.Damaged(0, "format is " + std::to_string(first) + ", but -4 is the newest known");
+  }
+  format_ = first < 0 ? first : 0;
+  const uint64_t count_start = first < 0 ? reader_.offset() : 0;
+  const int64_t count = first < 0 ? reader_.ReadLong() : first;
+  index_interval_ = 128;
+  skip_interval_ = kNeverSkips;
+  const uint64_t intervals_start = reader_.offset();
+  if (format_ < kWithFormat || (format_ == kWithFormat && file_ == File::kDictionary)) {
+    index_interval_ = reader_.ReadInt();
+    skip_interval_ = reader_.ReadInt();
+  }
+  if (format_ <= kWithSkipLevels) reader_.ReadInt();
+  if (index_interval_ <= 0 || skip_interval_ <= 0) {
+    reader_.Damaged(intervals_start, "index interval " + std::to_string(index_interval_) +
+                                         " and skip interval " + std::to_string(skip_interval_) +
+                                         " must both be above 0");
+  }
+  // Each term takes a byte at least for each of its numbers.
+  const uint64_t shortest_term = file_ == File::kIndex ? 7 : 6;
+  if (count < 0 || static_cast<uint64_t>(count) > reader_.remaining() / shortest_term) {
+    reader_.Damaged(count_start, "term count " + std::to_string(count) + " does not fit a file of " +
+                                     std::to_string(reader_.size()) + " bytes");
+  }
+  count_ = static_cast<uint64_t>(count);
+}
+
+bool TermCursor::Next() {
+  term_offset_ = reader_.offset();
+  if (walked_ == count_) {
+    if (reader_.remaining() == 0) return false;
+    Damaged("terms end here, but the file goes on to " + std::to_string(reader_.size()));
+  }
+  format_ == kWithUtf8 ? ReadUtf8Text() : ReadUtf16Text();
+  ReadField();
+  ReadInfo();
+  if (file_ == File::kIndex) dictionary_pointer_ = Advanced(dictionary_pointer_);
+  ++walked_;
+  return true;
+}
+
+void TermCursor::ReadUtf8Text() {
+  const uint32_t prefix = reader_.ReadVInt();
+  const uint32_t suffix = reader_.ReadVInt();
+  if (prefix > text_.size()) {
+    Damaged("term shares " + std::to_string(prefix) + " bytes with one of " + std::to_string(text_.size()));
+  }
+  if (suffix > reader_.remaining()) {
+    Damaged("term of " + std::to_string(suffix) + " bytes reaches past the end of the file at " +
+            std::to_string(reader_.size()));
+  }
+  text_.resize(size_t{prefix} + suffix);
+  reader_.ReadBytes(std::span(reinterpret_cast<uint8_t*>(text_.data()) + prefix, suffix));
+}
+
+void TermCursor::ReadUtf16Text() {
+  const uint32_t prefix = reader_.ReadVInt();
+  const uint32_t suffix = reader_.ReadVInt();
+  if (prefix > units_.size()) {
+    Damaged("term shares " + std::to_string(prefix) + " characters with one of " +
+            std::to_string(units_.size()));
+  }
+  units_.resize(prefix);
+  ReadUtf16Units(reader_, suffix, units_);
+  text_ = FromUtf16(units_);
+}
+
+void TermCursor::ReadField() {
+  field_ = static_cast<int32_t>(reader_.ReadVInt());
+  if (field_ >= 0 && static_cast<uint32_t>(field_) < field_count_) return;
+  if (field_ == -1 && file_ == File::kIndex && walked_ == 0) return;
+  Damaged("term bears field number " + std::to_string(field_) + " of " + std::to_string(field_count_));
+}
+
+void TermCursor::ReadInfo() {
+  info_.document_frequency = static_cast<int32_t>(reader_.ReadVInt());
+  // The index's first entry stands before all terms and has no documents.
+  const int32_t fewest = file_ == File::kIndex && walked_ == 0 ? 0 : 1;
+  if (info_.document_frequency < fewest || info_.document_frequency > document_count_) {
+    Damaged("term is in " + std::to_string(info_.document_frequency) + " documents of " +
+            std::to_string(document_count_));
+  }
+  info_.postings_pointer = Advanced(info_.postings_pointer);
+  info_.positions_pointer = Advanced(info_.positions_pointer);
+  info_.skip_offset = HasSkipOffset() ? reader_.ReadVInt() : 0;
+}
+
+bool TermCursor::HasSkipOffset() const {
+  if (format_ != kWithFormat) return info_.document_frequency >= skip_interval_;
+  // That layout's skip data is of no use any more, but its offset stands in the dictionary.
+  return file_ == File::kDictionary && info_.document_frequency > skip_interval_;
+}
+
+uint64_t TermCursor::Advanced(uint64_t pointer) {
+  const uint64_t delta = reader_.ReadVLong();
+  if (delta > static_cast<uint64_t>(std::numeric_limits<int64_t>::max()) - pointer) {
+    Damaged("pointer " + std::to_string(pointer) + " plus " + std::to_string(delta) +
+            " does not fit 63 bits");
+  }
+  return pointer + delta;
+}
+
+}  // namespace vantrel::elastic::format

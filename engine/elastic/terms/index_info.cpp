@@ -1,0 +1,76 @@
+#include "vantrel/elastic/index_info.h"
+
+#include <limits>
+#include <stdexcept>
+#include <utility>
+
+#include "elastic/format/commit.h"
+#include "elastic/format/segment_files.h"
+#include "elastic/format/term_cursor.h"
+#include "elastic/terms/term_walk.h"
+
+namespace vantrel::elastic {
+namespace {
+
+constexpr uint64_t kSuggestBudget = uint64_t{64} << 20;
+
+// A loaded index term: its two objects, their reference counts and pointers, and four bytes a character.
+constexpr uint64_t kBytesPerTerm = 256;
+constexpr uint64_t kBytesPerCharacter = 4;
+
+struct TermsIndexSize {
+  uint64_t terms;
+  uint64_t bytes;
+};
+
+TermsIndexSize SizeOf(const format::SegmentFiles& files) {
+  const format::TermCursor cursor(files.terms_index, format::TermCursor::File::kIndex,
+                                  std::numeric_limits<int32_t>::max(), files.info.document_count);
+  return {cursor.count(), files.terms_index->size()};
+}
+
+uint64_t LoadedBytes(const TermsIndexSize& size, uint64_t divisor) {
+  const uint64_t loaded = (size.terms + divisor - 1) / divisor;
+  return loaded * kBytesPerTerm + size.bytes / divisor * kBytesPerCharacter;
+}
+
+}  // namespace
+
+IndexInfo::IndexInfo(const std::string& path) : path_(path) {}
+
+IndexInfo::~IndexInfo() = default;
+
+void IndexInfo::initialize() {
+  const format::DiskFolder folder(path_);
+  format::UseNewestCommit(folder, [&](format::Commit commit) {
+    segments_.clear();
+    for (format::SegmentInfo& segment : commit.segments) {
+      segments_.push_back(format::OpenSegment(folder, std::move(segment)));
+    }
+  });
+}
+
+int IndexInfo::GetSegmentNum() const { return static_cast<int>(segments_.size()); }
+
+std::shared_ptr<TermDict> IndexInfo::GetTermDict(int segment, bool live_only) const {
+  if (segment < 0 || segment >= GetSegmentNum()) {
+    throw std::out_of_range("segment " + std::to_string(segment) + " of " + std::to_string(GetSegmentNum()));
+  }
+  return std::make_shared<TermDict>(
+      std::make_unique<TermWalk>(segments_[static_cast<size_t>(segment)], live_only));
+}
+
+int IndexInfo::GetSuggestDivisor() const {
+  std::vector<TermsIndexSize> sizes;
+  sizes.reserve(segments_.size());
+  for (const format::SegmentFiles& files : segments_) sizes.push_back(SizeOf(files));
+  constexpr int kLargest = 1 << 30;
+  for (int divisor = 1; divisor < kLargest; divisor *= 2) {
+    uint64_t total = 0;
+    for (const TermsIndexSize& size : sizes) total += LoadedBytes(size, static_cast<uint64_t>(divisor));
+    if (total < kSuggestBudget) return divisor;
+  }
+  return kLargest;
+}
+
+}  // namespace vantrel::elastic

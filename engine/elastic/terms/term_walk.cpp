@@ -1,0 +1,82 @@
+#include "elastic/terms/term_walk.h"
+
+#include <lucene++/LuceneHeaders.h>
+
+#include <utility>
+
+#include "elastic/format/text.h"
+
+namespace vantrel::elastic {
+
+LiveTermFilter::LiveTermFilter(const format::SegmentFiles& files)
+    : deletions_(files.deletions, files.info.document_count),
+      postings_(files.postings, files.info.document_count) {}
+
+bool LiveTermFilter::IsLive(const format::TermInfo& term, bool omits_frequencies) {
+  // Not all of them can be deleted: most terms are settled here, without a look at their postings.
+  if (term.document_frequency > deletions_.count()) return true;
+  postings_.Seek(term, omits_frequencies);
+  while (postings_.Next()) {
+    if (!deletions_.Contains(postings_.document())) return true;
+  }
+  return false;
+}
+
+TermWalk::TermWalk(format::SegmentFiles files, bool live_only)
+    : files_(std::move(files)), fields_(format::ReadFieldInfos(files_.field_infos)), cursor_(OpenCursor()) {
+  if (live_only && files_.deletions != nullptr) {
+    live_filter_.emplace(files_);
+  } else {
+    count_ = cursor_.count();
+  }
+}
+
+format::TermCursor TermWalk::OpenCursor() const {
+  return format::TermCursor(files_.terms, format::TermCursor::File::kDictionary,
+                            static_cast<uint32_t>(fields_.size()), files_.info.document_count);
+}
+
+bool TermWalk::IsWanted(const format::TermCursor& cursor) {
+  return !live_filter_.has_value() ||
+         live_filter_->IsLive(cursor.info(), fields_[static_cast<size_t>(cursor.field())].omits_frequencies);
+}
+
+uint64_t TermWalk::Count() {
+  if (!count_.has_value()) {
+    uint64_t live = 0;
+    for (format::TermCursor cursor = OpenCursor(); cursor.Next();) {
+      if (IsWanted(cursor)) ++live;
+    }
+    count_ = live;
+  }
+  return *count_;
+}
+
+bool TermWalk::Next() {
+  at_term_ = false;
+  while (cursor_.Next()) {
+    if (IsWanted(cursor_)) {
+      at_term_ = true;
+      break;
+    }
+  }
+  return at_term_;
+}
+
+const std::wstring& TermWalk::WideFieldName(int32_t field) {
+  if (field != wide_field_number_) {
+    wide_field_number_ = field;
+    wide_field_.clear();
+    format::AppendCodePoints(fields_[static_cast<size_t>(field)].name, wide_field_);
+  }
+  return wide_field_;
+}
+
+Lucene::TermPtr TermWalk::Term() {
+  if (!at_term_) return {};
+  wide_text_.clear();
+  if (!format::AppendCodePoints(cursor_.text(), wide_text_)) cursor_.Damaged("term is not valid UTF-8");
+  return Lucene::newLucene<Lucene::Term>(WideFieldName(cursor_.field()), wide_text_);
+}
+
+}  // namespace vantrel::elastic

@@ -1,0 +1,59 @@
+#pragma once
+
+#include <lucene++/Lucene.h>
+
+#include <memory>
+#include <optional>
+#include <string>
+#include <vector>
+
+#include "elastic/format/deletions.h"
+#include "elastic/format/field_infos.h"
+#include "elastic/format/postings.h"
+#include "elastic/format/segment_files.h"
+#include "elastic/format/term_cursor.h"
+
+namespace vantrel::elastic {
+
+// Tells whether a term still has a document that is not deleted.
+class LiveTermFilter {
+ public:
+  explicit LiveTermFilter(const format::SegmentFiles& files);
+
+  bool IsLive(const format::TermInfo& term, bool omits_frequencies);
+
+ private:
+  format::Deletions deletions_;
+  format::PostingsReader postings_;
+};
+
+// What stands behind a TermDict: one pass over a segment's dictionary, all terms or the live ones only.
+class TermWalk {
+ public:
+  TermWalk(format::SegmentFiles files, bool live_only);
+
+  const std::string& segment_name() const { return files_.info.name; }
+
+  // The number of terms from first to last; counted by a pass of its own where the header does not tell.
+  uint64_t Count();
+
+  bool Next();
+  Lucene::TermPtr Term();
+
+ private:
+  format::TermCursor OpenCursor() const;
+  bool IsWanted(const format::TermCursor& cursor);
+  const std::wstring& WideFieldName(int32_t field);
+
+  format::SegmentFiles files_;
+  std::vector<format::FieldInfo> fields_;
+  format::TermCursor cursor_;
+  std::optional<LiveTermFilter> live_filter_;
+  std::optional<uint64_t> count_;
+  bool at_term_ = false;
+  std::wstring wide_text_;
+  int32_t wide_field_number_ = -1;
+  std::wstring wide_field_;
+};
+
+}  // namespace vantrel::elastic

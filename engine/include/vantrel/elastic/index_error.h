@@ -1,0 +1,49 @@
+#pragma once
+
+#include <cstdint>
+#include <stdexcept>
+#include <string>
+
+#include "vantrel/elastic/export.h"
+
+namespace vantrel::elastic {
+
+// What the engine throws when an index cannot be used. what() is one line that begins with the path it is
+// about, so that it can be shown to an administrator as it is. Paths are the bytes of the file system.
+class VANTREL_ELASTIC_EXPORT IndexError : public std::runtime_error {
+ public:
+  IndexError(const std::string& path, const std::string& problem);
+
+  // The file or folder in question.
+  const std::string& path() const { return path_; }
+
+ private:
+  std::string path_;
+};
+
+// The operating system refused: the file is missing, unreadable, of the wrong kind, or the medium failed.
+class VANTREL_ELASTIC_EXPORT IndexIoError : public IndexError {
+ public:
+  // `problem` says what could not be done; the text of `error_number` (an errno value) is added to it.
+  IndexIoError(const std::string& path, const std::string& problem, int error_number);
+
+  int error_number() const { return error_number_; }
+
+ private:
+  int error_number_;
+};
+
+// The bytes of an index file contradict its format.
+class VANTREL_ELASTIC_EXPORT IndexDamagedError : public IndexError {
+ public:
+  IndexDamagedError(const std::string& path, uint64_t offset, const std::string& problem);
+
+  // Where in the file the offending value begins, in bytes. Within a compound file, path() names the
+  // sub-file in parentheses and the offset counts from the sub-file's first byte.
+  uint64_t offset() const { return offset_; }
+
+ private:
+  uint64_t offset_;
+};
+
+}  // namespace vantrel::elastic
