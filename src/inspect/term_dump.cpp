@@ -6,45 +6,31 @@
 #include <iostream>
 #include <memory>
 
+#include "inspect/utf8_text.h"
 #include "option_set.h"
 #include "vantrel/elastic/class_init.h"
 #include "vantrel/elastic/index_info.h"
 
 namespace {
 
-using Lucene::StringUtils;
 using vantrel::elastic::IndexInfo;
 using vantrel::elastic::TermDict;
 
-// A field's name in UTF-8. Terms come field by field, so that few names need converting.
-class FieldName {
- public:
-  const std::string& ToUtf8(const Lucene::String& name) {
-    if (name != wide_ || utf8_.empty()) {
-      wide_ = name;
-      utf8_ = StringUtils::toUTF8(name);
-    }
-    return utf8_;
-  }
-
- private:
-  Lucene::String wide_;
-  std::string utf8_;
-};
-
 void ListTerms(TermDict& dictionary) {
-  FieldName field_name;
+  std::string field;
   std::string line;
   int32_t listed = 0;
   while (dictionary.Next()) {
-    if (listed >= OptionSet::max) break;  // one past the last listed, as it has always been
+    if (listed >= OptionSet::max) break;  // the cursor is one past the last listed then
     const Lucene::TermPtr term = dictionary.Term();
     if (!term) continue;
-    const std::string& field = field_name.ToUtf8(term->_field);
+    field.clear();
+    AppendUtf8(term->_field, field);
     if (!OptionSet::field.empty() && field != OptionSet::field) continue;
-    // One insertion a line: what goes out is the same, and a long listing takes half the time.
-    line.assign("field: ").append(field).append(" text: ").append(StringUtils::toUTF8(term->_text));
-    std::cout << line << std::endl;
+    line.assign("field: ").append(field).append(" text: ");
+    AppendUtf8(term->_text, line);
+    // One insertion, newline included: each costs, and a dictionary has millions of lines.
+    std::cout << line.append("\n") << std::flush;
     ++listed;
   }
 }

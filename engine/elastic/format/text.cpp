@@ -71,8 +71,14 @@ bool IsValidUtf8(std::string_view text) {
 
 bool AppendCodePoints(std::string_view text, std::wstring& out) {
   static_assert(sizeof(wchar_t) == 4, "a wide character holds any code point");
-  return ForEachCodePoint(text,
-                          [&out](char32_t code_point) { out.push_back(static_cast<wchar_t>(code_point)); });
+  // No text has more code points than bytes: room is made once, and what is not needed given back.
+  const size_t start = out.size();
+  out.resize(start + text.size());
+  wchar_t* next = out.data() + start;
+  const bool valid =
+      ForEachCodePoint(text, [&next](char32_t code_point) { *next++ = static_cast<wchar_t>(code_point); });
+  out.resize(static_cast<size_t>(next - out.data()));
+  return valid;
 }
 
 std::string FromUtf16(std::u16string_view units) {

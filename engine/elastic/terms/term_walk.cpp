@@ -63,7 +63,7 @@ bool TermWalk::Next() {
   return at_term_;
 }
 
-const std::wstring& TermWalk::WideFieldName(int32_t field) {
+const Lucene::String& TermWalk::WideFieldName(int32_t field) {
   if (field != wide_field_number_) {
     wide_field_number_ = field;
     wide_field_.clear();
@@ -74,9 +74,12 @@ const std::wstring& TermWalk::WideFieldName(int32_t field) {
 
 Lucene::TermPtr TermWalk::Term() {
   if (!at_term_) return {};
-  wide_text_.clear();
-  if (!format::AppendCodePoints(cursor_.text(), wide_text_)) cursor_.Damaged("term is not valid UTF-8");
-  return Lucene::newLucene<Lucene::Term>(WideFieldName(cursor_.field()), wide_text_);
+  // A term that nobody else holds any more is filled anew: a walk then allocates nothing.
+  if (!term_ || !term_.unique()) term_ = Lucene::newLucene<Lucene::Term>(Lucene::String());
+  term_->_field = WideFieldName(cursor_.field());
+  term_->_text.clear();
+  if (!format::AppendCodePoints(cursor_.text(), term_->_text)) cursor_.Damaged("term is not valid UTF-8");
+  return term_;
 }
 
 }  // namespace vantrel::elastic

@@ -43,7 +43,7 @@ class TermWalk {
  private:
   format::TermCursor OpenCursor() const;
   bool IsWanted(const format::TermCursor& cursor);
-  const std::wstring& WideFieldName(int32_t field);
+  const Lucene::String& WideFieldName(int32_t field);
 
   format::SegmentFiles files_;
   std::vector<format::FieldInfo> fields_;
@@ -51,9 +51,9 @@ class TermWalk {
   std::optional<LiveTermFilter> live_filter_;
   std::optional<uint64_t> count_;
   bool at_term_ = false;
-  std::wstring wide_text_;
   int32_t wide_field_number_ = -1;
-  std::wstring wide_field_;
+  Lucene::String wide_field_;
+  Lucene::TermPtr term_;
 };
 
 }  // namespace vantrel::elastic

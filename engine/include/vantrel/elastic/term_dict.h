@@ -31,7 +31,8 @@ class VANTREL_ELASTIC_EXPORT TermDict {
   // Moves to the next term, at first to the first one; false when there is none.
   bool Next();
 
-  // The term at the cursor; an empty pointer before the first Next() and after the last.
+  // The term at the cursor; an empty pointer before the first Next() and after the last. It is the caller's to
+  // keep: a term that is still held is not touched by later calls.
   Lucene::TermPtr Term() const;
 
  private:
