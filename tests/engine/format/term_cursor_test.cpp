@@ -177,6 +177,16 @@ TEST_P(TermCursorOfAnyFormatTest, APrefixMustLieInTheTermBefore) {
   ExpectDamage(second, "term shares 4", [&] { cursor.Next(); });
 }
 
+TEST_P(TermCursorOfAnyFormatTest, ATermLongerThanAnyIsDamageEvenOverAHoleInTheFile) {
+  for (const int64_t length : {int64_t{-1}, int64_t{0x7fffffff}, int64_t{17} << 20}) {
+    ByteWriter out = Header(GetParam(), 1).VInt(0).VInt(length);
+    TermCursor short_file = Open(ByteWriter(out).Raw("some text").bytes());
+    EXPECT_THROW(short_file.Next(), IndexDamagedError);
+    TermCursor sparse_file = Open(out.bytes(), File::kDictionary, uint64_t{1} << 40);
+    EXPECT_THROW(sparse_file.Next(), IndexDamagedError);
+  }
+}
+
 TEST_P(TermCursorOfAnyFormatTest, AHugeCountOverAHoleInTheFileEndsAtOnce) {
   const int64_t count = GetParam() == 0 ? 0x7fffffff : int64_t{1} << 37;
   TermCursor cursor = Open(Header(GetParam(), count).bytes(), File::kDictionary, uint64_t{1} << 40);
@@ -213,6 +223,11 @@ TEST(TermCursorTest, RefusesNumbersThatCannotBe) {
   constexpr uint64_t kLargest = std::numeric_limits<int64_t>::max();
   ExpectSecondTermDamaged({.suffix = "b", .postings = kLargest - 9}, "does not fit 63 bits");
   ExpectSecondTermDamaged({.suffix = "b", .postings = 5, .positions = kLargest - 9}, "does not fit 63 bits");
+}
+
+TEST(TermCursorTest, PostingsMustNotOverlapTheTermsBefore) {
+  ExpectSecondTermDamaged({.suffix = "b", .postings = 2}, "postings of 3 documents take 2 bytes");
+  ExpectSecondTermDamaged({.suffix = "b", .postings = 0}, "postings of 3 documents take 0 bytes");
 }
 
 TEST(TermCursorTest, OnlyTheFirstTermOfAnIndexMayStandBeforeAllFields) {
