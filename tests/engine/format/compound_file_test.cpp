@@ -73,5 +73,21 @@ TEST(CompoundFileTest, RefusesATableThatIsCut) {
   }
 }
 
+TEST(CompoundFileTest, RefusesATableThatReachesIntoTheSubFiles) {
+  ExpectDamage(31, "table reaches into the first sub-file at 45",
+               [] { CompoundFile(SourceOf(ThreeParts(45, 46, 46).bytes())); });
+}
+
+TEST(CompoundFileTest, RefusesTwoSubFilesOfOneName) {
+  ExpectDamage(16, "two sub-files", [] {
+    CompoundFile(SourceOf(ByteWriter().VInt(2).Long(31).String("_0.fnm").Long(31).String("_0.fnm").bytes()));
+  });
+}
+
+TEST(CompoundFileTest, AHugeCountOverAHoleInTheFileEndsAtOnce) {
+  const std::string head = ByteWriter().VInt(-1).bytes();
+  ExpectDamage(5, "table reaches", [&] { CompoundFile(SourceOf(head, uint64_t{1} << 40)); });
+}
+
 }  // namespace
 }  // namespace vantrel::elastic::format
