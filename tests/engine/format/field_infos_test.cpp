@@ -90,6 +90,29 @@ TEST(FieldInfosTest, TheNewerLayoutsNamesAreNeverTakenForCharacters) {
                [] { Read(ByteWriter().VInt(-2).VInt(1).UnitsString(u"\u00f6").Byte(1)); });
 }
 
+TEST(FieldInfosTest, RefusesCountsAndLengthsPastTheEnd) {
+  ExpectDamage(5, "2147483647 fields, but", [] { Read(ByteWriter().VInt(-2).VInt(0x7fffffff)); });
+  ExpectDamage(5, "4294967295 fields, but",
+               [] { Read(ByteWriter().VInt(-2).VInt(-1).String("id").Byte(1)); });
+  ExpectDamage(6, "string of 4294967295 bytes",
+               [] { Read(ByteWriter().VInt(-2).VInt(1).VInt(-1).Raw("id")); });
+}
+
+TEST(FieldInfosTest, RefusesTwoFieldsOfOneName) {
+  ExpectDamage(10, "two fields are named 'id'",
+               [] { Read(ByteWriter().VInt(-2).VInt(2).String("id").Byte(1).String("id").Byte(1)); });
+}
+
+TEST(FieldInfosTest, AHugeCountOverAHoleInTheFileEndsAtOnce) {
+  const std::string head = ByteWriter().VInt(-2).VInt(0x7fffffff).bytes();
+  ExpectDamage(12, "two fields", [&] { ReadFieldInfos(SourceOf(head, uint64_t{1} << 40)); });
+  const std::string older = ByteWriter().VInt(0x7fffffff).bytes();
+  ExpectDamage(7, "two fields", [&] { ReadFieldInfos(SourceOf(older, uint64_t{1} << 40)); });
+  const std::string long_name = ByteWriter().VInt(-2).VInt(1).VInt(-1).bytes();
+  ExpectDamage(6, "string of 4294967295 bytes",
+               [&] { ReadFieldInfos(SourceOf(long_name, uint64_t{1} << 40)); });
+}
+
 TEST(FieldInfosTest, PassesAMediumErrorOn) {
   EXPECT_THROW(ReadFieldInfos(SourceOf(ByteWriter().VInt(1).String("id").Byte(1).bytes(), 0, 0)),
                IndexIoError);
