@@ -61,6 +61,12 @@ TEST(DiskFolderTest, SaysWhichFolderItCannotOpenAndWhy) {
                    [&] { DiskFolder(std::string(5000, 'x')); });
 }
 
+TEST(DiskFolderTest, APathIsNotCutAtAZeroByte) {
+  const TemporaryFolder folder;
+  ExpectIndexError(folder.path() + ": path goes on after a zero byte: No such file",
+                   [&] { DiskFolder(folder.path() + std::string("\0hidden", 7)); });
+}
+
 TEST(DiskFolderTest, SaysWhichFileItCannotOpenAndWhy) {
   const TemporaryFolder folder;
   std::filesystem::create_directory(folder / "folder");
@@ -71,6 +77,22 @@ TEST(DiskFolderTest, SaysWhichFileItCannotOpenAndWhy) {
   ExpectIndexError(folder / "folder: cannot open file: Is a directory", [&] { disk.Open("folder"); });
   ExpectIndexError(folder / "loop: cannot open file: Too many levels", [&] { disk.Open("loop"); });
   ExpectIndexError(folder / "dangling: cannot open file: No such file", [&] { disk.Open("dangling"); });
+}
+
+TEST(DiskFolderTest, OpensNeitherPipesNorSocketsNorDevices) {
+  const TemporaryFolder folder;
+  ASSERT_EQ(mkfifo((folder / "pipe").c_str(), 0600), 0);
+  std::filesystem::create_symlink("/dev/zero", folder / "device");
+  const int listener = socket(AF_UNIX, SOCK_STREAM, 0);
+  sockaddr_un address{};
+  address.sun_family = AF_UNIX;
+  std::strncpy(address.sun_path, (folder / "socket").c_str(), sizeof(address.sun_path) - 1);
+  ASSERT_EQ(bind(listener, reinterpret_cast<const sockaddr*>(&address), sizeof(address)), 0);
+  const DiskFolder disk(folder.path());
+  for (const char* name : {"pipe", "device", "socket"}) {
+    ExpectIndexError(folder / name + ": not a regular file", [&] { disk.Open(name); });
+  }
+  close(listener);
 }
 
 TEST(DiskFolderTest, FollowsASymbolicLinkToAFile) {
