@@ -169,7 +169,7 @@ void UseNewestCommit(const Folder& folder, const std::function<void(Commit)>& us
   };
   int64_t generation = NewestGeneration(folder);
   if (generation < 0) throw IndexError(folder.path(), "no index in this folder: it holds no segments file");
-  for (;;) {
+  for (bool tried_again = false;;) {
     std::exception_ptr failure;
     try {
       return use_generation(generation);
@@ -184,7 +184,9 @@ void UseNewestCommit(const Folder& folder, const std::function<void(Commit)>& us
       }
     }
     const int64_t newest = NewestGeneration(folder);
-    if (newest <= generation) std::rethrow_exception(failure);
+    // The same again, but once: its writer may have completed it, and dropped the one before, just now.
+    if (newest < generation || (newest == generation && tried_again)) std::rethrow_exception(failure);
+    tried_again = newest == generation;
     generation = newest;
   }
 }

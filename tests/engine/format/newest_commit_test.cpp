@@ -187,6 +187,20 @@ TEST(NewestCommitTest, ListsAgainWhereASegmentsFileVanishesAsTheNextCommitAppear
   EXPECT_EQ(used, 5);
 }
 
+TEST(NewestCommitTest, ReadsACommitAgainThatWasCompletedWhileItWasBeingRead) {
+  MemoryFolder folder;
+  PutCommit(folder, 3);
+  PutCommit(folder, 4);
+  folder.files["segments_4"].bytes.pop_back();
+  // The writer finishes the fourth, and drops the third, just as we turn back to that.
+  folder.before_open = [&](const std::string& name) {
+    if (name != "segments_3") return;
+    folder.files.erase(name);
+    PutCommit(folder, 4);
+  };
+  EXPECT_EQ(Used(folder), 4);
+}
+
 TEST(NewestCommitTest, GivesUpWhereNothingChanges) {
   MemoryFolder folder;
   PutCommit(folder, 3);
