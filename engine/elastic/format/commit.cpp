@@ -24,6 +24,9 @@ constexpr int32_t kWithHasPositions = -7;
 constexpr int32_t kWithUserData = -8;
 constexpr int32_t kWithDiagnostics = -9;
 
+// Room for a million segments; a hole in a file that is larger could be taken for endless user data.
+constexpr uint64_t kLargestCommit = uint64_t{256} << 20;
+
 void SkipString(ByteReader& reader) { reader.Skip(reader.ReadVInt()); }
 
 void SkipStringMap(ByteReader& reader) {
@@ -143,6 +146,9 @@ int64_t NewestGeneration(const Folder& folder) {
 }  // namespace
 
 Commit ReadCommit(std::shared_ptr<const ByteSource> source, int64_t generation) {
+  if (source->size() > kLargestCommit) {
+    throw IndexError(source->name(), std::to_string(source->size()) + " bytes are too many for a commit");
+  }
   ByteReader reader(source);
   Commit commit;
   commit.generation = generation;

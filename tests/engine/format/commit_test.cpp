@@ -160,6 +160,12 @@ TEST(CommitTest, ASegmentsNameCannotLeaveTheFolder) {
   ExpectDamage(20, "not valid UTF-8", [&] { Read(CommitBytes(-9, {{.name = "_\xff"}})); });
 }
 
+TEST(CommitTest, AFileThatIsLargerThanAnyCommitIsNotReadAtAll) {
+  const std::string head = ByteWriter().Int(-9).Long(1).Int(1).Int(0).Int(0x7fffffff).bytes();
+  ExpectIndexError("memory: 1099511627800 bytes are too many for a commit",
+                   [&] { ReadCommit(SourceOf(head, uint64_t{1} << 40, 0), 1); });
+}
+
 TEST(CommitTest, PassesAMediumErrorOn) {
   const std::string bytes = CommitBytes(-9, {SegmentBytes{}});
   EXPECT_THROW(ReadCommit(SourceOf(bytes, 0, 0), 1), IndexIoError);

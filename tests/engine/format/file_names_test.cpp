@@ -43,6 +43,11 @@ TEST(FileNamesTest, OnlyANumberAfterAnUnderscoreIsASegmentsName) {
   EXPECT_FALSE(IsSegmentName(std::string_view("_0\0", 3)));
 }
 
+TEST(FileNamesTest, ASegmentsNameHasNoMoreDigitsThanA64BitNumber) {
+  EXPECT_TRUE(IsSegmentName("_zzzzzzzzzzzzz"));
+  EXPECT_FALSE(IsSegmentName("_00000000000000"));
+}
+
 TEST(FileNamesTest, NamesTheDeletionsOfASegment) {
   EXPECT_EQ(DeletionsFileName("_a", 0), "_a.del");
   EXPECT_EQ(DeletionsFileName("_a", 1), "_a_1.del");
