@@ -82,6 +82,19 @@ TEST(DeletionsTest, ManyPagesAreHeldAFewAtATime) {
   for (const int32_t document : deleted) ASSERT_TRUE(deletions.Contains(document)) << document;
 }
 
+TEST(DeletionsTest, ManySparseBytesAreHeldAFewAtATime) {
+  constexpr int32_t kDocuments = 40'000'000;
+  std::set<int32_t> deleted;
+  for (int32_t document = 3; document < kDocuments; document += 97) deleted.insert(document);
+  Deletions deletions(SourceOf(Sparse(kDocuments, deleted)), kDocuments);
+  EXPECT_EQ(deletions.count(), static_cast<int32_t>(deleted.size()));
+  for (int32_t document = 0; document < kDocuments / 2; document += 89) {
+    ASSERT_EQ(deletions.Contains(document), deleted.contains(document)) << document;
+    const int32_t far = kDocuments - 1 - document;
+    ASSERT_EQ(deletions.Contains(far), deleted.contains(far)) << far;
+  }
+}
+
 TEST(DeletionsTest, RefusesToBeAboutAnotherNumberOfDocuments) {
   ExpectDamage(0, "about 100 documents, but the segment has 99",
                [] { Deletions(SourceOf(Dense(100, {1})), 99); });
