@@ -53,7 +53,7 @@ class ByteReader {
 
   void ReadBytes(std::span<uint8_t> out);
 
-  // A string; throws also when it is not valid UTF-8.
+  // A string; throws also when it is not valid UTF-8, or longer than kLongestText.
   std::string ReadString();
 
   // Throws IndexDamagedError about this source.

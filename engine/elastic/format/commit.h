@@ -47,7 +47,8 @@ struct Commit {
 //   F = -8: Byte has user data, if so one String;  F <= -9: Int count of user data, two Strings each
 //   F <= -5: Long CRC-32 of every byte before it
 //
-// Bytes after that are ignored. Throws IndexDamagedError, IndexIoError.
+// Bytes after that are ignored. Throws IndexDamagedError, IndexIoError, and IndexError for a file of over
+// 256 MiB, which no commit reaches.
 Commit ReadCommit(std::shared_ptr<const ByteSource> source, int64_t generation);
 
 // Finds the newest commit of the folder that `use` accepts, and hands it over. The newest generation is the
