@@ -16,11 +16,11 @@ namespace quorelastic::testing {
 struct RunOptions {
   // "NAME=value", added to the test's own environment, which is passed on without its locale settings and
   // POSIXLY_CORRECT.
-  std::vector<std::string> environment;
-  std::string input;          // what standard input holds, a file
+  std::vector<std::string> environment = {};
+  std::string input = {};     // what standard input holds, a file
   int input_descriptor = -1;  // or where standard input is read from instead; stays the caller's
-  std::string folder;         // the working folder; empty: the test's
-  std::vector<std::pair<__rlimit_resource, rlim_t>> limits;
+  std::string folder = {};    // the working folder; empty: the test's
+  std::vector<std::pair<__rlimit_resource, rlim_t>> limits = {};
   std::chrono::seconds time_limit{60};
   bool record_writes = false;        // see RunResult::writes
   bool status_tells_signal = false;  // an exit status of 128 + n stands for the signal n, as shells have it
