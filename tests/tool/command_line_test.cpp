@@ -11,17 +11,14 @@
 #include <string_view>
 #include <vector>
 
-#include "support/library_index.h"
 #include "support/sandbox_test.h"
-#include "support/temporary_folder.h"
-#include "support/tool_run.h"
+#include "tool/inspection.h"
 #include "tool/outcome.h"
 
 namespace quorelastic::testing {
 namespace {
 
 using ::testing::AllOf;
-using ::testing::Gt;
 using ::testing::HasSubstr;
 using ::testing::IsEmpty;
 using ::testing::Not;
@@ -44,14 +41,6 @@ std::vector<std::string_view> OptionsThatBeginWith(std::string_view prefix) {
   std::ranges::copy_if(kOptionNames, std::back_inserter(found),
                        [&](std::string_view name) { return name.starts_with(prefix); });
   return found;
-}
-
-size_t CountLines(const std::string& text, const std::string& start) {
-  size_t count = 0;
-  for (size_t at = 0; at < text.size(); at = text.find('\n', at) + 1) {
-    if (text.compare(at, start.size(), start) == 0) ++count;
-  }
-  return count;
 }
 
 TEST(CommandLineTest, WithoutArgumentsShowsTheUsage) { EXPECT_THAT(RunTool({}), ShowedUsage()); }
