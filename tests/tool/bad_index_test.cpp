@@ -114,6 +114,28 @@ TEST_F(BadIndexTest, ReportsAPathThatIsTooLong) {
   }
 }
 
+TEST_F(BadIndexTest, ReportsAMissingFolderOfAnyScript) {
+  const std::string path = folder_ / "größe 中文";
+  EXPECT_THAT(Inspect("allterm", path),
+              Aborted("", kIoError, path + ": cannot open index folder: No such file or directory"));
+  for (const char* action : {"position", "doc_term"}) {
+    // The stream's locale has no letters for the rest.
+    EXPECT_THAT(Inspect(action, path, kTermOptions),
+                Printed(AllOf(StartsWith("LuceneException: Directory '" + folder_ / "gr"),
+                              EndsWith("' does not exist\n"))));
+  }
+}
+
+TEST_F(BadIndexTest, ReportsExceptionsThatAreNotTheLibrarysOwn) {
+  WriteIndex(folder_.path(), false);
+  // The size of the term index, a Long after the format; no container holds a number below nought.
+  std::string bytes = ReadFile(folder_ / "_0.tii");
+  bytes.replace(4, 8, std::string("\0\0\0\0\x80\0\0\1", 8));
+  WriteFile(folder_ / "_0.tii", bytes);
+  EXPECT_THAT(Inspect("position", folder_.path(), kTermOptions),
+              Printed(ContainsRegex("^Exception:[^ ].*\n$")));
+}
+
 // The index library takes paths as text.
 TEST_F(BadIndexTest, ReportsAPathThatIsNoTextWhereTextIsWanted) {
   const std::string path = folder_ / "\xff\xfe";
