@@ -142,7 +142,7 @@ int64_t NewestGeneration(const Folder& folder) {
 
 }  // namespace
 
-Commit ReadCommit(std::shared_ptr<const ByteSource> source, int64_t generation) {
+Commit ReadCommit(const std::shared_ptr<const ByteSource>& source, int64_t generation) {
   ByteReader reader(source);
   Commit commit;
   commit.generation = generation;
