@@ -145,7 +145,7 @@ int64_t NewestGeneration(const Folder& folder) {
 
 }  // namespace
 
-Commit ReadCommit(std::shared_ptr<const ByteSource> source, int64_t generation) {
+Commit ReadCommit(const std::shared_ptr<const ByteSource>& source, int64_t generation) {
   if (source->size() > kLargestCommit) {
     throw IndexError(source->name(), std::to_string(source->size()) + " bytes are too many for a commit");
   }
