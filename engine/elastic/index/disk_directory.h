@@ -18,8 +18,9 @@ namespace vantrel::elastic {
 //
 // - Its files swallow a failed write: on a full disk it commits segments that are cut off. And it goes on,
 //   deleting the commit before, when the new one's segments_N cannot be made durable. Here a failure is
-//   thrown, and it sticks: from then on nothing is created or synced any more, and nothing is deleted but what
-//   was made since the last commit. So the last commit stays whole, whatever the library makes of the failure.
+//   thrown, and it sticks: from then on nothing is created or synced any more, and nothing is deleted but
+//   what was made since the last commit. So the last commit stays whole, whatever the library makes of the
+//   failure.
 // - It never syncs the folder, so that a new file's name could be lost with the power. Here a commit's folder
 //   is synced with it, before the library deletes the files of the commit before.
 // - It reads endlessly where the medium fails; here that is an error that names the file.
@@ -37,8 +38,8 @@ class DiskDirectory : public Lucene::SimpleFSDirectory {
   // writes: it does not pass on all of them.
   const std::optional<IndexIoError>& failure() const { return failure_; }
 
-  // The newest thing that could not be opened or read, as one line; empty as long as there was none. It may be
-  // harmless, but where the library fails without a reason, this is it.
+  // The newest thing that could not be opened or read, as one line; empty as long as there was none. It may
+  // be harmless, but where the library fails without a reason, this is it.
   std::string last_read_problem() const;
 
   // Takes note of a failed write and throws it as the library's exception.

@@ -82,7 +82,7 @@ TEST(JsonValueTest, AThousandLevelsAreReadAndManyMoreAreNoDocument) {
 
 TEST(JsonValueTest, WhatIsNoDocumentLeavesNull) {
   for (const char* text : {"", " ", "{", "[1,", "{\"a\":}", "nul", "'a'", "[1 2]", "\"open", "{} {}", "1 x",
-                           "[] trailing", "{\"a\" 1}", "\"\\ud83d\""}) {
+                           "[] trailing", "[1,]", "{\"a\":1,}", "{\"a\" 1}", "\"\\ud83d\""}) {
     JsonValue value;
     value["before"] = 1;
     EXPECT_FALSE(value.fromString(text)) << text;
