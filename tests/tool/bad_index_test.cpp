@@ -1,5 +1,5 @@
-// What the inspecting actions say of a path that holds no index they can read. "allterm" and "term" abort with an
-// exception that names the path; "position" and "doc_term" report the index library's error and end normally.
+// What the inspecting actions say of a path that holds no index they can read. "allterm" and "term" abort with
+// an exception that names the path; "position" and "doc_term" report the index library's error and end normally.
 
 #include <gmock/gmock.h>
 #include <gtest/gtest.h>
