@@ -38,7 +38,7 @@ class Sandbox {
 
   // As the functions of the same names outside. A signal that ends a program is reported as one.
   Process Start(const std::vector<std::string>& command, RunOptions options = {}) const;
-  RunResult Run(const std::vector<std::string>& command, RunOptions options = {}) const;
+  RunResult RunCommand(const std::vector<std::string>& command, RunOptions options = {}) const;
   RunResult RunTool(const std::vector<std::string>& arguments, const RunOptions& options = {}) const;
 
   // The messages that reached the system log so far, as the C library sent them:
