@@ -34,7 +34,7 @@ Descriptor ListenForMessages(const std::string& path) {
 
 std::string FindRefusal() {
   Sandbox sandbox;
-  const RunResult trial = sandbox.Run({"true"});
+  const RunResult trial = sandbox.RunCommand({"true"});
   if (trial.status == 0) return "";
   return trial.err.empty() ? "bwrap failed without a word" : trial.err;
 }
@@ -100,7 +100,7 @@ Process Sandbox::Start(const std::vector<std::string>& command, RunOptions optio
   return Process(Wrap(command), options);
 }
 
-RunResult Sandbox::Run(const std::vector<std::string>& command, RunOptions options) const {
+RunResult Sandbox::RunCommand(const std::vector<std::string>& command, RunOptions options) const {
   std::filesystem::remove(folder_ / "pid");
   RunResult result = Start(command, std::move(options)).Wait();
   if (std::filesystem::exists(folder_ / "pid")) result.pid = std::stoi(ReadFile(folder_ / "pid"));
@@ -110,7 +110,7 @@ RunResult Sandbox::Run(const std::vector<std::string>& command, RunOptions optio
 RunResult Sandbox::RunTool(const std::vector<std::string>& arguments, const RunOptions& options) const {
   std::vector<std::string> command{ToolPath()};
   command.insert(command.end(), arguments.begin(), arguments.end());
-  return Run(command, options);
+  return RunCommand(command, options);
 }
 
 void Sandbox::DrainLog() {

@@ -11,12 +11,12 @@
 
 namespace quorelastic::testing {
 
-// A place where the fixed paths of the system belong to one test: a mount namespace made by bubblewrap, for root
-// and ordinary users alike. Every program run in one and the same sandbox sees
+// A place where the fixed paths of the system belong to one test: a mount namespace made by bubblewrap, for
+// root and ordinary users alike. Every program run in one and the same sandbox sees
 //
 //   /                     the machine's, but read-only
 //   folder()              at its own path, writable
-//   /run, /var/run        run_folder(): a daemon's socket stands there, and the test can listen or connect too
+//   /run, /var/run        run_folder(): where a daemon's socket stands; the test can listen or connect too
 //   /var/lib/quorelastic  data_root()
 //   /dev/log              a system log that only this sandbox writes to
 //
@@ -38,10 +38,11 @@ class Sandbox {
 
   // As the functions of the same names outside. A signal that ends a program is reported as one.
   Process Start(const std::vector<std::string>& command, RunOptions options = {}) const;
-  RunResult Run(const std::vector<std::string>& command, RunOptions options = {}) const;
+  RunResult RunCommand(const std::vector<std::string>& command, RunOptions options = {}) const;
   RunResult RunTool(const std::vector<std::string>& arguments, const RunOptions& options = {}) const;
 
-  // The messages that reached the system log so far, as the C library sent them: "<11>Jan  1 00:00:00 name: text".
+  // The messages that reached the system log so far, as the C library sent them:
+  // "<11>Jan  1 00:00:00 name: text".
   std::vector<std::string> Log();
 
  private:

@@ -211,7 +211,7 @@ RunResult Process::Wait() {
   return result;
 }
 
-RunResult Run(const std::vector<std::string>& command, const RunOptions& options) {
+RunResult RunCommand(const std::vector<std::string>& command, const RunOptions& options) {
   return Process(command, options).Wait();
 }
 
@@ -223,7 +223,7 @@ const std::string& ToolPath() {
 RunResult RunTool(const std::vector<std::string>& arguments, const RunOptions& options) {
   std::vector<std::string> command{ToolPath()};
   command.insert(command.end(), arguments.begin(), arguments.end());
-  return Run(command, options);
+  return RunCommand(command, options);
 }
 
 }  // namespace quorelastic::testing

@@ -74,7 +74,7 @@ class Process {
   Descriptor process_;  // pidfd; closed once the end was seen
 };
 
-RunResult Run(const std::vector<std::string>& command, const RunOptions& options = {});
+RunResult RunCommand(const std::vector<std::string>& command, const RunOptions& options = {});
 
 // The path of the real quorelastic of this build.
 const std::string& ToolPath();

@@ -1,5 +1,6 @@
-// What the inspecting actions say of a path that holds no index they can read. "allterm" and "term" abort with an
-// exception that names the path; "position" and "doc_term" report the index library's error and end normally.
+// What the inspecting actions say of a path that holds no index they can read. "allterm" and "term" abort
+// with an exception that names the path; "position" and "doc_term" report the index library's error and end
+// as usual.
 
 #include <gmock/gmock.h>
 #include <gtest/gtest.h>
@@ -180,7 +181,7 @@ class UnreadableIndexTest : public SandboxTest {
 
   void Forbid(const std::string& path) {
     ASSERT_EQ(chmod(path.c_str(), 0), 0);
-    const RunResult attempt = sandbox_.Run({std::filesystem::is_directory(path) ? "ls" : "cat", path});
+    const RunResult attempt = sandbox_.RunCommand({std::filesystem::is_directory(path) ? "ls" : "cat", path});
     ASSERT_THAT(attempt.err, HasSubstr("Permission denied")) << "it can be read all the same";
   }
 

@@ -199,7 +199,7 @@ TEST_F(EveryActionTest, GetsTheOptionOfItsOwnCase) {
   EXPECT_THAT(sandbox_.RunTool({"-a", "dump", "-I", "idx"}).err, Not(HasSubstr("index is required.")));
   EXPECT_THAT(sandbox_.RunTool({"-a", "check", "-D", "/tmp"}),
               Aborted("", kErrorType, "db_path is required."));
-  EXPECT_THAT(sandbox_.RunTool({"-a", "command", "-P", "/p", "-p", "/no/file"}),
+  EXPECT_THAT(sandbox_.RunTool({"-a", "command", "-p", "/no/file", "-P", "/p"}),
               Aborted("", kErrorType, "Cannot load json: /no/file"));
 }
 

@@ -30,13 +30,20 @@ class DocumentTermsTest : public ::testing::Test {
   TemporaryFolder folder_;
 };
 
-class VectorKindTest : public DocumentTermsTest, public ::testing::WithParamInterface<Vector> {};
+struct VectorKind {
+  std::string name;
+  Vector vector;
+};
+
+void PrintTo(const VectorKind& kind, std::ostream* stream) { *stream << kind.name; }
+
+class VectorKindTest : public DocumentTermsTest, public ::testing::WithParamInterface<VectorKind> {};
 
 TEST_P(VectorKindTest, ShowsEachTermOnceInTheVectorsOrder) {
   {
     LibraryIndex index(folder_.path());
-    index.Add({VectorText("body", "pear Zebra apple pear apple", GetParam()),
-               VectorText("title", "other", GetParam())});
+    index.Add({VectorText("body", "pear Zebra apple pear apple", GetParam().vector),
+               VectorText("title", "other", GetParam().vector)});
   }
   EXPECT_THAT(Terms({"-f", "body"}), Printed("body: Zebra\nbody: apple\nbody: pear\n"));
   EXPECT_THAT(Terms({"-f", "body", "-n", "0"}), Printed("body: Zebra\nbody: apple\nbody: pear\n"));
@@ -44,8 +51,11 @@ TEST_P(VectorKindTest, ShowsEachTermOnceInTheVectorsOrder) {
 }
 
 INSTANTIATE_TEST_SUITE_P(EveryKind, VectorKindTest,
-                         ::testing::Values(Vector::kTerms, Vector::kPositions, Vector::kOffsets,
-                                           Vector::kPositionsAndOffsets));
+                         ::testing::Values(VectorKind{"Terms", Vector::kTerms},
+                                           VectorKind{"Positions", Vector::kPositions},
+                                           VectorKind{"Offsets", Vector::kOffsets},
+                                           VectorKind{"PositionsAndOffsets", Vector::kPositionsAndOffsets}),
+                         [](const auto& instance) { return instance.param.name; });
 
 TEST_F(DocumentTermsTest, FindsNoneWhereNoneWasStored) {
   {

@@ -25,11 +25,18 @@ class TermDumpTest : public ::testing::Test {
 };
 
 // Compound and plain files, and term indexes from every term to none but the first.
-class StorageTest : public TermDumpTest, public ::testing::WithParamInterface<LibraryIndex::Options> {};
+struct Layout {
+  std::string name;
+  LibraryIndex::Options options;
+};
+
+void PrintTo(const Layout& layout, std::ostream* stream) { *stream << layout.name; }
+
+class StorageTest : public TermDumpTest, public ::testing::WithParamInterface<Layout> {};
 
 TEST_P(StorageTest, ShowsTheSameTerms) {
   {
-    LibraryIndex index(folder_.path(), GetParam());
+    LibraryIndex index(folder_.path(), GetParam().options);
     index.Add({{.name = "title", .value = "Zebra apple"}, {.name = "body", .value = "pear apple apple"}});
     index.Add({Keyword("id", "two words"), {.name = "body", .value = "apple plum"}});
     index.Commit();
@@ -70,9 +77,10 @@ TEST_P(StorageTest, ShowsTheSameTerms) {
 
 INSTANTIATE_TEST_SUITE_P(
     EveryLayout, StorageTest,
-    ::testing::Values(LibraryIndex::Options{.compound = true}, LibraryIndex::Options{.compound = false},
-                      LibraryIndex::Options{.compound = true, .term_index_interval = 1},
-                      LibraryIndex::Options{.compound = false, .term_index_interval = 2}));
+    ::testing::Values(Layout{"Compound", {.compound = true}}, Layout{"Plain", {.compound = false}},
+                      Layout{"CompoundAllTermsIndexed", {.compound = true, .term_index_interval = 1}},
+                      Layout{"PlainHalfTheTermsIndexed", {.compound = false, .term_index_interval = 2}}),
+    [](const auto& instance) { return instance.param.name; });
 
 TEST_F(TermDumpTest, WithoutInfoShowsTheSegmentsAloneWhateverElseIsAskedFor) {
   {

@@ -46,7 +46,7 @@ CompoundFile::CompoundFile(std::shared_ptr<const ByteSource> source) : source_(s
     last_offset = static_cast<uint64_t>(offset);
     first_offset = std::min(first_offset, last_offset);
     const auto [part, is_new] = parts_.try_emplace(reader.ReadString(), Part{last_offset, 0});
-    if (!is_new) reader.Damaged(start, "two sub-files are named '" + part->first + "'");
+    if (!is_new) reader.Damaged(start, "sub-file bears the name of one before");
     if (reader.offset() > first_offset) {
       reader.Damaged(start, "table reaches into the first sub-file at " + std::to_string(first_offset));
     }

@@ -45,7 +45,9 @@ std::vector<FieldInfo> ReadAll(ByteReader& reader, Names names) {
     const uint64_t start = reader.offset();
     FieldInfo& field = fields.emplace_back();
     field.name = ReadName(reader, names);
-    if (!seen.insert(field.name).second) reader.Damaged(start, "two fields are named '" + field.name + "'");
+    if (!seen.insert(field.name).second) {
+      reader.Damaged(start, "field " + std::to_string(fields.size() - 1) + " bears the name of one before");
+    }
     const uint8_t flags = reader.ReadByte();
     field.indexed = (flags & kIndexed) != 0;
     field.omits_frequencies = (flags & kOmitsFrequencies) != 0;

@@ -79,7 +79,7 @@ TEST(CompoundFileTest, RefusesATableThatReachesIntoTheSubFiles) {
 }
 
 TEST(CompoundFileTest, RefusesTwoSubFilesOfOneName) {
-  ExpectDamage(16, "two sub-files", [] {
+  ExpectDamage(16, "sub-file bears the name of one before", [] {
     CompoundFile(SourceOf(ByteWriter().VInt(2).Long(31).String("_0.fnm").Long(31).String("_0.fnm").bytes()));
   });
 }

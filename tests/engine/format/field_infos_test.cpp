@@ -99,15 +99,15 @@ TEST(FieldInfosTest, RefusesCountsAndLengthsPastTheEnd) {
 }
 
 TEST(FieldInfosTest, RefusesTwoFieldsOfOneName) {
-  ExpectDamage(10, "two fields are named 'id'",
+  ExpectDamage(10, "field 1 bears the name of one before",
                [] { Read(ByteWriter().VInt(-2).VInt(2).String("id").Byte(1).String("id").Byte(1)); });
 }
 
 TEST(FieldInfosTest, AHugeCountOverAHoleInTheFileEndsAtOnce) {
   const std::string head = ByteWriter().VInt(-2).VInt(0x7fffffff).bytes();
-  ExpectDamage(12, "two fields", [&] { ReadFieldInfos(SourceOf(head, uint64_t{1} << 40)); });
+  ExpectDamage(12, "field 1 bears the name", [&] { ReadFieldInfos(SourceOf(head, uint64_t{1} << 40)); });
   const std::string older = ByteWriter().VInt(0x7fffffff).bytes();
-  ExpectDamage(7, "two fields", [&] { ReadFieldInfos(SourceOf(older, uint64_t{1} << 40)); });
+  ExpectDamage(7, "field 1 bears the name", [&] { ReadFieldInfos(SourceOf(older, uint64_t{1} << 40)); });
   const std::string long_name = ByteWriter().VInt(-2).VInt(1).VInt(-1).bytes();
   ExpectDamage(6, "string of 4294967295 bytes",
                [&] { ReadFieldInfos(SourceOf(long_name, uint64_t{1} << 40)); });

@@ -7,8 +7,10 @@
 #include <sys/un.h>
 #include <unistd.h>
 
+#include <cstdlib>
 #include <cstring>
 #include <filesystem>
+#include <stdexcept>
 
 #include "elastic/format/byte_reader.h"
 #include "elastic/format/term_cursor.h"
@@ -77,6 +79,40 @@ TEST(DiskFolderTest, SaysWhichFileItCannotOpenAndWhy) {
   ExpectIndexError(folder / "folder: cannot open file: Is a directory", [&] { disk.Open("folder"); });
   ExpectIndexError(folder / "loop: cannot open file: Too many levels", [&] { disk.Open("loop"); });
   ExpectIndexError(folder / "dangling: cannot open file: No such file", [&] { disk.Open("dangling"); });
+}
+
+// Acts as a user without rights while it lives, where the test is run by one who has them all.
+class WithoutRights {
+ public:
+  WithoutRights() {
+    if (before_ == 0 && seteuid(kNobody) != 0) throw std::runtime_error("cannot become another user");
+  }
+  WithoutRights(const WithoutRights&) = delete;
+  WithoutRights& operator=(const WithoutRights&) = delete;
+  ~WithoutRights() {
+    if (seteuid(before_) != 0) std::abort();
+  }
+
+ private:
+  static constexpr uid_t kNobody = 65534;
+  uid_t before_ = geteuid();
+};
+
+TEST(DiskFolderTest, SaysWhichFileOrFolderItMayNotRead) {
+  const TemporaryFolder folder;
+  WriteFile(folder / "file", "content");
+  std::filesystem::create_directory(folder / "folder");
+  std::filesystem::permissions(folder.path(), std::filesystem::perms(0755));
+  std::filesystem::permissions(folder / "file", std::filesystem::perms::none);
+  std::filesystem::permissions(folder / "folder", std::filesystem::perms::none);
+  {
+    const WithoutRights rights;
+    ExpectIndexError(folder / "file: cannot open file: Permission denied",
+                     [&] { DiskFolder(folder.path()).Open("file"); });
+    ExpectIndexError(folder / "folder: cannot list index folder: Permission denied",
+                     [&] { static_cast<void>(DiskFolder(folder / "folder").List()); });
+  }
+  std::filesystem::permissions(folder / "folder", std::filesystem::perms(0755));
 }
 
 TEST(DiskFolderTest, OpensNeitherPipesNorSocketsNorDevices) {
