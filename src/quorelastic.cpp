@@ -337,6 +337,7 @@ void Repair(const std::string& db_path) {
 }  // namespace
 
 int main(int argc, char** argv) {
+  unsetenv("POSIXLY_CORRECT");  // the parser's, which would stop at the first word that is no option
   OptionSet options;
   if (!ParseOptions(argc, argv, options)) return 1;
   if (!RunAction(options)) {

@@ -5,9 +5,6 @@
 
 #include <cerrno>
 
-// %m is no standard conversion of printf, but one of syslog.
-#pragma GCC diagnostic ignored "-Wformat"
-
 namespace vantrel {
 
 void FailCheck(const CheckSite& site, Error::ErrorCode code, const std::string& reason) {
@@ -17,8 +14,11 @@ void FailCheck(const CheckSite& site, Error::ErrorCode code, const std::string& 
   const uid_t user = geteuid();
   if (cause != 0) {
     errno = cause;  // %m reads it
+#pragma GCC diagnostic push
+#pragma GCC diagnostic ignored "-Wformat"  // %m is a conversion of syslog, not of printf
     syslog(LOG_ERR, "%s:%d (%d, %u) (%s) Failed [%s], reason: %s [err: %m]", site.file, site.line, process,
            user, site.function, site.condition, error.what());
+#pragma GCC diagnostic pop
     errno = 0;
   } else {
     syslog(LOG_ERR, "%s:%d (%d, %u) (%s) Failed [%s], reason: %s", site.file, site.line, process, user,

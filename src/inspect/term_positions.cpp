@@ -4,6 +4,7 @@
 // Not without the headers above.
 #include <lucene++/TermPositions.h>
 
+#include <algorithm>
 #include <iostream>
 
 #include "inspect/index_reader.h"
@@ -26,7 +27,8 @@ void PrintPositions(const std::string& index_path, const std::string& field, con
     std::cout << "No position found!!" << std::endl;
     return;
   }
-  if (!positions->skipTo(document)) {
+  // No document is below 0, and the library subtracts from the number that it is given.
+  if (!positions->skipTo(std::max(document, 0))) {
     std::cout << "No entry!!" << std::endl;
     return;
   }

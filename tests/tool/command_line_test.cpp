@@ -193,6 +193,10 @@ TEST_F(EveryActionTest, IsNotMistakenForAStrayWord) {
               AllOf(Not(HasSubstr("Usage")), Not(HasSubstr("index is required."))));
 }
 
+TEST(CommandLineTest, PassesOverStrayWordsWhateverTheEnvironmentSays) {
+  EXPECT_THAT(RunTool({"search", "-a", "plugin"}, {.environment = {"POSIXLY_CORRECT=1"}}), Printed(""));
+}
+
 TEST_F(EveryActionTest, GetsTheOptionOfItsOwnCase) {
   // -i and -I, -p and -P, -d and -D differ in case alone.
   EXPECT_THAT(sandbox_.RunTool({"-a", "dump", "-i"}), Aborted("", kErrorType, "index is required."));

@@ -6,6 +6,8 @@
 #include <filesystem>
 #include <string>
 
+#include "support/byte_writer.h"
+#include "support/files.h"
 #include "tool/inspection.h"
 #include "tool/outcome.h"
 
@@ -335,6 +337,28 @@ TEST_F(PathTest, MayBeRelativeALinkOrEndInASlash) {
     EXPECT_THAT(Inspect(action, ".", {"-i"}, {.folder = folder_ / "index"}), Printed(kExpected));
     EXPECT_THAT(Inspect(action, "index", {"-i"}, {.folder = folder_.path()}), Printed(kExpected));
   }
+}
+
+// One plain segment whose second term is damaged: it shares more with the first than that one has.
+void WriteIndexWithADamagedSecondTerm(const TemporaryFolder& folder) {
+  WriteFile(
+      folder / "segments_1",
+      ByteWriter().Int(-2).Long(1).Int(1).Int(1).String("_0").Int(1).Long(-1).Int(-1).Byte(0xff).bytes());
+  WriteFile(folder / "_0.fnm", ByteWriter().VInt(-2).VInt(1).String("f").Byte(1).bytes());
+  ByteWriter terms = ByteWriter().Int(-4).Long(2).Int(128).Int(16).Int(10);
+  WriteFile(folder / "_0.tii", ByteWriter().Int(-4).Long(0).Int(128).Int(16).Int(10).bytes());
+  terms.VInt(0).String("first").VInt(0).VInt(1).VInt(0).VInt(0);
+  terms.VInt(9).String("second").VInt(0).VInt(1).VInt(1).VInt(0);
+  WriteFile(folder / "_0.tis", terms.bytes());
+}
+
+TEST_F(TermDumpTest, AtTheCapTheCursorHasMovedOnceMoreThanWasPrinted) {
+  WriteIndexWithADamagedSecondTerm(folder_);
+  const std::string head = "segment: _0, terms count: 2\n";
+  EXPECT_THAT(Inspect("allterm", folder_.path()), Printed(head + "total terms: 2\nsuggest divisor:1\n"));
+  const std::string damaged = "vantrel::elastic::IndexDamagedError";
+  EXPECT_THAT(Inspect("allterm", folder_.path(), {"-info", "-m", "1"}),
+              Aborted(head + "field: f text: first\n", damaged, ::testing::HasSubstr("_0.tis: offset")));
 }
 
 }  // namespace

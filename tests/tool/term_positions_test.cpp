@@ -7,6 +7,7 @@
 #include <string>
 #include <vector>
 
+#include "support/files.h"
 #include "tool/inspection.h"
 #include "tool/outcome.h"
 
@@ -73,6 +74,14 @@ TEST_F(TermPositionsTest, CountsDocumentsThroughAllSegments) {
   EXPECT_TRUE(Says("pos: 2\ndoc: 4 freq: 1\n", "word", "4"));
   EXPECT_TRUE(Says("No entry!!\n", "word", "5"));
   EXPECT_TRUE(Says("pos: 0\ndoc: 5 freq: 1\n", "last"));
+  EXPECT_TRUE(Says("pos: 0\ndoc: 5 freq: 1\n", "last", "-1"));
+  EXPECT_TRUE(Says("pos: 0\ndoc: 5 freq: 1\n", "last", "-2147483648"));
+}
+
+TEST_F(TermPositionsTest, AFileNameThatIsNoUtf8DoesNotHinderIt) {
+  { LibraryIndex(folder_.path()).Add({{.name = "body", .value = "word"}}); }
+  WriteFile(folder_ / "caf\xe9.txt", "stray");
+  EXPECT_TRUE(Says("pos: 0\ndoc: 0 freq: 1\n", "word"));
 }
 
 TEST_F(TermPositionsTest, PassesOverDeletedDocuments) {

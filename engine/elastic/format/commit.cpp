@@ -9,6 +9,7 @@
 
 #include "elastic/format/byte_reader.h"
 #include "elastic/format/file_names.h"
+#include "elastic/format/quoted.h"
 #include "vantrel/elastic/index_error.h"
 
 namespace vantrel::elastic::format {
@@ -24,8 +25,9 @@ constexpr int32_t kWithHasPositions = -7;
 constexpr int32_t kWithUserData = -8;
 constexpr int32_t kWithDiagnostics = -9;
 
-// Room for a million segments; a hole in a file that is larger could be taken for endless user data.
+// Room for any commit; a hole in a file that is larger could be taken for endless user data.
 constexpr uint64_t kLargestCommit = uint64_t{256} << 20;
+constexpr int32_t kMostSegments = int32_t{1} << 16;
 
 void SkipString(ByteReader& reader) { reader.Skip(reader.ReadVInt()); }
 
@@ -119,7 +121,7 @@ int64_t ListedGeneration(const Folder& folder) {
     if (!name.starts_with(kSegments) || name == kSegmentsGen) continue;
     const std::optional<int64_t> generation = CommitGeneration(name);
     if (!generation.has_value()) {
-      throw IndexError(folder.path() + "/" + name, "name stands for a commit, but holds no generation");
+      throw IndexError(folder.path(), Quoted(name) + " stands for a commit, but holds no generation");
     }
     newest = std::max(newest, *generation);
   }
@@ -162,7 +164,9 @@ Commit ReadCommit(const std::shared_ptr<const ByteSource>& source, int64_t gener
   }
   const uint64_t count_start = reader.offset();
   const int32_t count = reader.ReadInt();
-  if (count < 0) reader.Damaged(count_start, "segment count is " + std::to_string(count));
+  if (count < 0 || count > kMostSegments) {
+    reader.Damaged(count_start, "segment count is " + std::to_string(count));
+  }
   for (int32_t i = 0; i < count; ++i) commit.segments.push_back(ReadSegment(reader, format));
   if (format < 0) SkipUserData(reader, format);
   if (format <= kWithChecksum) CheckChecksum(*source, reader);

@@ -9,6 +9,9 @@
 namespace vantrel::elastic::format {
 namespace {
 
+// A segment has a dozen files, and in the older layouts one more for each field.
+constexpr uint32_t kMostParts = uint32_t{1} << 16;
+
 class PartSource : public ByteSource {
  public:
   PartSource(std::shared_ptr<const ByteSource> whole, const std::string& name, uint64_t offset, uint64_t size)
@@ -34,7 +37,9 @@ CompoundFile::CompoundFile(std::shared_ptr<const ByteSource> source) : source_(s
   Part* last = nullptr;
   uint64_t first_offset = reader.size();
   uint64_t last_offset = 0;
-  for (uint32_t left = reader.ReadVInt(); left > 0; --left) {
+  const uint32_t count = reader.ReadVInt();
+  if (count > kMostParts) reader.Damaged(0, std::to_string(count) + " sub-files are too many");
+  for (uint32_t left = count; left > 0; --left) {
     const uint64_t start = reader.offset();
     const int64_t offset = reader.ReadLong();
     if (offset < 0 || static_cast<uint64_t>(offset) > reader.size() ||

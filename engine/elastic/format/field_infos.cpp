@@ -12,6 +12,7 @@ namespace vantrel::elastic::format {
 namespace {
 
 constexpr auto kFormat = static_cast<uint32_t>(-2);
+constexpr uint32_t kMostFields = uint32_t{1} << 18;
 constexpr uint64_t kShortestField = 2;  // an empty name, the flags
 constexpr uint8_t kIndexed = 0x01;
 constexpr uint8_t kOmitsFrequencies = 0x40;
@@ -38,6 +39,7 @@ std::vector<FieldInfo> ReadAll(ByteReader& reader, Names names) {
     reader.Damaged(count_start,
                    std::to_string(count) + " fields, but the file ends at " + std::to_string(reader.size()));
   }
+  if (count > kMostFields) reader.Damaged(count_start, std::to_string(count) + " fields are too many");
   std::vector<FieldInfo> fields;
   // No writer makes two fields of one name; a hole in the file would be full of them.
   std::unordered_set<std::string> seen;

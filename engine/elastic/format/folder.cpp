@@ -70,6 +70,16 @@ std::string JoinPath(const std::string& folder, const std::string& name) {
   return folder.ends_with('/') ? folder + name : folder + "/" + name;
 }
 
+namespace {
+
+bool IsFolder(const std::string& folder, const dirent& entry) {
+  if (entry.d_type != DT_UNKNOWN && entry.d_type != DT_LNK) return entry.d_type == DT_DIR;
+  struct stat status {};
+  return stat(JoinPath(folder, entry.d_name).c_str(), &status) == 0 && S_ISDIR(status.st_mode);
+}
+
+}  // namespace
+
 DiskFolder::DiskFolder(std::string path) : path_(std::move(path)) {
   // The system would take the part before a zero byte for the path.
   if (path_.find('\0') != std::string::npos) {
@@ -88,7 +98,7 @@ std::vector<std::string> DiskFolder::List() const {
     errno = 0;
     const dirent* entry = readdir(stream.get());
     if (entry == nullptr) break;
-    names.emplace_back(entry->d_name);
+    if (!IsFolder(path_, *entry)) names.emplace_back(entry->d_name);
   }
   if (errno != 0) throw IndexIoError(path_, "cannot list index folder", errno);
   return names;

@@ -22,7 +22,7 @@ class Folder {
   // What error messages call it.
   virtual const std::string& path() const = 0;
 
-  // The names of everything in it, in no order. Throws IndexIoError.
+  // The names of what is in it, but for folders, in no order. Throws IndexIoError.
   virtual std::vector<std::string> List() const = 0;
 
   virtual bool Exists(const std::string& name) const = 0;

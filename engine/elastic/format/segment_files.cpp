@@ -5,6 +5,7 @@
 
 #include "elastic/format/compound_file.h"
 #include "elastic/format/file_names.h"
+#include "vantrel/elastic/index_error.h"
 
 namespace vantrel::elastic::format {
 namespace {
@@ -21,7 +22,7 @@ bool HasDeletions(const Folder& folder, const SegmentInfo& info, const std::stri
 
 }  // namespace
 
-SegmentFiles OpenSegment(const Folder& folder, SegmentInfo info) {
+SegmentFiles OpenSegment(const Folder& folder, SegmentInfo info, Need need) {
   const std::string compound_name = info.name + ".cfs";
   std::optional<CompoundFile> compound;
   if (IsCompound(folder, info, compound_name)) compound.emplace(folder.Open(compound_name));
@@ -36,8 +37,13 @@ SegmentFiles OpenSegment(const Folder& folder, SegmentInfo info) {
   files.terms_index = open(".tii");
   const std::string deletions_name = DeletionsFileName(info.name, info.deletions_generation);
   if (HasDeletions(folder, info, deletions_name)) {
-    files.postings = open(".frq");
-    files.deletions = folder.Open(deletions_name);  // never within the compound file
+    try {
+      files.postings = open(".frq");
+      files.deletions = folder.Open(deletions_name);  // never within the compound file
+    } catch (const IndexError&) {
+      if (need == Need::kAll) throw;
+      files.liveness_failure = std::current_exception();
+    }
   }
   files.info = std::move(info);
   return files;

@@ -1,5 +1,6 @@
 #pragma once
 
+#include <exception>
 #include <memory>
 #include <string>
 
@@ -18,9 +19,14 @@ struct SegmentFiles {
   std::shared_ptr<const ByteSource> terms_index;  // .tii
   std::shared_ptr<const ByteSource> postings;     // .frq, only where documents are deleted
   std::shared_ptr<const ByteSource> deletions;    // .del, only where documents are deleted
+  std::exception_ptr liveness_failure;  // why one of the last two is missing though it should not be
 };
 
+// What must be there: everything, or just what a walk over all terms needs. In the second case what is missing
+// of the rest is told by liveness_failure.
+enum class Need { kAll, kTerms };
+
 // Throws IndexError where a file is missing or cannot be opened.
-SegmentFiles OpenSegment(const Folder& folder, SegmentInfo info);
+SegmentFiles OpenSegment(const Folder& folder, SegmentInfo info, Need need = Need::kAll);
 
 }  // namespace vantrel::elastic::format

@@ -79,7 +79,7 @@ void TermCursor::ReadUtf8Text() {
     Damaged("term shares " + std::to_string(prefix) + " bytes with one of " + std::to_string(text_.size()));
   }
   const size_t length = size_t{prefix} + suffix;
-  if (length > kLongestText) Damaged("term of " + std::to_string(length) + " bytes is too long");
+  if (length > kLongestTerm) Damaged("term of " + std::to_string(length) + " bytes is too long");
   text_.resize(length);
   reader_.ReadBytes(std::span(reinterpret_cast<uint8_t*>(text_.data()) + prefix, suffix));
 }

@@ -22,9 +22,11 @@ struct TermInfo {
 // Memory does not grow with the number of terms. For one thread at a time. Layout, by format F (the newer the
 // smaller; -4 is written today):
 //
-//   Int F                   absent when the first Int is 0 or more: the oldest layout, and that Int is the
-//   count Long count of terms Int index interval, Int skip interval    F = -1: in .tis only, and the second
-//   means something else F <= -3: Int most skip levels then for each term
+//   Int F                 absent when the first Int is 0 or more: the oldest layout, and that is the count
+//   Long count of terms
+//   Int index interval, Int skip interval    F = -1: in .tis only, and the second means something else
+//   F <= -3: Int most skip levels
+//   then for each term
 //     VInt prefix shared with the term before, VInt length of what follows, that text
 //       (F = -4: in bytes, UTF-8; before: in UTF-16 code units, see text.h)
 //     VInt field number     in .tii the first term is empty and bears field number -1

@@ -44,6 +44,21 @@ bool ForEachCodePoint(std::string_view text, Sink sink) {
   return true;
 }
 
+}  // namespace
+
+bool TakeCodePoint(std::string_view& text, char32_t& code_point) {
+  const auto* const begin = reinterpret_cast<const uint8_t*>(text.data());
+  const uint8_t* next = begin;
+  code_point = *next;
+  if (code_point < 0x80) {
+    ++next;
+  } else if (!DecodeMultibyte(next, begin + text.size(), code_point)) {
+    return false;
+  }
+  text.remove_prefix(static_cast<size_t>(next - begin));
+  return true;
+}
+
 void AppendUtf8(char32_t code_point, std::string& out) {
   const auto append = [&out](char32_t byte) { out.push_back(static_cast<char>(byte)); };
   if (code_point < 0x80) {
@@ -62,8 +77,6 @@ void AppendUtf8(char32_t code_point, std::string& out) {
     append(0x80 | (code_point & 0x3f));
   }
 }
-
-}  // namespace
 
 bool IsValidUtf8(std::string_view text) {
   return ForEachCodePoint(text, [](char32_t) {});

@@ -2,8 +2,8 @@
 
 #include <utility>
 
+#include "elastic/format/quoted.h"
 #include "elastic/index/index_text.h"
-#include "elastic/index/quoted.h"
 #include "elastic/index/text_analyzer.h"
 #include "vantrel/elastic/index_error.h"
 
@@ -77,7 +77,7 @@ Lucene::TermPtr DocumentBuilder::BuildTerm(std::string_view field, std::string_v
 
 const DocumentBuilder::Field& DocumentBuilder::Find(std::string_view name) const {
   const auto found = fields_.find(name);
-  if (found == fields_.end()) throw IndexValueError(folder_, "there is no field " + Quoted(name));
+  if (found == fields_.end()) throw IndexValueError(folder_, "there is no field " + format::Quoted(name));
   return found->second;
 }
 
@@ -102,7 +102,7 @@ std::wstring DocumentBuilder::CheckedValue(const Field& field, std::string_view 
 }
 
 void DocumentBuilder::Refuse(std::string_view field, const std::string& problem) const {
-  throw IndexValueError(folder_, "field " + Quoted(field) + ": " + problem);
+  throw IndexValueError(folder_, "field " + format::Quoted(field) + ": " + problem);
 }
 
 }  // namespace vantrel::elastic

@@ -29,7 +29,9 @@ bool WriteFully(int descriptor, std::string_view bytes, uint64_t offset) {
 void WriteFileDurably(const std::string& folder, const std::string& name, std::string_view bytes) {
   const std::string path = format::JoinPath(folder, name);
   const std::string draft = path + ".new";
-  FileDescriptor file(open(draft.c_str(), O_WRONLY | O_CREAT | O_TRUNC | O_CLOEXEC, 0666));
+  // Made anew: whatever bears the name, left behind or laid there (a link, a FIFO), is not written through.
+  if (unlink(draft.c_str()) != 0 && errno != ENOENT) throw IndexIoError(draft, "cannot remove file", errno);
+  FileDescriptor file(open(draft.c_str(), O_WRONLY | O_CREAT | O_EXCL | O_NOFOLLOW | O_CLOEXEC, 0666));
   if (!file.is_open()) throw IndexIoError(draft, "cannot create file", errno);
   const bool written = WriteFully(file.get(), bytes, 0) && fsync(file.get()) == 0 && file.Close() &&
                        rename(draft.c_str(), path.c_str()) == 0;

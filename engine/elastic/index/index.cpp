@@ -1,6 +1,7 @@
 #include "vantrel/elastic/index.h"
 
 #include <sys/stat.h>
+#include <unistd.h>
 
 #include <algorithm>
 #include <cerrno>
@@ -40,12 +41,34 @@ void MakeFolder(const std::string& path) {
   if (errno != EEXIST) throw IndexIoError(path, "cannot create index folder", errno);
 }
 
-// What the library would take for files of an index, and might delete.
+// Whether a first commit was cut short, so that it never became one.
+bool IsCutShort(const format::Folder& folder, const std::string& commit_name) {
+  try {
+    format::ReadCommit(folder.Open(commit_name), 1);
+    return false;
+  } catch (const IndexDamagedError&) {
+    return true;
+  }
+}
+
+// Whether the folder holds what the library would take for files of an index, and might delete. The first commit
+// of an attempt that was cut short is none: it refers to nothing.
 bool HoldsIndexFiles(const std::string& path) {
-  const std::vector<std::string> names = format::DiskFolder(path).List();
-  return std::any_of(names.begin(), names.end(), [](const std::string& name) {
-    return name.starts_with(format::kSegments) || name.starts_with('_');
+  const format::DiskFolder folder(path);
+  const std::vector<std::string> names = folder.List();
+  return std::any_of(names.begin(), names.end(), [&](const std::string& name) {
+    if (name.starts_with('_')) return true;
+    if (!name.starts_with(format::kSegments) || name == format::kSegmentsGen) return false;
+    return name != format::CommitFileName(1) || !IsCutShort(folder, name);
   });
+}
+
+// Makes way for the first commit, where HoldsIndexFiles has found nothing but what may go.
+void RemoveCutShortCommit(const std::string& path) {
+  for (const std::string& name : {format::CommitFileName(1), std::string(format::kSegmentsGen)}) {
+    const std::string file = format::JoinPath(path, name);
+    if (unlink(file.c_str()) != 0 && errno != ENOENT) throw IndexIoError(file, "cannot remove file", errno);
+  }
 }
 
 }  // namespace
@@ -58,7 +81,6 @@ class Index::Impl {
   const std::string& path() const { return path_; }
   const IndexSettings& settings() const { return settings_; }
   const DocumentBuilder& builder() const { return builder_; }
-  bool is_writing() const { return writer_.has_value(); }
 
   void StartWriting(WriteLock lock, LibraryWriter::Start start) {
     lock_ = std::move(lock);
@@ -77,8 +99,30 @@ class Index::Impl {
       operation(*writer_);
     } catch (...) {
       writer_.reset();
+      if (std::exchange(has_changes_, false)) changes_are_lost_ = true;
       throw;
     }
+  }
+
+  template <typename Operation>
+  void Change(Operation operation) {
+    Write(operation);
+    has_changes_ = true;
+  }
+
+  // Commits, unless changes of this round are lost already: that is told once, then what came since counts.
+  void Commit() {
+    if (std::exchange(changes_are_lost_, false)) {
+      throw IndexError(path_, "changes since the last commit were lost when a later one failed");
+    }
+    if (!writer_.has_value()) return;
+    try {
+      Write([](LibraryWriter& writer) { writer.Commit(); });
+    } catch (...) {
+      changes_are_lost_ = false;  // told by this very exception
+      throw;
+    }
+    has_changes_ = false;
   }
 
   // Decodes the newest commit within bounds: the library, which trusts its bytes, reads it next.
@@ -92,6 +136,8 @@ class Index::Impl {
   DocumentBuilder builder_;
   std::optional<WriteLock> lock_;
   std::optional<LibraryWriter> writer_;  // after the lock: it must go first
+  bool has_changes_ = false;             // that are not committed
+  bool changes_are_lost_ = false;        // that a caller takes for made
 };
 
 std::shared_ptr<Index> Index::Create(const std::string& path, const IndexSettings& settings) {
@@ -104,6 +150,7 @@ std::shared_ptr<Index> Index::Create(const std::string& path, const IndexSetting
   // Once more, now that nobody else can be creating one. An index is there when its first commit is: settings
   // alone are what an attempt left that was cut short.
   if (HoldsIndexFiles(path)) throw IndexExistsError(path);
+  RemoveCutShortCommit(path);
   WriteSettings(path, settings);
   auto impl = std::make_unique<Impl>(path, settings);
   impl->StartWriting(std::move(lock), LibraryWriter::Start::kEmptyIndex);
@@ -127,21 +174,19 @@ const IndexSettings& Index::settings() const { return impl_->settings(); }
 
 void Index::Add(const Document& document) {
   const Lucene::DocumentPtr built = impl_->builder().Build(document);
-  impl_->Write([&](LibraryWriter& writer) { writer.Add(built); });
+  impl_->Change([&](LibraryWriter& writer) { writer.Add(built); });
 }
 
 void Index::Delete(std::string_view field, std::string_view value) {
   const Lucene::TermPtr term = impl_->builder().BuildTerm(field, value);
-  impl_->Write([&](LibraryWriter& writer) { writer.Delete(term); });
+  impl_->Change([&](LibraryWriter& writer) { writer.Delete(term); });
 }
 
 void Index::Optimize() {
   impl_->Write([](LibraryWriter& writer) { writer.Optimize(); });
 }
 
-void Index::Commit() {
-  if (impl_->is_writing()) impl_->Write([](LibraryWriter& writer) { writer.Commit(); });
-}
+void Index::Commit() { impl_->Commit(); }
 
 DocumentCounts Index::CountDocuments() const {
   DocumentCounts counts;

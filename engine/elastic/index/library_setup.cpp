@@ -4,12 +4,13 @@
 #include <lucene++/SegmentInfos.h>
 
 #include <boost/filesystem/path.hpp>
-#include <codecvt>
 #include <cstdlib>
 #include <locale>
 #include <mutex>
 #include <optional>
 #include <string>
+
+#include "elastic/index/path_codecvt.h"
 
 namespace vantrel::elastic {
 namespace {
@@ -39,7 +40,7 @@ class EnvironmentOverride {
 void Prepare() {
   // Boost's path type looks up the user's locale before it takes another, and throws where that is invalid.
   const EnvironmentOverride plain_locale("LC_ALL", "C");
-  boost::filesystem::path::imbue(std::locale(std::locale::classic(), new std::codecvt_utf8<wchar_t>));
+  boost::filesystem::path::imbue(std::locale(std::locale::classic(), new PathCodecvt));
   Lucene::SegmentInfos::setDefaultGenFileRetryPauseMsec(0);
 }
 

@@ -9,9 +9,9 @@
 #include <vector>
 
 #include "elastic/format/folder.h"
+#include "elastic/format/quoted.h"
 #include "elastic/index/durable_file.h"
 #include "elastic/index/index_text.h"
-#include "elastic/index/quoted.h"
 #include "vantrel/elastic/index_error.h"
 #include "vantrel/elastic/json_value.h"
 
@@ -52,20 +52,20 @@ class SettingsObject {
   }
 
   const Json::Value& Take(const char* name) {
-    if (!object_.isMember(name)) Refuse("lacks the member " + Quoted(name));
+    if (!object_.isMember(name)) Refuse("lacks the member " + format::Quoted(name));
     taken_.insert(name);
     return object_[name];
   }
 
   bool TakeBool(const char* name) {
     const Json::Value& value = Take(name);
-    if (!value.isBool()) Refuse(std::string("member ") + Quoted(name) + " is neither true nor false");
+    if (!value.isBool()) Refuse(std::string("member ") + format::Quoted(name) + " is neither true nor false");
     return value.asBool();
   }
 
   std::string TakeString(const char* name) {
     const Json::Value& value = Take(name);
-    if (!value.isString()) Refuse(std::string("member ") + Quoted(name) + " is no string");
+    if (!value.isString()) Refuse(std::string("member ") + format::Quoted(name) + " is no string");
     return value.asString();
   }
 
@@ -75,12 +75,12 @@ class SettingsObject {
     for (const auto& entry : table) {
       if (entry.word == word) return entry.value;
     }
-    Refuse(std::string("member ") + Quoted(name) + " has the unknown value " + Quoted(word));
+    Refuse(std::string("member ") + format::Quoted(name) + " has the unknown value " + format::Quoted(word));
   }
 
   void RefuseOthers() const {
     for (const std::string& name : object_.getMemberNames()) {
-      if (!taken_.contains(name)) Refuse("has the unknown member " + Quoted(name));
+      if (!taken_.contains(name)) Refuse("has the unknown member " + format::Quoted(name));
     }
   }
 
@@ -125,10 +125,10 @@ void CheckSettings(const std::string& folder, const IndexSettings& settings) {
     if (field.name.empty()) throw IndexValueError(folder, "the settings have a field without a name");
     std::wstring wide;
     if (const char* problem = ToIndexText(field.name, wide)) {
-      throw IndexValueError(folder, "the field name " + Quoted(field.name) + " " + problem);
+      throw IndexValueError(folder, "the field name " + format::Quoted(field.name) + " " + problem);
     }
     if (!names.insert(field.name).second) {
-      throw IndexValueError(folder, "the settings have two fields of the name " + Quoted(field.name));
+      throw IndexValueError(folder, "the settings have two fields of the name " + format::Quoted(field.name));
     }
   }
 }

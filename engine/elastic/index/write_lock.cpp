@@ -1,6 +1,7 @@
 #include "elastic/index/write_lock.h"
 
 #include <fcntl.h>
+#include <sys/stat.h>
 
 #include <cerrno>
 #include <cstdio>
@@ -12,8 +13,13 @@ namespace vantrel::elastic {
 
 WriteLock::WriteLock(const std::string& folder) {
   const std::string path = format::JoinPath(folder, kFileName);
-  file_ = format::FileDescriptor(open(path.c_str(), O_RDWR | O_CREAT | O_CLOEXEC | O_NONBLOCK, 0666));
+  // No link is followed: it could make a file anywhere.
+  constexpr int kFlags = O_RDWR | O_CREAT | O_NOFOLLOW | O_CLOEXEC | O_NONBLOCK;
+  file_ = format::FileDescriptor(open(path.c_str(), kFlags, 0666));
   if (!file_.is_open()) throw IndexIoError(path, "cannot open lock file", errno);
+  struct stat status {};
+  if (fstat(file_.get(), &status) != 0) throw IndexIoError(path, "cannot examine lock file", errno);
+  if (!S_ISREG(status.st_mode)) throw IndexError(path, "not a regular file");
   struct flock whole_file {};
   whole_file.l_type = F_WRLCK;
   whole_file.l_whence = SEEK_SET;

@@ -8,6 +8,7 @@
 #include "elastic/format/segment_files.h"
 #include "elastic/format/term_cursor.h"
 #include "elastic/terms/term_walk.h"
+#include "vantrel/elastic/index_error.h"
 
 namespace vantrel::elastic {
 namespace {
@@ -37,6 +38,19 @@ uint64_t LoadedBytes(const TermsIndexSize& size, uint64_t divisor) {
   return loaded * kBytesPerTerm + bytes * kBytesPerCharacter;
 }
 
+std::vector<format::SegmentFiles> OpenSegments(const format::Folder& folder, format::Need need) {
+  std::vector<format::SegmentFiles> opened;
+  format::UseNewestCommit(folder, [&](format::Commit commit) {
+    // Apart, so that a failure closes what is open before another commit is tried.
+    std::vector<format::SegmentFiles> segments;
+    for (format::SegmentInfo& segment : commit.segments) {
+      segments.push_back(format::OpenSegment(folder, std::move(segment), need));
+    }
+    opened = std::move(segments);
+  });
+  return opened;
+}
+
 }  // namespace
 
 IndexInfo::IndexInfo(const std::string& path) : path_(path) {}
@@ -45,14 +59,13 @@ IndexInfo::~IndexInfo() = default;
 
 void IndexInfo::initialize() {
   const format::DiskFolder folder(path_);
-  format::UseNewestCommit(folder, [&](format::Commit commit) {
-    // Apart, so that a failure closes what is open before another commit is tried.
-    std::vector<format::SegmentFiles> segments;
-    for (format::SegmentInfo& segment : commit.segments) {
-      segments.push_back(format::OpenSegment(folder, std::move(segment)));
-    }
-    segments_ = std::move(segments);
-  });
+  try {
+    segments_ = OpenSegments(folder, format::Need::kAll);
+  } catch (const IndexError&) {
+    // It is no writer that took the file away, or a newer commit had been found. What all terms are can be told
+    // without knowing which documents are deleted.
+    segments_ = OpenSegments(folder, format::Need::kTerms);
+  }
 }
 
 int IndexInfo::GetSegmentNum() const { return static_cast<int>(segments_.size()); }

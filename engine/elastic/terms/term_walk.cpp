@@ -2,6 +2,7 @@
 
 #include <lucene++/LuceneHeaders.h>
 
+#include <exception>
 #include <utility>
 
 #include "elastic/format/text.h"
@@ -24,6 +25,7 @@ bool LiveTermFilter::IsLive(const format::TermInfo& term, bool omits_frequencies
 
 TermWalk::TermWalk(format::SegmentFiles files, bool live_only)
     : files_(std::move(files)), fields_(format::ReadFieldInfos(files_.field_infos)), cursor_(OpenCursor()) {
+  if (live_only && files_.liveness_failure != nullptr) std::rethrow_exception(files_.liveness_failure);
   if (live_only && files_.deletions != nullptr) {
     live_filter_.emplace(files_);
   } else {

@@ -85,8 +85,10 @@ TEST(CompoundFileTest, RefusesTwoSubFilesOfOneName) {
 }
 
 TEST(CompoundFileTest, AHugeCountOverAHoleInTheFileEndsAtOnce) {
-  const std::string head = ByteWriter().VInt(-1).bytes();
-  ExpectDamage(5, "table reaches", [&] { CompoundFile(SourceOf(head, uint64_t{1} << 40)); });
+  const std::string huge = ByteWriter().VInt(-1).bytes();
+  ExpectDamage(0, "sub-files are too many", [&] { CompoundFile(SourceOf(huge, uint64_t{1} << 40)); });
+  const std::string most = ByteWriter().VInt(65536).bytes();
+  ExpectDamage(3, "table reaches", [&] { CompoundFile(SourceOf(most, uint64_t{1} << 40)); });
 }
 
 }  // namespace

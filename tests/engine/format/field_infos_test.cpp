@@ -105,9 +105,11 @@ TEST(FieldInfosTest, RefusesTwoFieldsOfOneName) {
 
 TEST(FieldInfosTest, AHugeCountOverAHoleInTheFileEndsAtOnce) {
   const std::string head = ByteWriter().VInt(-2).VInt(0x7fffffff).bytes();
-  ExpectDamage(12, "field 1 bears the name", [&] { ReadFieldInfos(SourceOf(head, uint64_t{1} << 40)); });
-  const std::string older = ByteWriter().VInt(0x7fffffff).bytes();
-  ExpectDamage(7, "field 1 bears the name", [&] { ReadFieldInfos(SourceOf(older, uint64_t{1} << 40)); });
+  ExpectDamage(5, "fields are too many", [&] { ReadFieldInfos(SourceOf(head, uint64_t{1} << 40)); });
+  const std::string most = ByteWriter().VInt(-2).VInt(1 << 18).bytes();
+  ExpectDamage(10, "field 1 bears the name", [&] { ReadFieldInfos(SourceOf(most, uint64_t{1} << 40)); });
+  const std::string older = ByteWriter().VInt(1 << 18).bytes();
+  ExpectDamage(5, "field 1 bears the name", [&] { ReadFieldInfos(SourceOf(older, uint64_t{1} << 40)); });
   const std::string long_name = ByteWriter().VInt(-2).VInt(1).VInt(-1).bytes();
   ExpectDamage(6, "string of 4294967295 bytes",
                [&] { ReadFieldInfos(SourceOf(long_name, uint64_t{1} << 40)); });

@@ -157,7 +157,7 @@ TEST(NewestCommitTest, AStrayNameThatStandsForACommitIsNamed) {
     MemoryFolder folder;
     PutCommit(folder, 3);
     folder.files[name] = {};
-    ExpectIndexError(std::string("memory/") + name + ": name stands for a commit", [&] { Used(folder); });
+    ExpectIndexError(std::string("memory: \"") + name + "\" stands for a commit", [&] { Used(folder); });
   }
 }
 

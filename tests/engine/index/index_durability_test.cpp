@@ -57,6 +57,7 @@ using ::quorelastic::testing::Terms;
 using ::testing::Contains;
 using ::testing::ElementsAre;
 using ::testing::EndsWith;
+using ::testing::HasSubstr;
 using ::testing::Not;
 using ::testing::StartsWith;
 
@@ -218,8 +219,27 @@ TEST_F(IndexDurabilityTest, AWriteThatFailsFailsTheRoundAndKeepsTheCommitBefore)
       EXPECT_EQ(error.error_number(), EFBIG);
     }
     ExpectOnlyTheOldCommit();
+    try {
+      index().Commit();
+    } catch (const IndexError& error) {
+      // Where it was not the commit that failed: what had gone well before is lost with it.
+      EXPECT_THAT(error.what(), HasSubstr("changes since the last commit were lost"));
+    }
   }
   ExpectAFreshStart();
+}
+
+TEST_F(IndexDurabilityTest, ACommitTellsOnceThatEarlierChangesAreLost) {
+  index().Add(MakeDocument("early", "text"));
+  {
+    const FileSizeLimit full_disk(0);
+    EXPECT_THROW(index().Optimize(), IndexIoError);  // writes the segment of what was added
+  }
+  index().Add(MakeDocument("late", "text"));
+  EXPECT_THROW(index().Commit(), IndexError);
+  EXPECT_THAT(Terms(path(), "id"), ElementsAre("old"));
+  index().Commit();
+  EXPECT_THAT(Terms(path(), "id"), ElementsAre("late", "old"));
 }
 
 TEST_F(IndexDurabilityTest, AMergeThatFailsKeepsTheCommitBefore) {

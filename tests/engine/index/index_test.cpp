@@ -3,6 +3,7 @@
 #include <gmock/gmock.h>
 #include <gtest/gtest.h>
 #include <sys/stat.h>
+#include <unistd.h>
 
 #include <cstdlib>
 #include <filesystem>
@@ -102,6 +103,66 @@ TEST(IndexTest, AnAttemptToCreateThatWasCutShortDoesNotHinderTheNext) {
   WriteFile(folder / "quorelastic.lock", "");
   Index::Create(folder.path(), IdAndBody());
   EXPECT_EQ(Index::Open(folder.path())->settings().fields.size(), 2U);
+}
+
+TEST(IndexTest, AFirstCommitThatWasCutShortDoesNotHinderTheNext) {
+  for (const std::string& torn : {std::string(), std::string("\xff\xff\xff\xf7", 4)}) {
+    const TemporaryFolder folder;
+    WriteFile(folder / "segments_1", torn);
+    WriteFile(folder / "segments.gen", "x");
+    Index::Create(folder.path(), IdAndBody())->Add(MakeDocument("a", "text"));
+    EXPECT_EQ(Index::Open(folder.path())->CountDocuments().live, 0U);
+  }
+}
+
+TEST(IndexTest, ATornCommitBesideFilesOfASegmentIsSomebodysIndex) {
+  const TemporaryFolder folder;
+  WriteFile(folder / "segments_1", "");
+  WriteFile(folder / "_0.cfs", "somebody's");
+  EXPECT_THROW(Index::Create(folder.path(), IdAndBody()), IndexExistsError);
+  EXPECT_EQ(ReadFile(folder / "_0.cfs"), "somebody's");
+}
+
+TEST(IndexTest, NothingIsWrittenThroughALinkThatWasLaidInTheFolder) {
+  for (const char* name : {"quorelastic.json.new", "quorelastic.json", "quorelastic.lock"}) {
+    SCOPED_TRACE(name);
+    const TemporaryFolder folder;
+    const std::string victim = folder / "victim";
+    WriteFile(victim, "precious");
+    std::filesystem::create_directory(folder / "index");
+    std::filesystem::create_symlink(victim, folder / (std::string("index/") + name));
+    try {
+      Index::Create(folder / "index", IdAndBody());
+    } catch (const IndexError&) {
+      // Refusing is as good as replacing the link.
+    }
+    EXPECT_EQ(ReadFile(victim), "precious");
+  }
+}
+
+TEST(IndexTest, AFifoInPlaceOfAFileOfOursDoesNotHoldUpAnybody) {
+  for (const char* name : {"quorelastic.json.new", "quorelastic.json", "quorelastic.lock"}) {
+    SCOPED_TRACE(name);
+    const TemporaryFolder folder;
+    ASSERT_EQ(mkfifo((folder / name).c_str(), 0666), 0);
+    alarm(10);  // what is held up is ended
+    try {
+      Index::Create(folder.path(), IdAndBody());
+    } catch (const IndexError& error) {
+      EXPECT_THAT(error.what(), HasSubstr(name));
+    }
+    alarm(0);
+  }
+}
+
+TEST(IndexTest, AFileNameThatIsNoUtf8DoesNotHinderWriting) {
+  const TemporaryFolder folder;
+  const auto index = Index::Create(folder.path(), IdAndBody());
+  WriteFile(folder / "caf\xe9.txt", "stray");
+  index->Add(MakeDocument("a", "text"));
+  index->Commit();
+  EXPECT_THAT(Terms(folder.path(), "id"), ElementsAre("a"));
+  EXPECT_EQ(ReadFile(folder / "caf\xe9.txt"), "stray");
 }
 
 TEST(IndexTest, AParentThatIsMissingIsNamed) {

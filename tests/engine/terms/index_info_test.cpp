@@ -4,6 +4,10 @@
 #include <gtest/gtest.h>
 #include <lucene++/LuceneHeaders.h>
 
+#include <filesystem>
+
+#include "support/expect_damage.h"
+#include "support/files.h"
 #include "support/library_index.h"
 #include "support/temporary_folder.h"
 #include "vantrel/elastic/class_init.h"
@@ -11,6 +15,8 @@
 namespace vantrel::elastic {
 namespace {
 
+using ::quorelastic::testing::ExpectIndexError;
+using ::quorelastic::testing::FindFile;
 using ::quorelastic::testing::LibraryIndex;
 using ::quorelastic::testing::TemporaryFolder;
 using ::testing::ElementsAre;
@@ -41,6 +47,33 @@ TEST(IndexInfoTest, ATermWhoseDocumentsAreAllDeletedIsNoLongerLive) {
   EXPECT_THAT(AllTerms(*info, 0, false),
               ElementsAre("body:both", "body:first", "body:second", "id:a", "id:b"));
   EXPECT_THAT(AllTerms(*info, 0, true), ElementsAre("body:both", "body:second", "id:b"));
+}
+
+TEST(IndexInfoTest, AFolderThatBearsTheNameOfACommitIsNoCommit) {
+  const TemporaryFolder folder;
+  { LibraryIndex(folder.path()).Add({{.name = "body", .value = "word"}}); }
+  std::filesystem::create_directory(folder / "segments_old");
+  std::filesystem::create_directory(folder / "segments_9");
+  EXPECT_THAT(AllTerms(*newClassInit<IndexInfo>(folder.path()), 0, false), ElementsAre("body:word"));
+}
+
+TEST(IndexInfoTest, WithoutWhatTellsLiveTermsAllTermsAreStillWalked) {
+  for (const std::string ending : {".frq", ".del"}) {
+    SCOPED_TRACE(ending);
+    const TemporaryFolder folder;
+    {
+      LibraryIndex index(folder.path(), {.compound = false});
+      index.Add({{.name = "id", .value = "a", .keyword = true}});
+      index.Add({{.name = "id", .value = "b", .keyword = true}});
+      index.Commit();
+      index.Delete("id", "a");
+    }
+    const std::string missing = folder / FindFile(folder.path(), ending);
+    std::filesystem::remove(missing);
+    const auto info = newClassInit<IndexInfo>(folder.path());
+    EXPECT_THAT(AllTerms(*info, 0, false), ElementsAre("id:a", "id:b"));
+    ExpectIndexError(missing + ": cannot open file", [&] { info->GetTermDict(0, true); });
+  }
 }
 
 }  // namespace

@@ -56,7 +56,7 @@ TEST_P(CLuceneIndexTest, ReadsAsTheIndexLibraryReadsIt) {
     all += segment.all.size();
     live += segment.live.size();
   }
-  EXPECT_EQ(live<all, shape.deletions> 0);
+  EXPECT_EQ(live < all, (shape.deletions > 0));
   ExpectSameTerms(folder.path(), expected);
 }
 

@@ -30,6 +30,9 @@ struct DocumentCounts {
 //   IndexLockedError  somebody else is writing
 //   any other         disk, memory or files failed; where a change was under way, every change since the last
 //                     commit is lost, and the next one starts anew from that commit
+//
+// Before it writes, the commit is checked, but not yet the segments: the index library may crash over damage in
+// one that it has to merge or to delete from.
 class VANTREL_ELASTIC_EXPORT Index {
  public:
   // Makes an empty index in the folder `path`, taken byte for byte, which is created where it is missing; its
@@ -61,7 +64,8 @@ class VANTREL_ELASTIC_EXPORT Index {
   void Optimize();
 
   // Makes every change durable and visible: once this has returned, a crash or a loss of power does not undo
-  // it. Without changes it does nothing.
+  // it. Without changes it does nothing. Where an earlier failure has lost changes, it commits nothing and throws
+  // once; what was changed since then is committed by the next call.
   void Commit();
 
   // The documents of the newest commit, whoever made it.

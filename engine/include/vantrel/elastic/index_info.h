@@ -25,7 +25,8 @@ class VANTREL_ELASTIC_EXPORT IndexInfo {
   ~IndexInfo();
 
   // Reads the commit and opens the files; to be called once, before anything else. Throws IndexError: no such
-  // folder, no index in it, a file missing, unreadable or damaged.
+  // folder, no index in it, a file missing, unreadable or damaged. A missing file that just live_only needs is
+  // reported by GetTermDict.
   void initialize();
 
   // The number of segments, 0 or more.

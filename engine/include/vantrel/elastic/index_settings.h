@@ -20,8 +20,8 @@ struct FieldSettings {
   bool stored = true;  // a search can hand back the value
   TermVector term_vector = TermVector::kNone;
   bool norms = true;  // short values score higher; takes one byte a document
-  bool frequencies =
-      true;  // how often and where a term stands in a document; without them, no phrase is found
+  // How often and where a term stands in a document; without them, no phrase is found.
+  bool frequencies = true;
 };
 
 struct IndexSettings {

@@ -1,13 +1,13 @@
-#include "elastic/index/quoted.h"
+#include "elastic/format/quoted.h"
 
 #include "elastic/format/text.h"
 
-namespace vantrel::elastic {
+namespace vantrel::elastic::format {
 
 std::string Quoted(std::string_view name) {
   constexpr size_t kMostBytes = 80;
   constexpr char kHexDigits[] = "0123456789abcdef";
-  const bool is_text = format::IsValidUtf8(name);
+  const bool is_text = IsValidUtf8(name);
   std::string quoted = "\"";
   for (const char c : name) {
     const auto byte = static_cast<unsigned char>(c);
@@ -23,4 +23,4 @@ std::string Quoted(std::string_view name) {
   return quoted + "\"";
 }
 
-}  // namespace vantrel::elastic
+}  // namespace vantrel::elastic::format
