@@ -199,25 +199,28 @@ TEST_F(FailIfTest, TellsAStaleErrorOnlyOnce) {
                                         LoggedMessage{LOG_ERR, ExpectedStart()}));
 }
 
+void RejectWithAFormat(bool bad) { FailIf(bad, Error::kInvalidInput, "100% %s %n %m"); }
+
+// Without braces: the check must be one statement, which an else can follow.
+void CheckOrElse(bool wanted, int& evaluations) {
+  if (wanted)
+    FailIf(++evaluations > 5, Error::kInvalidInput, "");
+  else
+    evaluations = -1;
+}
+
 TEST_F(FailIfTest, PassesAReasonThatLooksLikeAFormat) {
   errno = 0;
-  const auto check = [](bool bad) { FailIf(bad, Error::kInvalidInput, "100% %s %n %m"); };
-  EXPECT_THROW(check(true), Error);
+  EXPECT_THROW(RejectWithAFormat(true), Error);
   ASSERT_EQ(log_messages.size(), 1U);
   EXPECT_THAT(log_messages[0].text, ::testing::EndsWith("Failed [bad], reason: 100% %s %n %m"));
 }
 
 TEST_F(FailIfTest, EvaluatesItsConditionOnceAndIsOneStatement) {
   int evaluations = 0;
-  const auto check = [&](bool wanted) {
-    if (wanted)
-      FailIf(++evaluations > 5, Error::kInvalidInput, "");
-    else
-      evaluations = -1;
-  };
-  check(true);
+  CheckOrElse(true, evaluations);
   EXPECT_EQ(evaluations, 1);
-  check(false);
+  CheckOrElse(false, evaluations);
   EXPECT_EQ(evaluations, -1);
 }
 

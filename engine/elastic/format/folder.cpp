@@ -82,8 +82,9 @@ bool IsFolder(const std::string& folder, const dirent& entry) {
 
 DiskFolder::DiskFolder(std::string path) : path_(std::move(path)) {
   // The system would take the part before a zero byte for the path.
-  if (path_.find('\0') != std::string::npos) {
-    throw IndexIoError(path_.c_str(), "path goes on after a zero byte", ENOENT);
+  const size_t zero = path_.find('\0');
+  if (zero != std::string::npos) {
+    throw IndexIoError(path_.substr(0, zero), "path goes on after a zero byte", ENOENT);
   }
   struct stat status {};
   if (stat(path_.c_str(), &status) != 0) throw IndexIoError(path_, "cannot open index folder", errno);

@@ -69,7 +69,7 @@ TEST(ByteReaderTest, ReadsTheSameWhateverTheLengthOfItsBuffer) {
   ByteWriter writer;
   for (int i = 0; i < 50; ++i) {
     writer.Byte(i)
-        .Int(i * 1000003)
+        .Int(int64_t{i} * 1000003)
         .Long(-i)
         .VInt(1 << (i % 31))
         .VLong(uint64_t{1} << (i % 63))

@@ -13,8 +13,6 @@ namespace {
 
 using ::quorelastic::testing::ByteWriter;
 using ::quorelastic::testing::ExpectDamage;
-using ::quorelastic::testing::MemoryFile;
-using ::quorelastic::testing::MemorySource;
 using ::quorelastic::testing::SourceOf;
 
 std::string BitsOf(int32_t documents, const std::set<int32_t>& deleted) {

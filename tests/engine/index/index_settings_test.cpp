@@ -17,7 +17,6 @@ namespace {
 
 using ::quorelastic::testing::IdAndBody;
 using ::quorelastic::testing::ListFolder;
-using ::quorelastic::testing::ReadFile;
 using ::quorelastic::testing::TemporaryFolder;
 using ::quorelastic::testing::WriteFile;
 using ::testing::Contains;

@@ -20,7 +20,6 @@
 namespace vantrel::elastic {
 namespace {
 
-using ::quorelastic::testing::CopyFolder;
 using ::quorelastic::testing::DocumentsWith;
 using ::quorelastic::testing::IdAndBody;
 using ::quorelastic::testing::LibraryIndex;
