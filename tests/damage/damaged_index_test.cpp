@@ -35,6 +35,9 @@ struct Shape {
   const char* older_layout = nullptr;  // written by the older library instead, "plain" or "compound"
 };
 
+// What the test runner shows of it.
+void PrintTo(const Shape& shape, std::ostream* out) { *out << shape.name; }
+
 // In all of them the dictionary's index has several entries, and every reading has postings to look at where
 // documents are deleted.
 const Shape kShapes[] = {

@@ -35,6 +35,11 @@ struct CLuceneCase {
   int deletions;
 };
 
+// What the test runner shows of it.
+void PrintTo(const CLuceneCase& shape, std::ostream* out) {
+  *out << shape.layout << ", " << shape.documents << " documents, " << shape.deletions << " deletions";
+}
+
 class CLuceneIndexTest : public ::testing::TestWithParam<CLuceneCase> {};
 
 INSTANTIATE_TEST_SUITE_P(Shapes, CLuceneIndexTest,
