@@ -9,6 +9,7 @@
 #include <cerrno>
 #include <utility>
 
+#include "elastic/format/file_descriptor.h"
 #include "vantrel/elastic/index_error.h"
 
 namespace vantrel::elastic::format {
@@ -17,31 +18,12 @@ namespace {
 // The kernel caps one read a little under 2 GiB; smaller pieces keep a signal's restart cheap.
 constexpr size_t kLongestRead = size_t{1} << 30;
 
-std::string JoinPath(const std::string& folder, const std::string& name) {
-  return folder.ends_with('/') ? folder + name : folder + "/" + name;
-}
-
-class FileDescriptor {
- public:
-  explicit FileDescriptor(int descriptor) : descriptor_(descriptor) {}
-  FileDescriptor(const FileDescriptor&) = delete;
-  FileDescriptor& operator=(const FileDescriptor&) = delete;
-  ~FileDescriptor() {
-    if (descriptor_ >= 0) close(descriptor_);
-  }
-
-  int get() const { return descriptor_; }
-
- private:
-  int descriptor_;
-};
-
 class FileSource : public ByteSource {
  public:
   // Non-blocking, so that a FIFO that bears an index file's name cannot hold us up.
   explicit FileSource(std::string path)
       : path_(std::move(path)), file_(open(path_.c_str(), O_RDONLY | O_CLOEXEC | O_NONBLOCK)) {
-    if (file_.get() < 0) throw IndexIoError(path_, "cannot open file", errno);
+    if (!file_.is_open()) throw IndexIoError(path_, "cannot open file", errno);
     struct stat status {};
     if (fstat(file_.get(), &status) != 0) throw IndexIoError(path_, "cannot examine file", errno);
     if (S_ISDIR(status.st_mode)) throw IndexIoError(path_, "cannot open file", EISDIR);
@@ -71,6 +53,10 @@ class FileSource : public ByteSource {
 };
 
 }  // namespace
+
+std::string JoinPath(const std::string& folder, const std::string& name) {
+  return folder.ends_with('/') ? folder + name : folder + "/" + name;
+}
 
 DiskFolder::DiskFolder(std::string path) : path_(std::move(path)) {
   struct stat status {};

@@ -8,6 +8,9 @@
 
 namespace vantrel::elastic::format {
 
+// The path of `name` in `folder`, whether or not the folder's path ends with a slash.
+std::string JoinPath(const std::string& folder, const std::string& name);
+
 // Where the files of an index stand side by side.
 class Folder {
  public:

@@ -14,4 +14,10 @@ IndexIoError::IndexIoError(const std::string& path, const std::string& problem, 
 IndexDamagedError::IndexDamagedError(const std::string& path, uint64_t offset, const std::string& problem)
     : IndexError(path, "offset " + std::to_string(offset) + ": " + problem), offset_(offset) {}
 
+IndexExistsError::IndexExistsError(const std::string& path)
+    : IndexError(path, "there is an index in this folder already") {}
+
+IndexLockedError::IndexLockedError(const std::string& path)
+    : IndexError(path, "the index is open for writing elsewhere") {}
+
 }  // namespace vantrel::elastic

@@ -46,4 +46,23 @@ class VANTREL_ELASTIC_EXPORT IndexDamagedError : public IndexError {
   uint64_t offset_;
 };
 
+// There is an index already where one is to be created. path() is the folder.
+class VANTREL_ELASTIC_EXPORT IndexExistsError : public IndexError {
+ public:
+  explicit IndexExistsError(const std::string& path);
+};
+
+// Somebody else, in this process or another, has the index open for writing. path() is the folder.
+class VANTREL_ELASTIC_EXPORT IndexLockedError : public IndexError {
+ public:
+  explicit IndexLockedError(const std::string& path);
+};
+
+// What was handed in cannot be taken: settings that contradict themselves, a document that does not fit the
+// settings, a text that is not valid. The index is as it was before the call. path() is the folder.
+class VANTREL_ELASTIC_EXPORT IndexValueError : public IndexError {
+ public:
+  using IndexError::IndexError;
+};
+
 }  // namespace vantrel::elastic

@@ -1,0 +1,169 @@
+#include "elastic/index/disk_directory.h"
+
+#include <fcntl.h>
+#include <sys/stat.h>
+#include <unistd.h>
+
+// Not without the index library's main header.
+#include <lucene++/BufferedIndexInput.h>
+#include <lucene++/BufferedIndexOutput.h>
+#include <lucene++/NoLockFactory.h>
+
+#include <cerrno>
+#include <span>
+#include <utility>
+
+#include "elastic/format/file_descriptor.h"
+#include "elastic/format/file_names.h"
+#include "elastic/format/folder.h"
+#include "elastic/index/durable_file.h"
+
+namespace vantrel::elastic {
+namespace {
+
+using Lucene::newLucene;
+using Lucene::StringUtils;
+
+class DiskOutput : public Lucene::BufferedIndexOutput {
+ public:
+  DiskOutput(boost::shared_ptr<DiskDirectory> directory, std::string path)
+      : directory_(std::move(directory)), path_(std::move(path)) {
+    file_ = format::FileDescriptor(::open(path_.c_str(), O_WRONLY | O_CREAT | O_EXCL | O_CLOEXEC, 0666));
+    if (!file_.is_open()) directory_->Fail(IndexIoError(path_, "cannot create file", errno));
+  }
+
+  using BufferedIndexOutput::flushBuffer;
+
+  void flushBuffer(const uint8_t* bytes, int32_t offset, int32_t length) override {
+    const std::string_view piece(reinterpret_cast<const char*>(bytes) + offset, static_cast<size_t>(length));
+    if (WriteFully(file_.get(), piece, static_cast<uint64_t>(bufferStart))) return;
+    directory_->Fail(IndexIoError(path_, "cannot write file", errno));
+  }
+
+  void close() override {
+    if (!file_.is_open()) return;
+    BufferedIndexOutput::close();
+    if (!file_.Close()) directory_->Fail(IndexIoError(path_, "cannot write file", errno));
+  }
+
+  int64_t length() override {
+    struct stat status {};
+    if (fstat(file_.get(), &status) == 0) return status.st_size;
+    directory_->Fail(IndexIoError(path_, "cannot examine file", errno));
+  }
+
+ private:
+  boost::shared_ptr<DiskDirectory> directory_;
+  std::string path_;
+  format::FileDescriptor file_;
+};
+
+// Clones share the file and outlive the original's close().
+class DiskInput : public Lucene::BufferedIndexInput {
+ public:
+  DiskInput() = default;  // of a clone to be
+  DiskInput(std::shared_ptr<const format::ByteSource> source, int32_t buffer_size)
+      : BufferedIndexInput(buffer_size), source_(std::move(source)) {}
+
+  int64_t length() override { return source_ == nullptr ? 0 : static_cast<int64_t>(source_->size()); }
+
+  void close() override {
+    BufferedIndexInput::close();
+    source_.reset();
+  }
+
+  Lucene::LuceneObjectPtr clone(const Lucene::LuceneObjectPtr& other) override {
+    const auto copy = BufferedIndexInput::clone(other ? other : newLucene<DiskInput>());
+    boost::dynamic_pointer_cast<DiskInput>(copy)->source_ = source_;
+    return copy;
+  }
+
+ protected:
+  void readInternal(uint8_t* bytes, int32_t offset, int32_t length) override {
+    if (source_ == nullptr) boost::throw_exception(Lucene::AlreadyClosedException(L"this file is closed"));
+    try {
+      source_->ReadAt(static_cast<uint64_t>(getFilePointer()),
+                      std::span(bytes + offset, static_cast<size_t>(length)));
+    } catch (const IndexError& error) {
+      boost::throw_exception(Lucene::IOException(StringUtils::toUnicode(error.what())));
+    }
+  }
+
+  void seekInternal(int64_t /*position*/) override {}
+
+ private:
+  std::shared_ptr<const format::ByteSource> source_;
+};
+
+}  // namespace
+
+DiskDirectory::DiskDirectory(const std::string& path)
+    : SimpleFSDirectory(StringUtils::toUnicode(path), Lucene::NoLockFactory::getNoLockFactory()),
+      path_(path) {}
+
+DiskDirectory::~DiskDirectory() = default;
+
+void DiskDirectory::Fail(const IndexIoError& error) {
+  // segments.gen is but a hint, written when the commit is already durable: whoever reads it can do without.
+  const bool harmless = error.path() == format::JoinPath(path_, std::string(format::kSegmentsGen));
+  if (!failure_.has_value() && !harmless) failure_ = error;
+  boost::throw_exception(Lucene::IOException(StringUtils::toUnicode(error.what())));
+}
+
+Lucene::IndexOutputPtr DiskDirectory::createOutput(const Lucene::String& name) {
+  ensureOpen();
+  if (failure_.has_value()) Fail(*failure_);
+  const std::string own_name = StringUtils::toUTF8(name);
+  const std::string path = format::JoinPath(path_, own_name);
+  // Never written over: readers may hold the old file open.
+  if (unlink(path.c_str()) != 0 && errno != ENOENT) Fail(IndexIoError(path, "cannot replace file", errno));
+  uncommitted_.insert(own_name);
+  return newLucene<DiskOutput>(boost::static_pointer_cast<DiskDirectory>(shared_from_this()), path);
+}
+
+Lucene::IndexInputPtr DiskDirectory::openInput(const Lucene::String& name) {
+  return openInput(name, Lucene::BufferedIndexInput::BUFFER_SIZE);
+}
+
+Lucene::IndexInputPtr DiskDirectory::openInput(const Lucene::String& name, int32_t buffer_size) {
+  ensureOpen();
+  try {
+    return newLucene<DiskInput>(format::DiskFolder(path_).Open(StringUtils::toUTF8(name)), buffer_size);
+  } catch (const IndexError& error) {
+    boost::throw_exception(Lucene::FileNotFoundException(StringUtils::toUnicode(error.what())));
+  }
+}
+
+void DiskDirectory::sync(const Lucene::String& name) {
+  ensureOpen();
+  if (failure_.has_value()) Fail(*failure_);
+  const std::string own_name = StringUtils::toUTF8(name);
+  try {
+    SyncFile(format::JoinPath(path_, own_name));
+    if (!format::CommitGeneration(own_name).has_value()) return;
+    SyncFolder(path_);
+  } catch (const IndexIoError& error) {
+    Fail(error);
+  }
+  uncommitted_.clear();
+}
+
+void DiskDirectory::deleteFile(const Lucene::String& name) {
+  ensureOpen();
+  const std::string own_name = StringUtils::toUTF8(name);
+  if (failure_.has_value() && !uncommitted_.contains(own_name)) Fail(*failure_);
+  const std::string path = format::JoinPath(path_, own_name);
+  if (unlink(path.c_str()) != 0) {
+    // No harm to the index: the library tries again, and every writer removes what no commit refers to.
+    const IndexIoError error(path, "cannot delete file", errno);
+    boost::throw_exception(Lucene::IOException(StringUtils::toUnicode(error.what())));
+  }
+  uncommitted_.erase(own_name);
+}
+
+void DiskDirectory::SyncFile(const std::string& path) {
+  const format::FileDescriptor file(::open(path.c_str(), O_RDONLY | O_CLOEXEC));
+  if (!file.is_open() || fsync(file.get()) != 0) throw IndexIoError(path, "cannot make file durable", errno);
+}
+
+}  // namespace vantrel::elastic

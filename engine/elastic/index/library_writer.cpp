@@ -1,0 +1,87 @@
+#include "elastic/index/library_writer.h"
+
+// Not without the index library's main header.
+#include <lucene++/LogByteSizeMergePolicy.h>
+#include <lucene++/SerialMergeScheduler.h>
+
+#include <exception>
+#include <utility>
+
+#include "elastic/index/text_analyzer.h"
+
+namespace vantrel::elastic {
+namespace {
+
+using Lucene::newLucene;
+using Lucene::StringUtils;
+
+// Changes are kept in memory up to this size before they go to a segment of their own.
+constexpr double kBufferMegabytes = 64;
+
+}  // namespace
+
+LibraryWriter::LibraryWriter(std::string folder, const WriteLock& /*lock*/, bool compound_files, Start start)
+    : folder_(std::move(folder)) {
+  Run("cannot open the index for writing", [&] { Open(compound_files, start); });
+}
+
+LibraryWriter::~LibraryWriter() { RollBack(); }
+
+void LibraryWriter::Open(bool compound_files, Start start) {
+  directory_ = newLucene<DiskDirectory>(folder_);
+  writer_ = newLucene<Lucene::IndexWriter>(directory_, NewTextAnalyzer(), start == Start::kEmptyIndex,
+                                           Lucene::IndexWriter::MaxFieldLengthUNLIMITED);
+  const auto policy = newLucene<Lucene::LogByteSizeMergePolicy>(writer_);
+  policy->setUseCompoundFile(compound_files);
+  policy->setUseCompoundDocStore(compound_files);
+  writer_->setMergePolicy(policy);
+  // Merges on the caller's thread: the library's background merges report failures to nobody.
+  writer_->setMergeScheduler(newLucene<Lucene::SerialMergeScheduler>());
+  writer_->setRAMBufferSizeMB(kBufferMegabytes);
+}
+
+void LibraryWriter::Add(const Lucene::DocumentPtr& document) {
+  Run("cannot add a document", [&] { writer_->addDocument(document); });
+}
+
+void LibraryWriter::Delete(const Lucene::TermPtr& term) {
+  Run("cannot delete documents", [&] { writer_->deleteDocuments(term); });
+}
+
+void LibraryWriter::Optimize() {
+  Run("cannot optimize", [&] { writer_->optimize(); });
+}
+
+void LibraryWriter::Commit() {
+  Run("cannot commit", [&] { writer_->commit(); });
+}
+
+void LibraryWriter::Run(const char* purpose, const std::function<void()>& operation) {
+  std::string reason;
+  try {
+    operation();
+    if (!directory_->failure().has_value()) return;
+  } catch (const Lucene::LuceneException& error) {
+    reason = StringUtils::toUTF8(error.getError());
+    RollBack();
+  } catch (const std::exception& error) {
+    // The library tidies up after its own exceptions only: a roll-back might now wait for ever.
+    reason = error.what();
+    writer_.reset();
+  }
+  if (directory_ && directory_->failure().has_value()) throw IndexIoError(*directory_->failure());
+  if (reason.empty()) reason = "the index library gives no reason";
+  throw IndexError(folder_, std::string(purpose) + ": " + reason);
+}
+
+void LibraryWriter::RollBack() {
+  if (!writer_) return;
+  try {
+    writer_->rollback();
+  } catch (...) {
+    // Whatever it leaves behind no commit refers to; the next writer removes it.
+  }
+  writer_.reset();
+}
+
+}  // namespace vantrel::elastic

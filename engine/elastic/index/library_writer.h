@@ -1,0 +1,43 @@
+#pragma once
+
+#include <lucene++/LuceneHeaders.h>
+
+#include <functional>
+#include <string>
+
+#include "elastic/index/disk_directory.h"
+#include "elastic/index/write_lock.h"
+
+namespace vantrel::elastic {
+
+// The index library's writer, in two steps from changes to a commit, with its failures turned into ours. Once
+// an operation has thrown, the writer is of no more use: every change since the last commit is lost. What is
+// not committed is dropped on destruction. For one thread at a time.
+class LibraryWriter {
+ public:
+  enum class Start { kEmptyIndex, kExistingIndex };
+
+  // `lock` stands on `folder` as long as the writer lives. With kEmptyIndex, an empty commit is made at once.
+  // Throws IndexError.
+  LibraryWriter(std::string folder, const WriteLock& lock, bool compound_files, Start start);
+  LibraryWriter(const LibraryWriter&) = delete;
+  LibraryWriter& operator=(const LibraryWriter&) = delete;
+  ~LibraryWriter();
+
+  void Add(const Lucene::DocumentPtr& document);
+  void Delete(const Lucene::TermPtr& term);
+  void Optimize();
+  void Commit();
+
+ private:
+  // Runs an operation of the library; `purpose` says what cannot be done where it fails.
+  void Run(const char* purpose, const std::function<void()>& operation);
+  void Open(bool compound_files, Start start);
+  void RollBack();
+
+  std::string folder_;
+  boost::shared_ptr<DiskDirectory> directory_;
+  Lucene::IndexWriterPtr writer_;
+};
+
+}  // namespace vantrel::elastic

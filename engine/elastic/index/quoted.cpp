@@ -1,0 +1,26 @@
+#include "elastic/index/quoted.h"
+
+#include "elastic/format/text.h"
+
+namespace vantrel::elastic {
+
+std::string Quoted(std::string_view name) {
+  constexpr size_t kMostBytes = 80;
+  constexpr char kHexDigits[] = "0123456789abcdef";
+  const bool is_text = format::IsValidUtf8(name);
+  std::string quoted = "\"";
+  for (const char c : name) {
+    const auto byte = static_cast<unsigned char>(c);
+    const bool starts_character = (byte & 0xc0) != 0x80;
+    if (quoted.size() >= kMostBytes && starts_character) return quoted + "...\"";
+    const bool is_plain = byte >= 0x80 ? is_text : byte >= 0x20 && byte != 0x7f && c != '"' && c != '\\';
+    if (is_plain) {
+      quoted += c;
+    } else {
+      quoted += {'\\', 'x', kHexDigits[byte >> 4], kHexDigits[byte & 0xf]};
+    }
+  }
+  return quoted + "\"";
+}
+
+}  // namespace vantrel::elastic

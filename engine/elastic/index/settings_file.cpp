@@ -1,0 +1,172 @@
+#include "elastic/index/settings_file.h"
+
+#include <array>
+#include <cstddef>
+#include <set>
+#include <span>
+#include <string_view>
+#include <utility>
+#include <vector>
+
+#include "elastic/format/folder.h"
+#include "elastic/index/durable_file.h"
+#include "elastic/index/index_text.h"
+#include "elastic/index/quoted.h"
+#include "vantrel/elastic/index_error.h"
+#include "vantrel/elastic/json_value.h"
+
+namespace vantrel::elastic {
+namespace {
+
+constexpr int kVersion = 1;
+constexpr uint64_t kLargestFile = uint64_t{16} << 20;
+
+template <typename T>
+struct Word {
+  T value;
+  const char* word;
+};
+
+constexpr std::array kTypes = {Word<FieldType>{FieldType::kText, "text"},
+                               Word<FieldType>{FieldType::kKeyword, "keyword"}};
+
+constexpr std::array kTermVectors = {
+    Word<TermVector>{TermVector::kNone, "none"}, Word<TermVector>{TermVector::kTerms, "terms"},
+    Word<TermVector>{TermVector::kPositions, "positions"}, Word<TermVector>{TermVector::kOffsets, "offsets"},
+    Word<TermVector>{TermVector::kPositionsAndOffsets, "positions_offsets"}};
+
+template <typename Table, typename T>
+const char* ToWord(const Table& table, T value) {
+  for (const auto& entry : table) {
+    if (entry.value == value) return entry.word;
+  }
+  return "";
+}
+
+// One JSON object of the file. Members are taken one by one; what is left over at the end was unknown.
+class SettingsObject {
+ public:
+  SettingsObject(const std::string& path, const Json::Value& object, std::string where)
+      : path_(path), object_(object), where_(std::move(where)) {
+    if (!object_.isObject()) Refuse("is no object");
+  }
+
+  const Json::Value& Take(const char* name) {
+    if (!object_.isMember(name)) Refuse("lacks the member " + Quoted(name));
+    taken_.insert(name);
+    return object_[name];
+  }
+
+  bool TakeBool(const char* name) {
+    const Json::Value& value = Take(name);
+    if (!value.isBool()) Refuse(std::string("member ") + Quoted(name) + " is neither true nor false");
+    return value.asBool();
+  }
+
+  std::string TakeString(const char* name) {
+    const Json::Value& value = Take(name);
+    if (!value.isString()) Refuse(std::string("member ") + Quoted(name) + " is no string");
+    return value.asString();
+  }
+
+  template <typename Table>
+  auto TakeWord(const char* name, const Table& table) {
+    const std::string word = TakeString(name);
+    for (const auto& entry : table) {
+      if (entry.word == word) return entry.value;
+    }
+    Refuse(std::string("member ") + Quoted(name) + " has the unknown value " + Quoted(word));
+  }
+
+  void RefuseOthers() const {
+    for (const std::string& name : object_.getMemberNames()) {
+      if (!taken_.contains(name)) Refuse("has the unknown member " + Quoted(name));
+    }
+  }
+
+  [[noreturn]] void Refuse(const std::string& problem) const {
+    throw IndexError(path_, where_ + " " + problem);
+  }
+
+ private:
+  const std::string& path_;
+  const Json::Value& object_;
+  std::string where_;
+  std::set<std::string> taken_;
+};
+
+FieldSettings ReadField(const std::string& path, const Json::Value& value, size_t number) {
+  SettingsObject object(path, value, "field " + std::to_string(number));
+  FieldSettings field;
+  field.name = object.TakeString("name");
+  field.type = object.TakeWord("type", kTypes);
+  field.stored = object.TakeBool("stored");
+  field.term_vector = object.TakeWord("term_vector", kTermVectors);
+  field.norms = object.TakeBool("norms");
+  field.frequencies = object.TakeBool("frequencies");
+  object.RefuseOthers();
+  return field;
+}
+
+std::string ReadWholeFile(const std::string& folder) {
+  const auto file = format::DiskFolder(folder).Open(kSettingsFileName);
+  if (file->size() > kLargestFile) throw IndexError(file->name(), "too large for a settings file");
+  std::string text(file->size(), '\0');
+  file->ReadAt(0, std::span(reinterpret_cast<uint8_t*>(text.data()), text.size()));
+  return text;
+}
+
+}  // namespace
+
+void CheckSettings(const std::string& folder, const IndexSettings& settings) {
+  if (settings.fields.empty()) throw IndexValueError(folder, "the settings have no field");
+  std::set<std::string_view> names;
+  for (const FieldSettings& field : settings.fields) {
+    if (field.name.empty()) throw IndexValueError(folder, "the settings have a field without a name");
+    std::wstring wide;
+    if (const char* problem = ToIndexText(field.name, wide)) {
+      throw IndexValueError(folder, "the field name " + Quoted(field.name) + " " + problem);
+    }
+    if (!names.insert(field.name).second) {
+      throw IndexValueError(folder, "the settings have two fields of the name " + Quoted(field.name));
+    }
+  }
+}
+
+void WriteSettings(const std::string& folder, const IndexSettings& settings) {
+  JsonValue root(Json::objectValue);
+  root["version"] = kVersion;
+  root["compound_files"] = settings.compound_files;
+  root["fields"] = Json::arrayValue;
+  for (const FieldSettings& field : settings.fields) {
+    Json::Value& object = root["fields"].append(Json::objectValue);
+    object["name"] = field.name;
+    object["type"] = ToWord(kTypes, field.type);
+    object["stored"] = field.stored;
+    object["term_vector"] = ToWord(kTermVectors, field.term_vector);
+    object["norms"] = field.norms;
+    object["frequencies"] = field.frequencies;
+  }
+  WriteFileDurably(folder, kSettingsFileName, root.toString() + "\n");
+}
+
+IndexSettings ReadSettings(const std::string& folder) {
+  const std::string path = format::JoinPath(folder, kSettingsFileName);
+  JsonValue root;
+  if (!root.fromString(ReadWholeFile(folder))) throw IndexError(path, "the settings are no JSON document");
+  SettingsObject object(path, root, "settings file");
+  const Json::Value& version = object.Take("version");
+  if (!version.isInt() || version.asInt() != kVersion) object.Refuse("is of an unknown version");
+  IndexSettings settings;
+  settings.compound_files = object.TakeBool("compound_files");
+  const Json::Value& fields = object.Take("fields");
+  if (!fields.isArray()) object.Refuse("member \"fields\" is no array");
+  for (const Json::Value& field : fields) {
+    settings.fields.push_back(ReadField(path, field, settings.fields.size() + 1));
+  }
+  object.RefuseOthers();
+  CheckSettings(path, settings);
+  return settings;
+}
+
+}  // namespace vantrel::elastic

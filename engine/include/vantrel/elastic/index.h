@@ -1,0 +1,78 @@
+#pragma once
+
+#include <cstdint>
+#include <memory>
+#include <string>
+#include <string_view>
+
+#include "vantrel/elastic/document.h"
+#include "vantrel/elastic/export.h"
+#include "vantrel/elastic/index_settings.h"
+
+namespace vantrel::elastic {
+
+struct DocumentCounts {
+  uint64_t live = 0;
+  uint64_t deleted = 0;  // still taking space until their segments are merged
+};
+
+// An index in a folder of its own: the files of the index library and, beside them, the settings.
+//
+// Writing works in rounds: what Add, Delete and Optimize do is kept back, in memory and in files that no reader
+// looks at, until Commit makes all of it visible and durable at once. What is not committed when the object
+// goes is dropped.
+//
+// The first change takes the index's write lock and keeps it as long as the object lives; there is one writer
+// at a time, over all processes. An Index that changes nothing leaves the folder alone.
+//
+// For one thread at a time. Errors are IndexError (index_error.h):
+//   IndexValueError   the argument cannot be taken; nothing happened, everything else still holds
+//   IndexLockedError  somebody else is writing
+//   any other         disk, memory or files failed; where a change was under way, every change since the last
+//                     commit is lost, and the next one starts anew from that commit
+class VANTREL_ELASTIC_EXPORT Index {
+ public:
+  // Makes an empty index in the folder `path`, taken byte for byte, which is created where it is missing; its
+  // parent must exist. The result holds the write lock. Throws also IndexExistsError. Where this fails, the
+  // folder may stay behind; nothing in it hinders another attempt.
+  static std::shared_ptr<Index> Create(const std::string& path, const IndexSettings& settings);
+
+  // Opens the index in a folder. Nothing is created, locked or changed.
+  static std::shared_ptr<Index> Open(const std::string& path);
+
+  Index(const Index&) = delete;
+  Index& operator=(const Index&) = delete;
+  ~Index();
+
+  const std::string& path() const;
+  const IndexSettings& settings() const;
+
+  // Adds a document, wholly or not at all. Refused are: a field without settings, a value that is not valid
+  // UTF-8 or holds a character that the files cannot keep (U+FFFE, U+FFFF, U+1FFFF; in a text also U+0000), a
+  // keyword or a word of a text above 16383 characters, and values of more than 256 MiB in all.
+  void Add(const Document& document);
+
+  // Deletes every document, also of this round, that holds exactly this term: a keyword's value, or one word
+  // of a text in the form it is indexed in.
+  void Delete(std::string_view field, std::string_view value);
+
+  // Merges all segments into one and leaves the deleted documents out. Takes long, and for a while twice the
+  // disk space, up to the next commit.
+  void Optimize();
+
+  // Makes every change durable and visible: once this has returned, a crash or a loss of power does not undo
+  // it. Without changes it does nothing.
+  void Commit();
+
+  // The documents of the newest commit, whoever made it.
+  DocumentCounts CountDocuments() const;
+
+ private:
+  class Impl;
+
+  explicit Index(std::unique_ptr<Impl> impl);
+
+  std::unique_ptr<Impl> impl_;
+};
+
+}  // namespace vantrel::elastic

@@ -1,0 +1,32 @@
+#pragma once
+
+#include <string>
+#include <vector>
+
+namespace vantrel::elastic {
+
+enum class FieldType {
+  kText,     // cut into words, lower-cased; each word is a term
+  kKeyword,  // the value as it is, is the one term
+};
+
+// What is kept, beside the postings, about the words of each single document.
+enum class TermVector { kNone, kTerms, kPositions, kOffsets, kPositionsAndOffsets };
+
+// How the values of one field are indexed. Settled when the index is created.
+struct FieldSettings {
+  std::string name;  // valid UTF-8, not empty
+  FieldType type = FieldType::kText;
+  bool stored = true;  // a search can hand back the value
+  TermVector term_vector = TermVector::kNone;
+  bool norms = true;  // short values score higher; takes one byte a document
+  bool frequencies =
+      true;  // how often and where a term stands in a document; without them, no phrase is found
+};
+
+struct IndexSettings {
+  std::vector<FieldSettings> fields;  // at least one, no two of one name
+  bool compound_files = true;         // one file a segment: fewer open files, a little more work to write
+};
+
+}  // namespace vantrel::elastic
