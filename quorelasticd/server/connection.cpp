@@ -20,13 +20,8 @@ constexpr size_t kReadPiece = size_t{64} << 10;
 
 }  // namespace
 
-Connection::Connection(Socket socket, Service& service, asio::thread_pool& slow_threads,
-                       const ConnectionTimeouts& timeouts)
-    : socket_(std::move(socket)),
-      service_(service),
-      slow_threads_(slow_threads),
-      timeouts_(timeouts),
-      timer_(socket_.get_executor()) {}
+Connection::Connection(Socket socket, Service& service, const ConnectionTimeouts& timeouts)
+    : socket_(std::move(socket)), service_(service), timeouts_(timeouts), timer_(socket_.get_executor()) {}
 
 void Connection::Start() {
   asio::post(socket_.get_executor(), [self = shared_from_this()] { self->ReadHeader(); });
@@ -34,8 +29,7 @@ void Connection::Start() {
 
 void Connection::Refuse(std::string reply) {
   asio::post(socket_.get_executor(), [self = shared_from_this(), reply = std::move(reply)]() mutable {
-    self->finishing_ = true;
-    self->WriteReply(std::move(reply), true);
+    self->RefuseRequest(std::move(reply));
   });
 }
 
@@ -60,8 +54,7 @@ void Connection::ReadHeader() {
     self->request_length_ = quordaemon::DecodeHeader(self->header_);
     if (self->request_length_ > quordaemon::kLongestMessage) {
       // What follows cannot be told apart from the next request any more.
-      self->finishing_ = true;
-      return self->WriteReply(self->service_.RefuseTooLong(), true);
+      return self->RefuseRequest(self->service_.RefuseTooLong());
     }
     self->arrived_ = 0;
     self->request_.clear();
@@ -73,6 +66,7 @@ void Connection::ReadPayload() {
   if (arrived_ == request_length_) {
     timer_.cancel();
     request_.resize(arrived_);
+    if (finishing_) return RefuseRequest(service_.RefuseShuttingDown());
     execution_ = service_.Begin(std::exchange(request_, std::string()));
     return RunStep();
   }
@@ -89,18 +83,19 @@ void Connection::ReadPayload() {
 }
 
 void Connection::RunStep() {
-  if (!execution_->IsSlow()) return AfterStep(execution_->Run());
+  const asio::any_io_executor executor = execution_->executor();
+  if (!executor) return AfterStep(execution_->Run());
   // The guard keeps the strand's threads from leaving while nothing but this step is under way.
-  asio::post(slow_threads_,
-             [self = shared_from_this(), guard = asio::make_work_guard(socket_.get_executor())] {
-               Execution::Step step = self->execution_->Run();
-               asio::post(self->socket_.get_executor(),
-                          [self, step = std::move(step)]() mutable { self->AfterStep(std::move(step)); });
-             });
+  asio::post(executor, [self = shared_from_this(), guard = asio::make_work_guard(socket_.get_executor())] {
+    Execution::Step step = self->execution_->Run();
+    asio::post(self->socket_.get_executor(),
+               [self, step = std::move(step)]() mutable { self->AfterStep(std::move(step)); });
+  });
 }
 
 void Connection::AfterStep(Execution::Step step) {
-  if (step.finished) execution_.reset();
+  if (step.finished || !socket_.is_open()) execution_.reset();
+  if (!socket_.is_open()) return;
   if (step.reply.has_value()) return WriteReply(std::move(*step.reply), step.finished);
   // Posted, so that a long row of silent steps neither nests nor keeps this thread from others.
   asio::post(socket_.get_executor(), [self = shared_from_this()] { self->RunStep(); });
@@ -131,7 +126,29 @@ void Connection::AfterReply(bool finished) {
   timer_.cancel();
   reply_.clear();
   if (reply_.capacity() > kReadPiece) reply_.shrink_to_fit();
+  if (refused_) return Linger();
   finished ? ReadHeader() : RunStep();
+}
+
+void Connection::RefuseRequest(std::string reply) {
+  finishing_ = true;
+  refused_ = true;
+  WriteReply(std::move(reply), true);
+}
+
+// To close while the client still sends would make its sending fail before it reads the refusal.
+void Connection::Linger() {
+  error_code ignored;
+  socket_.shutdown(Socket::shutdown_send, ignored);
+  ArmTimer(timeouts_.lingering);
+  request_.resize(kReadPiece);
+  DropWhatComes();
+}
+
+void Connection::DropWhatComes() {
+  socket_.async_read_some(asio::buffer(request_), [self = shared_from_this()](error_code error, size_t) {
+    error ? self->Close() : self->DropWhatComes();
+  });
 }
 
 void Connection::ArmTimer(std::chrono::milliseconds limit) {

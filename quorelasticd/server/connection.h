@@ -3,9 +3,7 @@
 #include <boost/asio/io_context.hpp>
 #include <boost/asio/local/stream_protocol.hpp>
 #include <boost/asio/steady_timer.hpp>
-#include <boost/asio/thread_pool.hpp>
 #include <chrono>
-#include <functional>
 #include <memory>
 #include <string>
 
@@ -15,9 +13,12 @@
 namespace quorelasticd {
 
 struct ConnectionTimeouts {
-  std::chrono::milliseconds idle{std::chrono::minutes(5)};  // between two requests
-  std::chrono::milliseconds stalled{
-      std::chrono::seconds(30)};  // within a message, either way, without progress
+  // Between two requests.
+  std::chrono::milliseconds idle{std::chrono::minutes(5)};
+  // Within a message, either way, without progress.
+  std::chrono::milliseconds stalled{std::chrono::seconds(30)};
+  // For a client that was refused to hang up.
+  std::chrono::milliseconds lingering{std::chrono::seconds(2)};
 };
 
 // One client: reads a request, runs it, writes its replies, then reads the next. At most one request and one
@@ -27,15 +28,13 @@ class Connection : public std::enable_shared_from_this<Connection> {
  public:
   using Socket = boost::asio::local::stream_protocol::socket;
 
-  // `socket` must live on a strand of its own; `slow_threads` runs the steps that may take long. `service` and
-  // `slow_threads` must outlive the connection.
-  Connection(Socket socket, Service& service, boost::asio::thread_pool& slow_threads,
-             const ConnectionTimeouts& timeouts);
+  // `socket` must live on a strand of its own. `service` must outlive the connection.
+  Connection(Socket socket, Service& service, const ConnectionTimeouts& timeouts);
 
   // To be called once; from then on the connection keeps itself alive.
   void Start();
 
-  // Writes one last reply and closes; instead of Start().
+  // Writes one last reply, whatever the client sends, and closes; instead of Start().
   void Refuse(std::string reply);
 
   // Ends the connection: at once when it waits for a request, else after the last reply of the one under way.
@@ -53,13 +52,15 @@ class Connection : public std::enable_shared_from_this<Connection> {
   void AfterStep(Execution::Step step);
   void WriteReply(std::string reply, bool finished);
   void AfterReply(bool finished);
+  void RefuseRequest(std::string reply);
+  void Linger();
+  void DropWhatComes();
 
   void ArmTimer(std::chrono::milliseconds limit);
   void Close();
 
   Socket socket_;
   Service& service_;
-  boost::asio::thread_pool& slow_threads_;
   ConnectionTimeouts timeouts_;
   boost::asio::steady_timer timer_;
 
@@ -71,7 +72,8 @@ class Connection : public std::enable_shared_from_this<Connection> {
   std::string reply_;
   size_t written_ = 0;
   bool awaiting_request_ = false;
-  bool finishing_ = false;
+  bool finishing_ = false;  // no further request is begun
+  bool refused_ = false;    // the reply under way is the last, and was given before all was read
 };
 
 }  // namespace quorelasticd

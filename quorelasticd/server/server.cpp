@@ -6,6 +6,7 @@
 #include <boost/asio/post.hpp>
 #include <boost/asio/strand.hpp>
 #include <csignal>
+#include <exception>
 #include <thread>
 #include <utility>
 
@@ -15,15 +16,19 @@ namespace {
 namespace asio = boost::asio;
 using boost::system::error_code;
 
-constexpr auto kPauseWithoutDescriptors = std::chrono::milliseconds(100);
+// Clients beyond the limit that are told so at the same time; the rest is hung up on.
+constexpr size_t kMostRefusals = 64;
+
+constexpr auto kPauseAfterFailure = std::chrono::milliseconds(100);
 
 }  // namespace
 
-Server::Server(int listener, Service& service, const ServerLimits& limits)
+Server::Server(int listener, Service& service, const ServerLimits& limits,
+               std::atomic<size_t>& connection_count)
     : limits_(limits),
       service_(service),
+      connection_count_(connection_count),
       io_(static_cast<int>(limits.threads)),
-      slow_threads_(limits.threads),
       strand_(asio::make_strand(io_)),
       acceptor_(strand_, asio::local::stream_protocol(), listener),
       signals_(strand_, SIGTERM, SIGINT),
@@ -32,7 +37,8 @@ Server::Server(int listener, Service& service, const ServerLimits& limits)
 
 Server::~Server() = default;
 
-void Server::Run() {
+void Server::Run(const std::function<void()>& on_stop) {
+  on_stop_ = on_stop;
   signals_.async_wait([this](error_code error, int signal) {
     if (error) return;
     spdlog::info("signal {}: finishing what is running", signal);
@@ -40,10 +46,21 @@ void Server::Run() {
   });
   asio::post(strand_, [this] { Accept(); });
   std::vector<std::thread> threads;
-  for (size_t i = 1; i < limits_.threads; ++i) threads.emplace_back([this] { io_.run(); });
-  io_.run();
+  for (size_t i = 1; i < limits_.threads; ++i) threads.emplace_back([this] { RunThread(); });
+  RunThread();
   for (std::thread& thread : threads) thread.join();
-  slow_threads_.join();
+}
+
+// A handler that throws, for want of memory, drops its connection; the others go on.
+void Server::RunThread() {
+  for (;;) {
+    try {
+      io_.run();
+      return;
+    } catch (const std::exception& error) {
+      spdlog::error("a connection is dropped: {}", error.what());
+    }
+  }
 }
 
 void Server::Stop() {
@@ -55,12 +72,17 @@ void Server::Accept() {
   acceptor_.async_accept(asio::make_strand(io_), [this](error_code error, Connection::Socket socket) {
     if (stopping_) return;
     if (!error) {
-      Admit(std::move(socket));
+      try {
+        Admit(std::move(socket));
+      } catch (const std::exception& failure) {
+        spdlog::error("a client is dropped: {}", failure.what());
+      }
       return Accept();
     }
-    if (error != asio::error::no_descriptors) return Accept();
+    if (error == asio::error::connection_aborted) return Accept();
+    // Descriptors or memory have run out: trying again at once would only burn the processor.
     spdlog::warn("cannot accept a client: {}", error.message());
-    pause_.expires_after(kPauseWithoutDescriptors);
+    pause_.expires_after(kPauseAfterFailure);
     pause_.async_wait([this](error_code) { Accept(); });
   });
 }
@@ -73,12 +95,13 @@ void Server::Admit(Connection::Socket socket) {
     asio::post(strand_, [this] { CancelDeadlineIfIdle(); });
   };
   const bool is_full = connection_count_ >= limits_.connections;
+  if (connection_count_ >= limits_.connections + kMostRefusals) return;
   ++connection_count_;
-  const std::shared_ptr<Connection> connection(
-      new Connection(std::move(socket), service_, slow_threads_, limits_.timeouts), release);
+  const std::shared_ptr<Connection> connection(new Connection(std::move(socket), service_, limits_.timeouts),
+                                               release);
   std::erase_if(connections_, [](const std::weak_ptr<Connection>& gone) { return gone.expired(); });
   connections_.push_back(connection);
-  is_full ? connection->Refuse(service_.RefuseTooManyConnections()) : connection->Start();
+  is_full ? connection->Refuse(service_.RefuseTooManyConnections(limits_.connections)) : connection->Start();
 }
 
 std::vector<std::shared_ptr<Connection>> Server::LiveConnections() {
@@ -92,6 +115,7 @@ std::vector<std::shared_ptr<Connection>> Server::LiveConnections() {
 void Server::BeginStop() {
   if (stopping_) return;
   stopping_ = true;
+  on_stop_();
   error_code ignored;
   acceptor_.close(ignored);
   signals_.clear(ignored);  // a second signal ends the process at once

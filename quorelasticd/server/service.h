@@ -1,5 +1,7 @@
 #pragma once
 
+#include <boost/asio/any_io_executor.hpp>
+#include <cstddef>
 #include <memory>
 #include <optional>
 #include <string>
@@ -21,11 +23,12 @@ class Execution {
   Execution& operator=(const Execution&) = delete;
   virtual ~Execution() = default;
 
-  // Whether a step may take long (a write, a merge): such steps are kept away from the threads that serve
-  // quick requests.
-  virtual bool IsSlow() const = 0;
+  // Where the steps run. Steps that may take long (a write, a merge) name an executor of their own, which keeps
+  // them away from the threads that serve quick requests; a strand keeps them in turn with others. Empty for
+  // quick steps. Must not throw; asked before each step.
+  virtual boost::asio::any_io_executor executor() const = 0;
 
-  // Does a part of the work. Must not throw.
+  // Does a part of the work. Must not throw. An execution that is no longer wanted is destroyed between steps.
   virtual Step Run() = 0;
 };
 
@@ -40,9 +43,10 @@ class Service {
   // Begins to work on one request, whatever its bytes are. Must not throw.
   virtual std::unique_ptr<Execution> Begin(std::string request) = 0;
 
-  // The final reply for a request that never got that far, by the limit that it exceeded.
+  // The final reply for a request that never gets that far, by what stands in its way.
   virtual std::string RefuseTooLong() = 0;  // longer than quordaemon::kLongestMessage
-  virtual std::string RefuseTooManyConnections() = 0;
+  virtual std::string RefuseTooManyConnections(size_t most) = 0;
+  virtual std::string RefuseShuttingDown() = 0;
 };
 
 }  // namespace quorelasticd
