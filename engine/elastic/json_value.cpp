@@ -3,7 +3,6 @@
 #include <json/reader.h>
 #include <json/writer.h>
 
-#include <exception>
 #include <fstream>
 #include <memory>
 #include <sstream>
@@ -19,7 +18,7 @@ bool JsonValue::fromString(const std::string& text) {
   try {
     const std::unique_ptr<Json::CharReader> reader(builder.newCharReader());
     parsed = reader->parse(text.data(), text.data() + text.size(), this, nullptr);
-  } catch (const std::exception&) {
+  } catch (const Json::Exception&) {
     // The library throws, rather than answers false, where a document is nested too deep.
   }
   if (!parsed) Json::Value::operator=(Json::Value());

@@ -3,7 +3,6 @@
 #include <json/reader.h>
 
 #include <algorithm>
-#include <exception>
 #include <memory>
 
 #include "base/limits.h"
@@ -42,7 +41,7 @@ std::string ParserComplaint(const std::string& text) {
     Json::Value ignored;
     const std::unique_ptr<Json::CharReader> reader(builder.newCharReader());
     reader->parse(text.data(), text.data() + text.size(), &ignored, &complaint);
-  } catch (const std::exception& error) {
+  } catch (const Json::Exception& error) {
     complaint = error.what();
   }
   constexpr size_t kLongestComplaint = 200;

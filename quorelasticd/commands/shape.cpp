@@ -29,12 +29,21 @@ std::string TypeOf(const Json::Value& value) {
   return "something else";
 }
 
+// As the end of "expected ...".
+std::string Expected(const Shape& shape) {
+  const std::string text = Describe(shape);
+  if (shape.kind == Shape::Kind::kBoolean || shape.kind == Shape::Kind::kAny || text.front() == '"')
+    return text;
+  const bool starts_with_vowel = text.front() == 'a' || text.front() == 'i' || text.front() == 'o';
+  return (starts_with_vowel ? "an " : "a ") + text;
+}
+
 [[noreturn]] void Refuse(const std::string& path, const std::string& problem) {
   throw RequestError(ErrorCode::kBadRequest, path + ": " + problem);
 }
 
 [[noreturn]] void RefuseType(const Shape& shape, const Json::Value& value, const std::string& path) {
-  Refuse(path, "expected " + Describe(shape) + ", found " + TypeOf(value));
+  Refuse(path, "expected " + Expected(shape) + ", found " + TypeOf(value));
 }
 
 bool IsOfKind(const Shape& shape, const Json::Value& value) {
@@ -63,23 +72,23 @@ bool IsOfKind(const Shape& shape, const Json::Value& value) {
 void CheckInteger(const Shape& shape, const Json::Value& value, const std::string& path) {
   const int64_t number = value.asInt64();
   if (number >= shape.least && number <= shape.most) return;
-  Refuse(path, "expected " + Describe(shape) + ", found " + std::to_string(number));
+  Refuse(path, "expected " + Expected(shape) + ", found " + std::to_string(number));
 }
 
 void CheckString(const Shape& shape, const Json::Value& value, const std::string& path) {
   const std::string text = value.asString();
   if (text.empty() && !shape.may_be_empty)
-    Refuse(path, "expected " + Describe(shape) + ", found an empty one");
+    Refuse(path, "expected " + Expected(shape) + ", found an empty one");
   if (static_cast<int64_t>(text.size()) > shape.most) throw LimitExceeded(path, shape.most, "bytes");
   if (FindInvalidUtf8(text) != std::string::npos) Refuse(path, "is no valid Unicode text");
   if (shape.choices.empty()) return;
   if (std::find(shape.choices.begin(), shape.choices.end(), text) != shape.choices.end()) return;
-  Refuse(path, "expected " + Describe(shape) + ", found " + Quoted(text));
+  Refuse(path, "expected " + Expected(shape) + ", found " + Quoted(text));
 }
 
 void CheckArray(const Shape& shape, const Json::Value& value, const std::string& path) {
   if (value.empty() && !shape.may_be_empty)
-    Refuse(path, "expected " + Describe(shape) + ", found an empty one");
+    Refuse(path, "expected " + Expected(shape) + ", found an empty one");
   if (static_cast<int64_t>(value.size()) > shape.most) throw LimitExceeded(path, shape.most, "elements");
   const Shape& element = shape.of.front();
   if (element.kind == Shape::Kind::kAny) return;
@@ -112,7 +121,7 @@ void CheckObject(const Shape& shape, const Json::Value& value, const std::string
     if (found != nullptr) {
       CheckShape(member.shape, *found, inner);
     } else if (member.is_required) {
-      Refuse(inner, "missing; expected " + Describe(member.shape));
+      Refuse(inner, "missing; expected " + Expected(member.shape));
     }
   }
 }
