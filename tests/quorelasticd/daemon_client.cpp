@@ -37,4 +37,10 @@ bool DaemonClient::IsHungUp() {
   return !Recv(text);
 }
 
+std::string ManyWords(int count) {
+  std::string words;
+  for (int i = 0; i < count; ++i) words.append("w").append(std::to_string(i)).append(" ");
+  return words;
+}
+
 }  // namespace quorelastic::testing

@@ -33,4 +33,7 @@ class DaemonClient : public quordaemon::DomainSockConnection {
   bool IsHungUp();
 };
 
+// A text of so many different words.
+std::string ManyWords(int count);
+
 }  // namespace quorelastic::testing

@@ -29,6 +29,14 @@ namespace {
   _exit(127);
 }
 
+// The convention of systemd: descriptor 3, and two variables.
+void PassListener(int listener) {
+  constexpr int kFirstPassed = 3;
+  dup2(listener, kFirstPassed);
+  setenv("LISTEN_FDS", "1", 1);
+  setenv("LISTEN_PID", std::to_string(getpid()).c_str(), 1);
+}
+
 int BindDatagramSocket(const std::string& path) {
   sockaddr_un address{};
   address.sun_family = AF_UNIX;
@@ -46,13 +54,14 @@ int ToStatus(int status) { return WIFEXITED(status) ? WEXITSTATUS(status) : -WTE
 
 }  // namespace
 
-DaemonProcess::DaemonProcess(const std::string& folder, const std::vector<std::string>& arguments)
+DaemonProcess::DaemonProcess(const std::string& folder, const std::vector<std::string>& arguments,
+                             int listener)
     : socket_(folder + "/socket"),
       data_(folder + "/data"),
       log_(folder + "/log"),
       notify_path_(folder + "/notify"),
       notify_socket_(BindDatagramSocket(notify_path_)) {
-  Start(arguments);
+  Start(arguments, listener);
   WaitUntilReady();
 }
 
@@ -64,7 +73,7 @@ DaemonProcess::~DaemonProcess() {
   close(notify_socket_);
 }
 
-void DaemonProcess::Start(const std::vector<std::string>& arguments) {
+void DaemonProcess::Start(const std::vector<std::string>& arguments, int listener) {
   std::vector<std::string> all = {"--socket", socket_, "--data", data_};
   all.insert(all.end(), arguments.begin(), arguments.end());
   pid_ = fork();
@@ -73,6 +82,7 @@ void DaemonProcess::Start(const std::vector<std::string>& arguments) {
   setenv("NOTIFY_SOCKET", notify_path_.c_str(), 1);
   const int log = open(log_.c_str(), O_WRONLY | O_CREAT | O_APPEND, 0600);
   dup2(log, STDERR_FILENO);
+  if (listener != -1) PassListener(listener);
   Execute(all);
 }
 

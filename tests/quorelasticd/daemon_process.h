@@ -10,8 +10,10 @@ namespace quorelastic::testing {
 // A real daemon, with its socket, its data and its log in a folder of the test.
 class DaemonProcess {
  public:
-  // Starts it with further arguments and waits until it says that it is ready, or has ended.
-  explicit DaemonProcess(const std::string& folder, const std::vector<std::string>& arguments = {});
+  // Starts it with further arguments and waits until it says that it is ready, or has ended. `listener`, where
+  // given, is passed to it as a service manager does.
+  explicit DaemonProcess(const std::string& folder, const std::vector<std::string>& arguments = {},
+                         int listener = -1);
   DaemonProcess(const DaemonProcess&) = delete;
   DaemonProcess& operator=(const DaemonProcess&) = delete;
 
@@ -38,7 +40,7 @@ class DaemonProcess {
   int Stop();
 
  private:
-  void Start(const std::vector<std::string>& arguments);
+  void Start(const std::vector<std::string>& arguments, int listener);
   void WaitUntilReady();
   bool HasEnded();
 

@@ -67,7 +67,7 @@ TEST(Options, WhatMakesNoSenseIsRefusedInOneLine) {
   EXPECT_EQ(Complaint({"--log-level", "loud"}),
             "--log-level: expected debug, info, warning or error, found \"loud\"");
   EXPECT_EQ(Complaint({"--socket", ""}), "--socket: expected a path, found none");
-  EXPECT_EQ(Complaint({"--data="}), "--data: expected a folder, found none");
+  EXPECT_EQ(Complaint({"--data", ""}), "--data: expected a folder, found none");
   for (const std::vector<const char*>& arguments :
        std::vector<std::vector<const char*>>{{"--bogus"},
                                              {"--thread", "1"},
