@@ -64,7 +64,7 @@ using vantrel::elastic::JsonValue;
 constexpr auto kInvalid = vantrel::Error::kInvalidInput;
 
 // Stands where an action's body is still to come.
-[[noreturn]] void NotBuiltYet() { throw std::logic_error("not built yet"); }
+[[noreturn]] void NotBuiltYet(const std::string& what) { throw std::logic_error(what + ": not built yet"); }
 
 // The parser returns the letter. There are no short options: a single dash introduces any unambiguous
 // beginning of a long name, so that -s (--string or --size) and -S (neither) are rejected.
@@ -176,9 +176,9 @@ void DoDumpDB(const std::string& index_id) {
 //   shown as if it were one   --help, which is an unknown argument like any other and ends with status 1
 constexpr std::string_view kUsage[] = {
     "Usage: quorelastic",
-    "  -a, --action           allowed action: command, search, allterm, term, dump, doc_term, occupy_mem, "
-    "check, "
-    "repair, plugin, vmtouch",
+    ("  -a, --action           allowed action: "
+     "command, search, allterm, term, dump, doc_term, occupy_mem, "
+     "check, repair, plugin, vmtouch"),
     "  -s, --string           Json format string",
     "  -p, --path             Json data path",
     "  -d, --db_path          DB path",
@@ -296,11 +296,11 @@ bool RunAction(const OptionSet& options) {
   } else if (action == "position") {
     ShowTermPositions(options.db, OptionSet::field, options.token, options.ndoc);
   } else if (action == "term_suggest") {
-    NotBuiltYet();
+    NotBuiltYet("term_suggest");
   } else if (action == "doc_term") {
     ShowDocTerms(options.db, OptionSet::field, options.ndoc);
   } else if (action == "occupy_mem") {
-    NotBuiltYet();
+    NotBuiltYet("occupy_mem");
   } else if (action == "check") {
     Check(options.db);
   } else if (action == "repair") {
@@ -308,7 +308,7 @@ bool RunAction(const OptionSet& options) {
   } else if (action == "plugin") {
     // Accepted, and does nothing.
   } else if (action == "vmtouch") {
-    NotBuiltYet();
+    NotBuiltYet("vmtouch");
   } else {
     return false;
   }
@@ -320,7 +320,7 @@ void Check(const std::string& db_path) {
   static_assert(__LINE__ == 320, "the system log names the line of the check below");
   FailIf(db_path.empty(), kInvalid, "db_path is required.");
 
-  NotBuiltYet();
+  NotBuiltYet("check");
 }
 
 // Prints what came of it, "clean" or "done"; both go to standard error.
@@ -331,7 +331,7 @@ void Repair(const std::string& db_path) {
   static_assert(__LINE__ == 331, "the system log names the line of the check below");
   FailIf(db_path.empty(), kInvalid, "db_path is required.");
 
-  NotBuiltYet();
+  NotBuiltYet("repair");
 }
 
 }  // namespace

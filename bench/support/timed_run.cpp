@@ -11,8 +11,6 @@
 #include <stdexcept>
 #include <system_error>
 
-extern char** environ;
-
 namespace quorelastic::bench {
 namespace {
 

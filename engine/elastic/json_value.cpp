@@ -12,6 +12,7 @@ namespace vantrel::elastic {
 bool JsonValue::fromString(const std::string& text) {
   Json::CharReaderBuilder builder;
   builder["collectComments"] = false;
+  builder["allowTrailingCommas"] = false;
   builder["failIfExtra"] = true;
   builder["stackLimit"] = 1000;
   bool parsed = false;

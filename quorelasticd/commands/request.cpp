@@ -35,6 +35,7 @@ int64_t JsonDepth(const std::string& text) {
 std::string ParserComplaint(const std::string& text) {
   Json::CharReaderBuilder builder;
   builder["collectComments"] = false;
+  builder["allowTrailingCommas"] = false;
   builder["failIfExtra"] = true;
   std::string complaint;
   try {

@@ -119,6 +119,7 @@ std::string ByteReader::ReadString() {
     Damaged(start, "string of " + std::to_string(length) + " bytes reaches past the end of the file at " +
                        std::to_string(size()));
   }
+  if (length > kLongestText) Damaged(start, "string of " + std::to_string(length) + " bytes is too long");
   std::string text(length, '\0');
   ReadBytes(std::span(reinterpret_cast<uint8_t*>(text.data()), text.size()));
   if (!IsValidUtf8(text)) Damaged(start, "string is not valid UTF-8");

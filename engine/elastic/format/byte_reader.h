@@ -13,9 +13,11 @@ namespace vantrel::elastic::format {
 
 // A buffered cursor over a byte source that decodes the primitives of index files:
 //
-//   Int    4 bytes, big-endian, signed          VInt   1 to 5 bytes, 7 bits each, lowest first, high bit =
-//   more Long   8 bytes, big-endian, signed          VLong  1 to 9 bytes, the same String VInt length in
-//   bytes, then UTF-8
+//   Int     4 bytes, big-endian, signed
+//   Long    8 bytes, big-endian, signed
+//   VInt    1 to 5 bytes of 7 bits each, lowest first; the high bit says that more follow
+//   VLong   1 to 9 bytes, the same
+//   String  VInt length in bytes, then UTF-8
 //
 // Every read is checked against the end of the source. What lies beyond it, or does not fit its type, is
 // reported by IndexDamagedError at the offset where the value begins. For one thread at a time.
@@ -53,7 +55,7 @@ class ByteReader {
 
   void ReadBytes(std::span<uint8_t> out);
 
-  // A string; throws also when it is not valid UTF-8.
+  // A string; throws also when it is not valid UTF-8, or longer than kLongestText.
   std::string ReadString();
 
   // Throws IndexDamagedError about this source.

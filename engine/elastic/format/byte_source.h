@@ -20,8 +20,8 @@ class ByteSource {
   // Its length in bytes, fixed when it was opened.
   virtual uint64_t size() const = 0;
 
-  // Fills `out` with the bytes from `offset` on. The range must lie within size(). Throws IndexIoError where
-  // the bytes cannot be had, also when the file has shrunk since it was opened.
+  // Fills `out` with the bytes from `offset` on. The range must lie within size(). Throws IndexError where
+  // the bytes cannot be had: IndexIoError when the medium fails, also when the file has shrunk meanwhile.
   virtual void ReadAt(uint64_t offset, std::span<uint8_t> out) const = 0;
 };
 

@@ -24,6 +24,9 @@ constexpr int32_t kWithHasPositions = -7;
 constexpr int32_t kWithUserData = -8;
 constexpr int32_t kWithDiagnostics = -9;
 
+// Room for a million segments; a hole in a file that is larger could be taken for endless user data.
+constexpr uint64_t kLargestCommit = uint64_t{256} << 20;
+
 void SkipString(ByteReader& reader) { reader.Skip(reader.ReadVInt()); }
 
 void SkipStringMap(ByteReader& reader) {
@@ -142,7 +145,10 @@ int64_t NewestGeneration(const Folder& folder) {
 
 }  // namespace
 
-Commit ReadCommit(std::shared_ptr<const ByteSource> source, int64_t generation) {
+Commit ReadCommit(const std::shared_ptr<const ByteSource>& source, int64_t generation) {
+  if (source->size() > kLargestCommit) {
+    throw IndexError(source->name(), std::to_string(source->size()) + " bytes are too many for a commit");
+  }
   ByteReader reader(source);
   Commit commit;
   commit.generation = generation;
@@ -169,7 +175,7 @@ void UseNewestCommit(const Folder& folder, const std::function<void(Commit)>& us
   };
   int64_t generation = NewestGeneration(folder);
   if (generation < 0) throw IndexError(folder.path(), "no index in this folder: it holds no segments file");
-  for (;;) {
+  for (bool tried_again = false;;) {
     std::exception_ptr failure;
     try {
       return use_generation(generation);
@@ -184,7 +190,9 @@ void UseNewestCommit(const Folder& folder, const std::function<void(Commit)>& us
       }
     }
     const int64_t newest = NewestGeneration(folder);
-    if (newest <= generation) std::rethrow_exception(failure);
+    // The same again, but once: its writer may have completed it, and dropped the one before, just now.
+    if (newest < generation || (newest == generation && tried_again)) std::rethrow_exception(failure);
+    tried_again = newest == generation;
     generation = newest;
   }
 }

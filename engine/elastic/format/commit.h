@@ -32,9 +32,10 @@ struct Commit {
 
 // Decodes a file segments_N. Layout, by format number F (the newer the smaller; -9 is written today):
 //
-//   Int F                       absent when the first Int is 0 or more: the oldest layout, and that Int is
-//   the counter Long version, Int counter   counter: number of the next segment Int segment count, then for
-//   each segment
+//   Int F                       absent, with the Long, when the first Int is 0 or more: that is the oldest
+//                               layout, and the Int is the counter
+//   Long version, Int counter   counter: number of the next segment
+//   Int segment count, then for each segment
 //     String name, Int document count
 //     up to F = -1, that is all of a segment; from F <= -2 on follow
 //     Long deletions generation (-1 none, 0 look for _S.del)
@@ -47,8 +48,9 @@ struct Commit {
 //   F = -8: Byte has user data, if so one String;  F <= -9: Int count of user data, two Strings each
 //   F <= -5: Long CRC-32 of every byte before it
 //
-// Bytes after that are ignored. Throws IndexDamagedError, IndexIoError.
-Commit ReadCommit(std::shared_ptr<const ByteSource> source, int64_t generation);
+// Bytes after that are ignored. Throws IndexDamagedError, IndexIoError, and IndexError for a file of over
+// 256 MiB, which no commit reaches.
+Commit ReadCommit(const std::shared_ptr<const ByteSource>& source, int64_t generation);
 
 // Finds the newest commit of the folder that `use` accepts, and hands it over. The newest generation is the
 // larger of what the folder lists and what segments.gen says; the one before it is tried where the newest is

@@ -1,5 +1,6 @@
 #include "elastic/format/compound_file.h"
 
+#include <algorithm>
 #include <utility>
 
 #include "elastic/format/byte_reader.h"
@@ -31,6 +32,7 @@ class PartSource : public ByteSource {
 CompoundFile::CompoundFile(std::shared_ptr<const ByteSource> source) : source_(std::move(source)) {
   ByteReader reader(source_);
   Part* last = nullptr;
+  uint64_t first_offset = reader.size();
   uint64_t last_offset = 0;
   for (uint32_t left = reader.ReadVInt(); left > 0; --left) {
     const uint64_t start = reader.offset();
@@ -42,7 +44,13 @@ CompoundFile::CompoundFile(std::shared_ptr<const ByteSource> source) : source_(s
     }
     if (last != nullptr) last->size = static_cast<uint64_t>(offset) - last->offset;
     last_offset = static_cast<uint64_t>(offset);
-    last = &parts_.insert_or_assign(reader.ReadString(), Part{last_offset, 0}).first->second;
+    first_offset = std::min(first_offset, last_offset);
+    const auto [part, is_new] = parts_.try_emplace(reader.ReadString(), Part{last_offset, 0});
+    if (!is_new) reader.Damaged(start, "sub-file bears the name of one before");
+    if (reader.offset() > first_offset) {
+      reader.Damaged(start, "table reaches into the first sub-file at " + std::to_string(first_offset));
+    }
+    last = &part->second;
   }
   if (last != nullptr) last->size = reader.size() - last->offset;
 }

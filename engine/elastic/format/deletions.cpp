@@ -51,10 +51,11 @@ void Deletions::ReadSparse(ByteReader& reader) {
     const uint64_t start = reader.offset();
     const uint32_t gap = reader.ReadVInt();
     index += gap;
-    if (index >= byte_count_ || (gap == 0 && !sparse_.empty())) {
+    if (index >= byte_count_ || (gap == 0 && sparse_count_ > 0)) {
       reader.Damaged(start, "gap " + std::to_string(gap) + " leads to byte " + std::to_string(index) +
                                 " of " + std::to_string(byte_count_));
     }
+    const uint64_t bits_offset = reader.offset();
     const uint8_t bits = reader.ReadByte();
     const int seen = std::popcount(bits);
     if (seen == 0 || seen > left) {
@@ -62,8 +63,11 @@ void Deletions::ReadSparse(ByteReader& reader) {
                                 std::to_string(left) + " that are left");
     }
     left -= seen;
-    sparse_.push_back({static_cast<uint32_t>(index), bits});
+    if (sparse_count_++ % kBlockLength == 0) {
+      block_starts_.push_back({static_cast<uint32_t>(index), bits_offset});
+    }
   }
+  blocks_.resize(std::min(block_starts_.size(), kBlocksHeld));
 }
 
 uint8_t Deletions::DenseByte(uint32_t index) {
@@ -79,11 +83,35 @@ uint8_t Deletions::DenseByte(uint32_t index) {
   return page.bytes[index % kPageSize];
 }
 
-uint8_t Deletions::SparseByteAt(uint32_t index) const {
+const std::vector<Deletions::SparseByte>& Deletions::SparseBlock(uint64_t number) {
+  Block& block = blocks_[number % kBlocksHeld];
+  if (block.number == number) return block.bytes;
+  constexpr size_t kLongestEntry = 6;
+  block.number = UINT64_MAX;
+  block.bytes.clear();
+  ByteReader reader(source_, kBlockLength * kLongestEntry);
+  reader.Seek(block_starts_[number].offset);
+  uint32_t index = block_starts_[number].index;
+  block.bytes.push_back({index, reader.ReadByte()});
+  const uint64_t length = std::min<uint64_t>(kBlockLength, sparse_count_ - number * kBlockLength);
+  while (block.bytes.size() < length) {
+    index += reader.ReadVInt();
+    block.bytes.push_back({index, reader.ReadByte()});
+  }
+  block.number = number;
+  return block.bytes;
+}
+
+uint8_t Deletions::SparseByteAt(uint32_t index) {
+  const auto after =
+      std::upper_bound(block_starts_.begin(), block_starts_.end(), index,
+                       [](uint32_t wanted, const BlockStart& block) { return wanted < block.index; });
+  if (after == block_starts_.begin()) return 0;
+  const auto& bytes = SparseBlock(static_cast<uint64_t>(after - block_starts_.begin()) - 1);
   const auto found =
-      std::lower_bound(sparse_.begin(), sparse_.end(), index,
+      std::lower_bound(bytes.begin(), bytes.end(), index,
                        [](const SparseByte& byte, uint32_t wanted) { return byte.index < wanted; });
-  return found != sparse_.end() && found->index == index ? found->bits : uint8_t{0};
+  return found != bytes.end() && found->index == index ? found->bits : uint8_t{0};
 }
 
 bool Deletions::Contains(int32_t document) {

@@ -1,6 +1,7 @@
 #include "elastic/format/field_infos.h"
 
 #include <exception>
+#include <unordered_set>
 
 #include "elastic/format/byte_reader.h"
 #include "elastic/format/text.h"
@@ -11,6 +12,7 @@ namespace vantrel::elastic::format {
 namespace {
 
 constexpr auto kFormat = static_cast<uint32_t>(-2);
+constexpr uint64_t kShortestField = 2;  // an empty name, the flags
 constexpr uint8_t kIndexed = 0x01;
 constexpr uint8_t kOmitsFrequencies = 0x40;
 
@@ -24,16 +26,28 @@ std::string ReadName(ByteReader& reader, Names names) {
 }
 
 std::vector<FieldInfo> ReadAll(ByteReader& reader, Names names) {
+  uint64_t count_start = reader.offset();
   uint32_t count = reader.ReadVInt();
   if (count == kFormat) {
+    count_start = reader.offset();
     count = reader.ReadVInt();
   } else if (static_cast<int32_t>(count) < 0) {
     reader.Damaged(0, "format is " + std::to_string(static_cast<int32_t>(count)) + ", but only -2 is known");
   }
+  if (count > reader.remaining() / kShortestField) {
+    reader.Damaged(count_start,
+                   std::to_string(count) + " fields, but the file ends at " + std::to_string(reader.size()));
+  }
   std::vector<FieldInfo> fields;
+  // No writer makes two fields of one name; a hole in the file would be full of them.
+  std::unordered_set<std::string> seen;
   for (; count > 0; --count) {
+    const uint64_t start = reader.offset();
     FieldInfo& field = fields.emplace_back();
     field.name = ReadName(reader, names);
+    if (!seen.insert(field.name).second) {
+      reader.Damaged(start, "field " + std::to_string(fields.size() - 1) + " bears the name of one before");
+    }
     const uint8_t flags = reader.ReadByte();
     field.indexed = (flags & kIndexed) != 0;
     field.omits_frequencies = (flags & kOmitsFrequencies) != 0;

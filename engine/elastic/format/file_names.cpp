@@ -38,7 +38,10 @@ std::string CommitFileName(int64_t generation) {
   return generation == 0 ? std::string(kSegments) : std::string(kSegments) + "_" + ToBase36(generation);
 }
 
-bool IsSegmentName(std::string_view name) { return name.starts_with('_') && IsBase36(name.substr(1)); }
+bool IsSegmentName(std::string_view name) {
+  constexpr size_t kMostDigits = 13;  // of a 64-bit number
+  return name.size() <= kMostDigits + 1 && name.starts_with('_') && IsBase36(name.substr(1));
+}
 
 std::string DeletionsFileName(const std::string& segment, int64_t generation) {
   return generation == 0 ? segment + ".del" : segment + "_" + ToBase36(generation) + ".del";

@@ -18,16 +18,28 @@ namespace {
 // The kernel caps one read a little under 2 GiB; smaller pieces keep a signal's restart cheap.
 constexpr size_t kLongestRead = size_t{1} << 30;
 
+void RequireRegularFile(const std::string& path, const struct stat& status) {
+  if (S_ISDIR(status.st_mode)) throw IndexIoError(path, "cannot open file", EISDIR);
+  if (!S_ISREG(status.st_mode)) throw IndexError(path, "not a regular file");
+}
+
+// Looks before it opens, since opening alone may set a device going; and does not block, in case a FIFO is put
+// in the file's place meanwhile.
+int OpenRegularFile(const std::string& path) {
+  struct stat status {};
+  if (stat(path.c_str(), &status) != 0) throw IndexIoError(path, "cannot open file", errno);
+  RequireRegularFile(path, status);
+  const int descriptor = open(path.c_str(), O_RDONLY | O_CLOEXEC | O_NONBLOCK | O_NOCTTY);
+  if (descriptor < 0) throw IndexIoError(path, "cannot open file", errno);
+  return descriptor;
+}
+
 class FileSource : public ByteSource {
  public:
-  // Non-blocking, so that a FIFO that bears an index file's name cannot hold us up.
-  explicit FileSource(std::string path)
-      : path_(std::move(path)), file_(open(path_.c_str(), O_RDONLY | O_CLOEXEC | O_NONBLOCK)) {
-    if (!file_.is_open()) throw IndexIoError(path_, "cannot open file", errno);
+  explicit FileSource(std::string path) : path_(std::move(path)), file_(OpenRegularFile(path_)) {
     struct stat status {};
     if (fstat(file_.get(), &status) != 0) throw IndexIoError(path_, "cannot examine file", errno);
-    if (S_ISDIR(status.st_mode)) throw IndexIoError(path_, "cannot open file", EISDIR);
-    if (!S_ISREG(status.st_mode)) throw IndexError(path_, "not a regular file");
+    RequireRegularFile(path_, status);
     size_ = static_cast<uint64_t>(status.st_size);
   }
 
@@ -59,6 +71,10 @@ std::string JoinPath(const std::string& folder, const std::string& name) {
 }
 
 DiskFolder::DiskFolder(std::string path) : path_(std::move(path)) {
+  // The system would take the part before a zero byte for the path.
+  if (path_.find('\0') != std::string::npos) {
+    throw IndexIoError(path_.c_str(), "path goes on after a zero byte", ENOENT);
+  }
   struct stat status {};
   if (stat(path_.c_str(), &status) != 0) throw IndexIoError(path_, "cannot open index folder", errno);
   if (!S_ISDIR(status.st_mode)) throw IndexIoError(path_, "cannot open index folder", ENOTDIR);

@@ -78,11 +78,9 @@ void TermCursor::ReadUtf8Text() {
   if (prefix > text_.size()) {
     Damaged("term shares " + std::to_string(prefix) + " bytes with one of " + std::to_string(text_.size()));
   }
-  if (suffix > reader_.remaining()) {
-    Damaged("term of " + std::to_string(suffix) + " bytes reaches past the end of the file at " +
-            std::to_string(reader_.size()));
-  }
-  text_.resize(size_t{prefix} + suffix);
+  const size_t length = size_t{prefix} + suffix;
+  if (length > kLongestText) Damaged("term of " + std::to_string(length) + " bytes is too long");
+  text_.resize(length);
   reader_.ReadBytes(std::span(reinterpret_cast<uint8_t*>(text_.data()) + prefix, suffix));
 }
 
@@ -95,7 +93,12 @@ void TermCursor::ReadUtf16Text() {
   }
   units_.resize(prefix);
   ReadUtf16Units(reader_, suffix, units_);
+  text_is_stale_ = true;
+}
+
+void TermCursor::ConvertText() const {
   text_ = FromUtf16(units_);
+  text_is_stale_ = false;
 }
 
 void TermCursor::ReadField() {
@@ -106,6 +109,7 @@ void TermCursor::ReadField() {
 }
 
 void TermCursor::ReadInfo() {
+  const int32_t documents_before = info_.document_frequency;
   info_.document_frequency = static_cast<int32_t>(reader_.ReadVInt());
   // The index's first entry stands before all terms and has no documents.
   const int32_t fewest = file_ == File::kIndex && walked_ == 0 ? 0 : 1;
@@ -113,7 +117,13 @@ void TermCursor::ReadInfo() {
     Damaged("term is in " + std::to_string(info_.document_frequency) + " documents of " +
             std::to_string(document_count_));
   }
-  info_.postings_pointer = Advanced(info_.postings_pointer);
+  const uint64_t postings_before = info_.postings_pointer;
+  info_.postings_pointer = Advanced(postings_before);
+  // A posting takes a byte at least. Terms that shared theirs could make a small file take forever.
+  if (info_.postings_pointer - postings_before < static_cast<uint64_t>(documents_before)) {
+    Damaged("postings of " + std::to_string(documents_before) + " documents take " +
+            std::to_string(info_.postings_pointer - postings_before) + " bytes before this term's begin");
+  }
   info_.positions_pointer = Advanced(info_.positions_pointer);
   info_.skip_offset = HasSkipOffset() ? reader_.ReadVInt() : 0;
 }

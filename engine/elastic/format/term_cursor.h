@@ -51,7 +51,11 @@ class TermCursor {
 
   // The term at the cursor, while Next() has returned true last.
   int32_t field() const { return field_; }
-  std::string_view text() const { return text_; }  // the bytes of the file: UTF-8 if undamaged
+  // The bytes of the file: UTF-8 if undamaged. Valid until Next().
+  std::string_view text() const {
+    if (text_is_stale_) ConvertText();
+    return text_;
+  }
   const TermInfo& info() const { return info_; }
   uint64_t dictionary_pointer() const { return dictionary_pointer_; }  // in .tii only
 
@@ -63,6 +67,7 @@ class TermCursor {
   void ReadHeader();
   void ReadUtf8Text();
   void ReadUtf16Text();
+  void ConvertText() const;
   void ReadField();
   void ReadInfo();
   bool HasSkipOffset() const;
@@ -81,8 +86,9 @@ class TermCursor {
   uint64_t walked_ = 0;
   uint64_t term_offset_ = 0;
   int32_t field_ = -1;
-  std::string text_;
-  std::u16string units_;  // the text of the older layouts
+  mutable std::string text_;
+  std::u16string units_;  // the text of the older layouts, which is converted only when it is asked for
+  mutable bool text_is_stale_ = false;
   TermInfo info_;
   uint64_t dictionary_pointer_ = 0;
 };

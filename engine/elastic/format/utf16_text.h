@@ -4,6 +4,7 @@
 #include <string>
 
 #include "elastic/format/byte_reader.h"
+#include "elastic/format/text.h"
 
 namespace vantrel::elastic::format {
 
@@ -14,6 +15,10 @@ inline void ReadUtf16Units(ByteReader& reader, uint32_t count, std::u16string& o
     reader.Damaged(reader.offset(), "text of " + std::to_string(count) +
                                         " characters reaches past the end of the file at " +
                                         std::to_string(reader.size()));
+  }
+  if (out.size() + count > kLongestText) {
+    reader.Damaged(reader.offset(),
+                   "text of " + std::to_string(out.size() + count) + " characters is too long");
   }
   for (; count > 0; --count) {
     const uint64_t start = reader.offset();

@@ -62,8 +62,9 @@ class DiskOutput : public Lucene::BufferedIndexOutput {
 class DiskInput : public Lucene::BufferedIndexInput {
  public:
   DiskInput() = default;  // of a clone to be
-  DiskInput(std::shared_ptr<const format::ByteSource> source, int32_t buffer_size)
-      : BufferedIndexInput(buffer_size), source_(std::move(source)) {}
+  DiskInput(boost::shared_ptr<DiskDirectory> directory, std::shared_ptr<const format::ByteSource> source,
+            int32_t buffer_size)
+      : BufferedIndexInput(buffer_size), directory_(std::move(directory)), source_(std::move(source)) {}
 
   int64_t length() override { return source_ == nullptr ? 0 : static_cast<int64_t>(source_->size()); }
 
@@ -74,7 +75,9 @@ class DiskInput : public Lucene::BufferedIndexInput {
 
   Lucene::LuceneObjectPtr clone(const Lucene::LuceneObjectPtr& other) override {
     const auto copy = BufferedIndexInput::clone(other ? other : newLucene<DiskInput>());
-    boost::dynamic_pointer_cast<DiskInput>(copy)->source_ = source_;
+    const auto input = boost::dynamic_pointer_cast<DiskInput>(copy);
+    input->directory_ = directory_;
+    input->source_ = source_;
     return copy;
   }
 
@@ -85,6 +88,7 @@ class DiskInput : public Lucene::BufferedIndexInput {
       source_->ReadAt(static_cast<uint64_t>(getFilePointer()),
                       std::span(bytes + offset, static_cast<size_t>(length)));
     } catch (const IndexError& error) {
+      directory_->NoteReadProblem(error);
       boost::throw_exception(Lucene::IOException(StringUtils::toUnicode(error.what())));
     }
   }
@@ -92,8 +96,14 @@ class DiskInput : public Lucene::BufferedIndexInput {
   void seekInternal(int64_t /*position*/) override {}
 
  private:
+  boost::shared_ptr<DiskDirectory> directory_;
   std::shared_ptr<const format::ByteSource> source_;
 };
+
+void SyncFile(const std::string& path) {
+  const format::FileDescriptor file(::open(path.c_str(), O_RDONLY | O_CLOEXEC));
+  if (!file.is_open() || fsync(file.get()) != 0) throw IndexIoError(path, "cannot make file durable", errno);
+}
 
 }  // namespace
 
@@ -108,6 +118,16 @@ void DiskDirectory::Fail(const IndexIoError& error) {
   const bool harmless = error.path() == format::JoinPath(path_, std::string(format::kSegmentsGen));
   if (!failure_.has_value() && !harmless) failure_ = error;
   boost::throw_exception(Lucene::IOException(StringUtils::toUnicode(error.what())));
+}
+
+std::string DiskDirectory::last_read_problem() const {
+  const std::lock_guard lock(read_problem_mutex_);
+  return read_problem_;
+}
+
+void DiskDirectory::NoteReadProblem(const IndexError& error) {
+  const std::lock_guard lock(read_problem_mutex_);
+  read_problem_ = error.what();
 }
 
 Lucene::IndexOutputPtr DiskDirectory::createOutput(const Lucene::String& name) {
@@ -128,8 +148,10 @@ Lucene::IndexInputPtr DiskDirectory::openInput(const Lucene::String& name) {
 Lucene::IndexInputPtr DiskDirectory::openInput(const Lucene::String& name, int32_t buffer_size) {
   ensureOpen();
   try {
-    return newLucene<DiskInput>(format::DiskFolder(path_).Open(StringUtils::toUTF8(name)), buffer_size);
+    return newLucene<DiskInput>(boost::static_pointer_cast<DiskDirectory>(shared_from_this()),
+                                format::DiskFolder(path_).Open(StringUtils::toUTF8(name)), buffer_size);
   } catch (const IndexError& error) {
+    NoteReadProblem(error);
     boost::throw_exception(Lucene::FileNotFoundException(StringUtils::toUnicode(error.what())));
   }
 }
@@ -159,11 +181,6 @@ void DiskDirectory::deleteFile(const Lucene::String& name) {
     boost::throw_exception(Lucene::IOException(StringUtils::toUnicode(error.what())));
   }
   uncommitted_.erase(own_name);
-}
-
-void DiskDirectory::SyncFile(const std::string& path) {
-  const format::FileDescriptor file(::open(path.c_str(), O_RDONLY | O_CLOEXEC));
-  if (!file.is_open() || fsync(file.get()) != 0) throw IndexIoError(path, "cannot make file durable", errno);
 }
 
 }  // namespace vantrel::elastic

@@ -13,8 +13,8 @@ void WriteFileDurably(const std::string& folder, const std::string& name, std::s
 // Makes the entries of a folder durable: files created, renamed or removed in it. Throws IndexIoError.
 void SyncFolder(const std::string& folder);
 
-// Writes all of `bytes` at `offset`, resuming where the system took less or was interrupted. False, with errno
-// set, where it failed.
+// Writes all of `bytes` at `offset`, resuming where the system took less or was interrupted. False, with
+// errno set, where it failed.
 bool WriteFully(int descriptor, std::string_view bytes, uint64_t offset);
 
 }  // namespace vantrel::elastic

@@ -26,9 +26,13 @@ namespace {
 
 void CheckPath(const std::string& path) {
   if (path.empty()) throw IndexValueError(path, "the path of an index is not empty");
+  if (const size_t zero = path.find('\0'); zero != std::string::npos) {
+    throw IndexValueError(path.substr(0, zero), "the path goes on after a zero byte");
+  }
   std::wstring wide;
-  const char* problem = path.find('\0') != std::string::npos ? "holds a zero byte" : ToIndexText(path, wide);
-  if (problem != nullptr) throw IndexValueError(path, std::string("the path ") + problem);
+  if (const char* problem = ToIndexText(path, wide)) {
+    throw IndexValueError(path, std::string("the path ") + problem);
+  }
 }
 
 void MakeFolder(const std::string& path) {

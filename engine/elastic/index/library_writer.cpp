@@ -34,6 +34,7 @@ void LibraryWriter::Open(bool compound_files, Start start) {
   const auto policy = newLucene<Lucene::LogByteSizeMergePolicy>(writer_);
   policy->setUseCompoundFile(compound_files);
   policy->setUseCompoundDocStore(compound_files);
+  policy->setNoCFSRatio(1.0);  // also for segments that make up most of the index
   writer_->setMergePolicy(policy);
   // Merges on the caller's thread: the library's background merges report failures to nobody.
   writer_->setMergeScheduler(newLucene<Lucene::SerialMergeScheduler>());
@@ -70,6 +71,7 @@ void LibraryWriter::Run(const char* purpose, const std::function<void()>& operat
     writer_.reset();
   }
   if (directory_ && directory_->failure().has_value()) throw IndexIoError(*directory_->failure());
+  if (reason.empty() && directory_) reason = directory_->last_read_problem();
   if (reason.empty()) reason = "the index library gives no reason";
   throw IndexError(folder_, std::string(purpose) + ": " + reason);
 }

@@ -17,8 +17,8 @@ namespace vantrel::elastic {
 // for would index documents differently from those that are there.
 inline constexpr const char* kSettingsFileName = "quorelastic.json";  // no name of the index library's files
 
-// Throws IndexValueError, about the folder, where settings cannot be honoured: no field, two of one name, a name
-// that is empty or not valid UTF-8.
+// Throws IndexValueError, about the folder, where settings cannot be honoured: no field, two of one name, a
+// name that is empty or not valid UTF-8.
 void CheckSettings(const std::string& folder, const IndexSettings& settings);
 
 // Durable on return. Throws IndexIoError.

@@ -10,8 +10,8 @@ namespace vantrel::elastic {
 // The right to change the index in a folder: at most one WriteLock stands on it at a time, over all processes
 // and within each. It is a lock on the open file description of a file of its own in the folder. Unlike a
 // process-owned lock, it falls neither to a second attempt in the same process nor when another descriptor of
-// the file is closed; the kernel lifts it when its holder dies. The file is never deleted: a lock on a deleted
-// file would not keep out whoever creates the next.
+// the file is closed; the kernel lifts it when its holder dies. The file is never deleted: a lock on a
+// deleted file would not keep out whoever creates the next.
 class WriteLock {
  public:
   // A name that no file of the index library bears.

@@ -31,7 +31,10 @@ TermsIndexSize SizeOf(const format::SegmentFiles& files) {
 
 uint64_t LoadedBytes(const TermsIndexSize& size, uint64_t divisor) {
   const uint64_t loaded = (size.terms + divisor - 1) / divisor;
-  return loaded * kBytesPerTerm + size.bytes / divisor * kBytesPerCharacter;
+  const uint64_t bytes = size.bytes / divisor;
+  // What is over the budget anyway is not multiplied further: a file with a hole may announce any size.
+  if (loaded > kSuggestBudget || bytes > kSuggestBudget) return kSuggestBudget;
+  return loaded * kBytesPerTerm + bytes * kBytesPerCharacter;
 }
 
 }  // namespace
@@ -43,10 +46,12 @@ IndexInfo::~IndexInfo() = default;
 void IndexInfo::initialize() {
   const format::DiskFolder folder(path_);
   format::UseNewestCommit(folder, [&](format::Commit commit) {
-    segments_.clear();
+    // Apart, so that a failure closes what is open before another commit is tried.
+    std::vector<format::SegmentFiles> segments;
     for (format::SegmentInfo& segment : commit.segments) {
-      segments_.push_back(format::OpenSegment(folder, std::move(segment)));
+      segments.push_back(format::OpenSegment(folder, std::move(segment)));
     }
+    segments_ = std::move(segments);
   });
 }
 

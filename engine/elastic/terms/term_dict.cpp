@@ -17,7 +17,7 @@ std::string TermDict::GetName() const { return walk_->segment_name(); }
 int TermDict::GetTermsCount() const {
   const uint64_t count = walk_->Count();
   if (count > static_cast<uint64_t>(std::numeric_limits<int>::max())) {
-    throw IndexError(walk_->segment_name(), "segment has more terms than can be counted in 32 bits");
+    throw IndexError(walk_->dictionary_name(), "dictionary has more terms than can be counted in 32 bits");
   }
   return static_cast<int>(count);
 }

@@ -33,6 +33,7 @@ class TermWalk {
   TermWalk(format::SegmentFiles files, bool live_only);
 
   const std::string& segment_name() const { return files_.info.name; }
+  const std::string& dictionary_name() const { return files_.terms->name(); }
 
   // The number of terms from first to last; counted by a pass of its own where the header does not tell.
   uint64_t Count();

@@ -18,9 +18,9 @@ struct DocumentCounts {
 
 // An index in a folder of its own: the files of the index library and, beside them, the settings.
 //
-// Writing works in rounds: what Add, Delete and Optimize do is kept back, in memory and in files that no reader
-// looks at, until Commit makes all of it visible and durable at once. What is not committed when the object
-// goes is dropped.
+// Writing works in rounds: what Add, Delete and Optimize do is kept back, in memory and in files that no
+// reader looks at, until Commit makes all of it visible and durable at once. What is not committed when the
+// object goes is dropped.
 //
 // The first change takes the index's write lock and keeps it as long as the object lives; there is one writer
 // at a time, over all processes. An Index that changes nothing leaves the folder alone.

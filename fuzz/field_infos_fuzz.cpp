@@ -1,0 +1,16 @@
+#include "elastic/format/field_infos.h"
+
+#include "elastic/format/text.h"
+#include "fuzz_input.h"
+
+using namespace vantrel::elastic::format;
+using quorelastic::fuzz::Require;
+
+// The file as it is.
+extern "C" int LLVMFuzzerTestOneInput(const uint8_t* data, size_t size) {
+  return quorelastic::fuzz::DecodeWithinBounds([&] {
+    const auto fields = ReadFieldInfos(quorelastic::fuzz::FuzzInput(data, size).TakeSource());
+    Require(fields.size() <= size / 2, "a field takes two bytes at least");
+    for (const FieldInfo& field : fields) Require(IsValidUtf8(field.name), "a field's name is UTF-8");
+  });
+}

@@ -1,0 +1,84 @@
+#include "damage/run_tool.h"
+
+#include <sys/mman.h>
+#include <sys/resource.h>
+#include <sys/wait.h>
+#include <unistd.h>
+
+#include <cerrno>
+#include <stdexcept>
+#include <system_error>
+
+namespace quorelastic::testing {
+namespace {
+
+#if defined(__SANITIZE_ADDRESS__) || defined(__SANITIZE_THREAD__)
+constexpr bool kIsSanitized = true;
+#else
+constexpr bool kIsSanitized = false;
+#endif
+
+constexpr rlim_t kMostMemory = rlim_t{1} << 30;
+constexpr unsigned kMostSeconds = 10;
+
+// A file in memory that takes what the program prints.
+class Capture {
+ public:
+  Capture() : descriptor_(memfd_create("capture", MFD_CLOEXEC)) {
+    if (descriptor_ < 0) throw std::system_error(errno, std::generic_category(), "memfd_create");
+  }
+  Capture(const Capture&) = delete;
+  Capture& operator=(const Capture&) = delete;
+  ~Capture() { close(descriptor_); }
+
+  int descriptor() const { return descriptor_; }
+
+  std::string Text() const {
+    const off_t size = lseek(descriptor_, 0, SEEK_END);
+    std::string text(static_cast<size_t>(size), '\0');
+    if (pread(descriptor_, text.data(), text.size(), 0) != size)
+      throw std::runtime_error("cannot read output");
+    return text;
+  }
+
+ private:
+  int descriptor_;
+};
+
+[[noreturn]] void BecomeTool(std::vector<char*> arguments, const Capture& output, const Capture& errors) {
+  const rlimit no_core = {0, 0};
+  setrlimit(RLIMIT_CORE, &no_core);
+  const rlimit memory = {kMostMemory, kMostMemory};
+  if (!kIsSanitized) setrlimit(RLIMIT_AS, &memory);
+  dup2(output.descriptor(), STDOUT_FILENO);
+  dup2(errors.descriptor(), STDERR_FILENO);
+  alarm(kMostSeconds);
+  execv(arguments[0], arguments.data());
+  _exit(127);
+}
+
+}  // namespace
+
+int RunsEvery() { return kIsSanitized ? 10 : 1; }
+
+ToolRun RunTool(const std::vector<std::string>& arguments) {
+  std::string program = QUORELASTIC_TOOL;
+  std::vector<std::string> copies = arguments;
+  std::vector<char*> pointers = {program.data()};
+  for (std::string& argument : copies) pointers.push_back(argument.data());
+  pointers.push_back(nullptr);
+  const Capture output;
+  const Capture errors;
+  const pid_t child = fork();
+  if (child < 0) throw std::system_error(errno, std::generic_category(), "fork");
+  if (child == 0) BecomeTool(std::move(pointers), output, errors);
+  ToolRun run;
+  while (waitpid(child, &run.status, 0) < 0) {
+    if (errno != EINTR) throw std::system_error(errno, std::generic_category(), "waitpid");
+  }
+  run.output = output.Text();
+  run.errors = errors.Text();
+  return run;
+}
+
+}  // namespace quorelastic::testing

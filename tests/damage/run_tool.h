@@ -1,0 +1,21 @@
+#pragma once
+
+#include <string>
+#include <vector>
+
+namespace quorelastic::testing {
+
+struct ToolRun {
+  int status = 0;  // as of waitpid
+  std::string output;
+  std::string errors;
+};
+
+// Runs the program with at most 1 GiB of address space (not where a sanitizer needs more) and 10 seconds, after
+// which SIGALRM ends it.
+ToolRun RunTool(const std::vector<std::string>& arguments);
+
+// A run takes many times as long with a sanitizer: only each so many-th case is run then.
+int RunsEvery();
+
+}  // namespace quorelastic::testing

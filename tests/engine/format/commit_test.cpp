@@ -1,0 +1,175 @@
+#include "elastic/format/commit.h"
+
+#include <gtest/gtest.h>
+
+#include "support/byte_writer.h"
+#include "support/expect_damage.h"
+#include "support/memory_folder.h"
+
+namespace vantrel::elastic::format {
+namespace {
+
+using ::quorelastic::testing::ByteWriter;
+using ::quorelastic::testing::ExpectDamage;
+using ::quorelastic::testing::ExpectIndexError;
+using ::quorelastic::testing::SourceOf;
+
+// What a segment of any layout may say; a layout writes as much of it as it knows.
+struct SegmentBytes {
+  std::string name = "_0";
+  int32_t documents = 7;
+  int64_t deletions_generation = -1;
+  bool shares_store = false;
+  int norm_generations = -1;
+  int compound = 1;
+  int diagnostics = 2;
+};
+
+void AppendSegment(ByteWriter& out, int format, const SegmentBytes& segment) {
+  out.String(segment.name).Int(segment.documents);
+  if (format > -2) return;
+  out.Long(segment.deletions_generation);
+  if (format <= -4) {
+    out.Int(segment.shares_store ? 100 : -1);
+    if (segment.shares_store) out.String("_a").Byte(1);
+  }
+  if (format <= -3) out.Byte(1);
+  out.Int(segment.norm_generations);
+  for (int i = 0; i < segment.norm_generations; ++i) out.Long(i);
+  out.Byte(segment.compound);
+  if (format <= -6) out.Int(3);
+  if (format <= -7) out.Byte(1);
+  if (format > -9) return;
+  out.Int(segment.diagnostics);
+  for (int i = 0; i < segment.diagnostics; ++i) out.String("key").String("value");
+}
+
+// A commit of format -1 to -9; 0 stands for the oldest one, which has no format number.
+std::string CommitBytes(int format, const std::vector<SegmentBytes>& segments) {
+  ByteWriter out;
+  if (format < 0) out.Int(format).Long(1234567890123);
+  out.Int(42);
+  out.Int(static_cast<int32_t>(segments.size()));
+  for (const SegmentBytes& segment : segments) AppendSegment(out, format, segment);
+  if (format == 0) out.Long(99);  // a version, which may be absent
+  if (format == -8) out.Byte(1).String("user data");
+  if (format <= -9) out.Int(1).String("user").String("data");
+  if (format <= -5) out.Checksum();
+  return out.bytes();
+}
+
+Commit Read(const std::string& bytes) { return ReadCommit(SourceOf(bytes), 5); }
+
+class CommitOfAnyFormatTest : public ::testing::TestWithParam<int> {};
+
+INSTANTIATE_TEST_SUITE_P(Formats, CommitOfAnyFormatTest, ::testing::Range(-9, 1),
+                         [](const auto& test) { return "Minus" + std::to_string(-test.param); });
+
+TEST_P(CommitOfAnyFormatTest, YieldsItsSegmentsInOrder) {
+  const int format = GetParam();
+  SegmentBytes plain{.name = "_z", .documents = 2147483647, .deletions_generation = 36, .compound = 0xff};
+  SegmentBytes rich{
+      .name = "_10", .documents = 0, .shares_store = true, .norm_generations = 3, .compound = 0};
+  const Commit commit = Read(CommitBytes(format, {SegmentBytes{}, plain, rich}));
+  EXPECT_EQ(commit.generation, 5);
+  ASSERT_EQ(commit.segments.size(), 3U);
+  EXPECT_EQ(commit.segments[0].name, "_0");
+  EXPECT_EQ(commit.segments[0].document_count, 7);
+  EXPECT_EQ(commit.segments[1].name, "_z");
+  EXPECT_EQ(commit.segments[1].document_count, 2147483647);
+  EXPECT_EQ(commit.segments[2].name, "_10");
+  EXPECT_EQ(commit.segments[2].document_count, 0);
+  using Compound = SegmentInfo::Compound;
+  if (format >= -1) {
+    for (const SegmentInfo& segment : commit.segments) {
+      EXPECT_EQ(segment.deletions_generation, SegmentInfo::kLookForDeletions);
+      EXPECT_EQ(segment.compound, Compound::kLookForFile);
+    }
+    return;
+  }
+  EXPECT_EQ(commit.segments[0].deletions_generation, SegmentInfo::kNoDeletions);
+  EXPECT_EQ(commit.segments[1].deletions_generation, 36);
+  EXPECT_EQ(commit.segments[0].compound, Compound::kYes);
+  EXPECT_EQ(commit.segments[1].compound, Compound::kNo);
+  EXPECT_EQ(commit.segments[2].compound, Compound::kLookForFile);
+}
+
+TEST_P(CommitOfAnyFormatTest, MayHoldNoSegment) {
+  EXPECT_TRUE(Read(CommitBytes(GetParam(), {})).segments.empty());
+}
+
+TEST_P(CommitOfAnyFormatTest, IsDamagedWhereverItIsCut) {
+  const std::string bytes = CommitBytes(GetParam(), {SegmentBytes{}, SegmentBytes{.name = "_1"}});
+  const size_t trailing = GetParam() == 0 ? 8 : 0;  // the version at the end is not asked for
+  for (size_t length = 0; length < bytes.size() - trailing; ++length) {
+    EXPECT_THROW(Read(bytes.substr(0, length)), IndexDamagedError) << "cut to " << length;
+  }
+}
+
+TEST_P(CommitOfAnyFormatTest, IgnoresWhatFollows) {
+  EXPECT_EQ(Read(CommitBytes(GetParam(), {SegmentBytes{}}) + "more").segments.size(), 1U);
+}
+
+TEST_P(CommitOfAnyFormatTest, ShowsAnyFlippedBitWhereItHasAChecksum) {
+  if (GetParam() > -5) return;  // the layouts before have none
+  const std::string bytes = CommitBytes(GetParam(), {SegmentBytes{}, SegmentBytes{.name = "_1"}});
+  for (size_t bit = 0; bit < bytes.size() * 8; ++bit) {
+    if (bit / 8 == 3) continue;  // the format number: another layout may be read
+    std::string flipped = bytes;
+    flipped[bit / 8] = static_cast<char>(flipped[bit / 8] ^ 1 << bit % 8);
+    EXPECT_THROW(Read(flipped), IndexDamagedError) << "bit " << bit;
+  }
+}
+
+TEST(CommitTest, RefusesALayoutNewerThanKnown) {
+  ExpectDamage(0, "format is -10, but -9 is the newest known", [] { Read(CommitBytes(-10, {})); });
+}
+
+TEST(CommitTest, SaysWhichChecksumItFoundAndExpected) {
+  std::string bytes = CommitBytes(-9, {SegmentBytes{}});
+  bytes.back() = static_cast<char>(bytes.back() ^ 1);
+  ExpectDamage(bytes.size() - 8, "checksum is", [&] { Read(bytes); });
+  bytes = CommitBytes(-9, {SegmentBytes{}});
+  bytes[bytes.size() - 8] = 1;  // the upper half of the stored number must be 0
+  ExpectDamage(bytes.size() - 8, "but the file says", [&] { Read(bytes); });
+}
+
+TEST(CommitTest, RefusesCountsThatCannotBe) {
+  const ByteWriter head = ByteWriter().Int(-9).Long(1).Int(1);
+  ExpectDamage(16, "segment count is -1", [&] { Read(ByteWriter(head).Int(-1).bytes()); });
+  ExpectDamage(20, "more bytes", [&] { Read(ByteWriter(head).Int(0x7fffffff).bytes()); });
+  const ByteWriter one = ByteWriter(head).Int(1).String("_0");
+  ExpectDamage(23, "document count is -2", [&] { Read(ByteWriter(one).Int(-2).bytes()); });
+  ExpectDamage(27, "generation of deletions is -2", [&] { Read(ByteWriter(one).Int(1).Long(-2).bytes()); });
+  const ByteWriter norms = ByteWriter(one).Int(1).Long(-1).Int(-1).Byte(1);
+  ExpectDamage(40, "count of norm generations is -2", [&] { Read(ByteWriter(norms).Int(-2).bytes()); });
+  ExpectDamage(44, "wanted to skip 17179869176 bytes",
+               [&] { Read(ByteWriter(norms).Int(0x7fffffff).bytes()); });
+  const ByteWriter strings = ByteWriter(norms).Int(-1).Byte(1).Int(0).Byte(1);
+  ExpectDamage(54, "more bytes", [&] { Read(ByteWriter(strings).Int(0x7fffffff).bytes()); });
+  ExpectDamage(59, "wanted to skip 4294967295 bytes",
+               [&] { Read(ByteWriter(strings).Int(1).VInt(-1).bytes()); });
+}
+
+TEST(CommitTest, ASegmentsNameCannotLeaveTheFolder) {
+  for (const char* name : {"../_0", "_../_0", "/etc/passwd", "_0/_1", "", "_", "0", "_0.tis", "_A"}) {
+    ExpectDamage(20, "segment name is not '_' and a number",
+                 [&] { Read(CommitBytes(-9, {{.name = name}})); });
+    ExpectDamage(8, "segment name is not '_' and a number", [&] { Read(CommitBytes(0, {{.name = name}})); });
+  }
+  ExpectDamage(20, "not valid UTF-8", [&] { Read(CommitBytes(-9, {{.name = "_\xff"}})); });
+}
+
+TEST(CommitTest, AFileThatIsLargerThanAnyCommitIsNotReadAtAll) {
+  const std::string head = ByteWriter().Int(-9).Long(1).Int(1).Int(0).Int(0x7fffffff).bytes();
+  ExpectIndexError("memory: 1099511627800 bytes are too many for a commit",
+                   [&] { ReadCommit(SourceOf(head, uint64_t{1} << 40, 0), 1); });
+}
+
+TEST(CommitTest, PassesAMediumErrorOn) {
+  const std::string bytes = CommitBytes(-9, {SegmentBytes{}});
+  EXPECT_THROW(ReadCommit(SourceOf(bytes, 0, 0), 1), IndexIoError);
+}
+
+}  // namespace
+}  // namespace vantrel::elastic::format
