@@ -12,6 +12,7 @@
 
 #include "data_root/file_lock.h"
 #include "quordaemon/wire.h"
+#include "sanitized.h"
 #include "served_index.h"
 #include "support/files.h"
 
@@ -126,12 +127,6 @@ TEST_F(BadRequestsTest, AFileThatCannotBeReadIsAnIoError) {
   DaemonClient client = Connect();
   EXPECT_EQ(client.AskForError(R"({"command":"commit","data":{"id":"books"}})"), "io_error");
 }
-
-#if defined(__SANITIZE_ADDRESS__) || defined(__SANITIZE_THREAD__)
-constexpr bool kIsSanitized = true;
-#else
-constexpr bool kIsSanitized = false;
-#endif
 
 // The address space that a process takes, in bytes.
 rlim_t AddressSpace(pid_t pid) {
