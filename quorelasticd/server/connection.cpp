@@ -36,7 +36,7 @@ void Connection::Refuse(std::string reply) {
 void Connection::Finish() {
   asio::post(socket_.get_executor(), [self = shared_from_this()] {
     self->finishing_ = true;
-    if (self->awaiting_request_) self->Close();
+    if (self->awaiting_request_ && !self->HasArrived()) self->Close();
   });
 }
 
@@ -45,7 +45,8 @@ void Connection::Abort() {
 }
 
 void Connection::ReadHeader() {
-  if (finishing_) return Close();
+  // A request that has been sent already is read and refused, rather than hung up on.
+  if (finishing_ && !HasArrived()) return Close();
   awaiting_request_ = true;
   ArmTimer(timeouts_.idle);
   asio::async_read(socket_, asio::buffer(header_), [self = shared_from_this()](error_code error, size_t) {
@@ -149,6 +150,12 @@ void Connection::DropWhatComes() {
   socket_.async_read_some(asio::buffer(request_), [self = shared_from_this()](error_code error, size_t) {
     error ? self->Close() : self->DropWhatComes();
   });
+}
+
+bool Connection::HasArrived() const {
+  error_code error;
+  const size_t available = socket_.available(error);
+  return !error && available > 0;
 }
 
 void Connection::ArmTimer(std::chrono::milliseconds limit) {

@@ -37,7 +37,8 @@ class Connection : public std::enable_shared_from_this<Connection> {
   // Writes one last reply, whatever the client sends, and closes; instead of Start().
   void Refuse(std::string reply);
 
-  // Ends the connection: at once when it waits for a request, else after the last reply of the one under way.
+  // Ends the connection: at once when it waits for a request, else after the last reply of the one under way. A
+  // request that has arrived, wholly or in part, but was not begun is refused before.
   // From any thread.
   void Finish();
 
@@ -55,6 +56,9 @@ class Connection : public std::enable_shared_from_this<Connection> {
   void RefuseRequest(std::string reply);
   void Linger();
   void DropWhatComes();
+
+  // Whether the client has sent something that is not read yet.
+  bool HasArrived() const;
 
   void ArmTimer(std::chrono::milliseconds limit);
   void Close();

@@ -98,7 +98,7 @@ TEST_F(BadRequestsTest, AnIndexThatAnotherProcessWritesToIsLocked) {
 
 TEST_F(BadRequestsTest, AnIndexInUseIsNotDeleted) {
   DaemonClient client = Connect();
-  const std::string words = ManyWords(200000);
+  const std::string words = ManyWords(50000);
   ASSERT_EQ(client.AskForError(
                 R"({"command":"document_bulk","data":{"id":"books","documents":[{"id":"1","title":")" +
                 words + "\"}]}}"),

@@ -6,11 +6,13 @@
 #include <atomic>
 #include <chrono>
 #include <fstream>
+#include <memory>
 #include <string>
 #include <thread>
 #include <vector>
 
 #include "quordaemon/wire.h"
+#include "sanitized.h"
 #include "served_index.h"
 
 namespace quorelastic::testing {
@@ -20,11 +22,12 @@ using std::chrono::steady_clock;
 
 class ConnectionsTest : public ServedIndex {
  protected:
-  using ServedIndex::ServedIndex;
+  explicit ConnectionsTest(const std::vector<std::string>& arguments = {"--stall-timeout", "300"})
+      : ServedIndex(arguments) {}
 
   // One document with so many words that its terms fill every socket buffer many times over.
   void AddManyWords() {
-    const std::string words = ManyWords(300000);
+    const std::string words = ManyWords(kManyWords);
     ASSERT_EQ(Connect().AskForError(
                   R"({"command":"document_bulk","data":{"id":"books","documents":[{"id":"1","title":")" +
                   words + "\"}]}}"),
@@ -40,6 +43,7 @@ class ConnectionsTest : public ServedIndex {
     return resident * 4096;
   }
 
+  static constexpr int kManyWords = 80000;
   static constexpr const char* kAllTerms = R"({"command":"terms","data":{"id":"books","max":1000000}})";
 };
 
@@ -92,11 +96,13 @@ TEST_F(ConnectionsTest, ReadersThatStopHoldUpNobodyAndTakeNoMemory) {
     ASSERT_TRUE(stuck.back()->Send(kAllTerms));
     stuck.back()->Receive();
   }
-  EXPECT_EQ(client.Exchange(kAllTerms).back()["result"]["count"].asInt(), 300001);
+  EXPECT_EQ(client.Exchange(kAllTerms).back()["result"]["count"].asInt(), kManyWords + 1);
   EXPECT_EQ(
       client.AskForError(R"({"command":"document_bulk","data":{"id":"books","documents":[{"id":"2"}]}})"),
       "");
-  EXPECT_LT(Resident(), before + (size_t{64} << 20));
+  if (!kIsSanitized) {
+    EXPECT_LT(Resident(), before + (size_t{64} << 20));
+  }
   while (!stuck.front()->Receive().isMember("success")) continue;  // one of them comes back
 }
 
@@ -175,7 +181,7 @@ TEST_F(ShortTimeoutsTest, AClientThatReadsSlowlyIsServedToTheEnd) {
     reply = client.Receive();
     if (++replies % 50 == 0) std::this_thread::sleep_for(std::chrono::milliseconds(500));
   } while (!reply.isMember("success"));
-  EXPECT_EQ(reply["result"]["count"].asInt(), 300001);
+  EXPECT_EQ(reply["result"]["count"].asInt(), kManyWords + 1);
 }
 
 class FewConnectionsTest : public ConnectionsTest {
@@ -185,9 +191,11 @@ class FewConnectionsTest : public ConnectionsTest {
 
 TEST_F(FewConnectionsTest, OneTooManyIsToldSoAndHungUpOn) {
   DaemonClient first = Connect();
-  DaemonClient second = Connect();
   ASSERT_EQ(first.AskForError(R"({"command":"status"})"), "");
-  ASSERT_EQ(second.AskForError(R"({"command":"status"})"), "");
+  auto second = std::make_unique<DaemonClient>(daemon_.socket());
+  while (second->AskForError(R"({"command":"status"})") != "") {  // the index's maker is still being seen off
+    second = std::make_unique<DaemonClient>(daemon_.socket());
+  }
   DaemonClient third = Connect();
   ASSERT_TRUE(third.Send(R"({"command":"status"})"));
   const JsonValue reply = third.Receive();
@@ -208,7 +216,7 @@ TEST_F(OneThreadTest, ServesManyAtOnce) {
   DaemonClient stuck = Connect();
   ASSERT_TRUE(stuck.Send(kAllTerms));
   DaemonClient client = Connect();
-  EXPECT_EQ(client.Exchange(kAllTerms).back()["result"]["count"].asInt(), 300001);
+  EXPECT_EQ(client.Exchange(kAllTerms).back()["result"]["count"].asInt(), kManyWords + 1);
 }
 
 }  // namespace
