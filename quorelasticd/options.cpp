@@ -34,7 +34,6 @@ po::options_description Describe(Options& options) {
   description.add_options()                                                                               //
       ("socket", Text(options.socket, "PATH"), "the socket that clients connect to")                      //
       ("data", Text(options.data, "FOLDER"), "the folder that holds the indexes")                         //
-      ("plugins", Text(options.plugins, "FOLDER"), "load the search plugins in this folder")              //
       ("threads", Number(options.threads, "N"), "threads for quick requests, and as many for slow ones")  //
       ("max-connections", Number(options.max_connections, "N"), "clients connected at a time")            //
       ("idle-timeout", Number(options.idle_timeout, "SECONDS"),

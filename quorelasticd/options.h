@@ -11,7 +11,6 @@ namespace quorelasticd {
 struct Options {
   std::string socket = "/var/run/quorelasticd.sock";
   std::string data = QUORELASTIC_DATA_ROOT;
-  std::string plugins;  // a folder; empty for none
   std::string log_level = "info";
   int64_t threads = 4;
   int64_t max_connections = 256;

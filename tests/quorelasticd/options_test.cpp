@@ -30,19 +30,17 @@ TEST(Options, HaveDefaults) {
   EXPECT_EQ(options->socket, "/var/run/quorelasticd.sock");
   EXPECT_EQ(options->data, QUORELASTIC_DATA_ROOT);
   EXPECT_EQ(options->log_level, "info");
-  EXPECT_EQ(options->plugins, "");
 }
 
 TEST(Options, AreTakenInBothForms) {
   const auto options =
-      Parse({"--socket", "/s", "--data=/d", "--threads", "2", "--log-level=debug", "--plugins", "/p",
-             "--max-connections", "3", "--idle-timeout=4", "--stall-timeout=5", "--shutdown-timeout=6"});
+      Parse({"--socket", "/s", "--data=/d", "--threads", "2", "--log-level=debug", "/p", "--max-connections",
+             "3", "--idle-timeout=4", "--stall-timeout=5", "--shutdown-timeout=6"});
   ASSERT_TRUE(options.has_value());
   EXPECT_EQ(options->socket, "/s");
   EXPECT_EQ(options->data, "/d");
   EXPECT_EQ(options->threads, 2);
   EXPECT_EQ(options->log_level, "debug");
-  EXPECT_EQ(options->plugins, "/p");
   EXPECT_EQ(options->max_connections, 3);
   EXPECT_EQ(options->idle_timeout, 4);
   EXPECT_EQ(options->stall_timeout, 5);
@@ -53,7 +51,7 @@ TEST(Options, HelpAndVersionAreTextsOnly) {
   std::string text;
   EXPECT_FALSE(Parse({"--help", "--threads", "0"}, &text).has_value());
   for (const char* option :
-       {"--socket", "--data", "--threads", "--log-level", "--plugins", "--max-connections", "--idle-timeout",
+       {"--socket", "--data", "--threads", "--log-level", "--max-connections", "--idle-timeout",
         "--stall-timeout", "--shutdown-timeout", "--help", "--version"}) {
     EXPECT_NE(text.find(option), std::string::npos) << option;
   }
