@@ -34,8 +34,8 @@ TEST(Options, HaveDefaults) {
 
 TEST(Options, AreTakenInBothForms) {
   const auto options =
-      Parse({"--socket", "/s", "--data=/d", "--threads", "2", "--log-level=debug", "/p", "--max-connections",
-             "3", "--idle-timeout=4", "--stall-timeout=5", "--shutdown-timeout=6"});
+      Parse({"--socket", "/s", "--data=/d", "--threads", "2", "--log-level=debug", "--max-connections", "3",
+             "--idle-timeout=4", "--stall-timeout=5", "--shutdown-timeout=6"});
   ASSERT_TRUE(options.has_value());
   EXPECT_EQ(options->socket, "/s");
   EXPECT_EQ(options->data, "/d");
