@@ -73,7 +73,7 @@ TEST(NewestCommitTest, TheHintDoesNoHarmWhenItIsMissingTornLowUnreadableOrUnknow
   MemoryFolder folder;
   PutCommit(folder, 3);
   EXPECT_EQ(Used(folder), 3) << "missing";
-  PutHint(folder, 4, 3);
+  PutHint(folder, 9, 3);
   EXPECT_EQ(Used(folder), 3) << "torn";
   PutHint(folder, 2, 2);
   EXPECT_EQ(Used(folder), 3) << "low";
@@ -199,6 +199,23 @@ TEST(NewestCommitTest, ReadsACommitAgainThatWasCompletedWhileItWasBeingRead) {
     PutCommit(folder, 4);
   };
   EXPECT_EQ(Used(folder), 4);
+}
+
+TEST(NewestCommitTest, EachCommitThatItComesToHasASecondTry) {
+  MemoryFolder folder;
+  PutCommit(folder, 3);
+  folder.files["segments_3"].bytes.pop_back();
+  int opened_fourth = 0;
+  folder.before_open = [&](const std::string& name) {
+    if (name == "segments_3" && folder.opened > 2) {
+      folder.files.erase(name);
+      PutCommit(folder, 4);
+      folder.files["segments_4"].bytes.pop_back();
+    }
+    if (name == "segments_4" && ++opened_fourth == 2) PutCommit(folder, 4);
+  };
+  EXPECT_EQ(Used(folder), 4);
+  EXPECT_EQ(opened_fourth, 2);
 }
 
 TEST(NewestCommitTest, GivesUpWhereNothingChanges) {
