@@ -3,6 +3,7 @@
 #include <string>
 
 #include "elastic/format/file_descriptor.h"
+#include "vantrel/elastic/index_files.h"
 
 namespace vantrel::elastic {
 
@@ -14,7 +15,7 @@ namespace vantrel::elastic {
 class WriteLock {
  public:
   // A name that no file of the index library bears.
-  static constexpr const char* kFileName = "quorelastic.lock";
+  static constexpr const char* kFileName = kIndexLockFileName;
 
   // Takes the lock without waiting. Throws IndexLockedError where another holds it, IndexIoError where the
   // file can be neither opened nor created.
