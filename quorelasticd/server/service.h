@@ -1,0 +1,48 @@
+#pragma once
+
+#include <memory>
+#include <optional>
+#include <string>
+
+namespace quorelasticd {
+
+// One request under way. It is run step by step, so that a long one can be streamed to a client that reads
+// slowly without a thread waiting for it: the next step is run when the last reply has gone out. Steps of one
+// execution never run at the same time, but on any thread.
+class Execution {
+ public:
+  struct Step {
+    std::optional<std::string> reply;  // one message, at most quordaemon::kLongestMessage bytes
+    bool finished = false;             // the reply, there must be one then, is the last
+  };
+
+  Execution() = default;
+  Execution(const Execution&) = delete;
+  Execution& operator=(const Execution&) = delete;
+  virtual ~Execution() = default;
+
+  // Whether a step may take long (a write, a merge): such steps are kept away from the threads that serve
+  // quick requests.
+  virtual bool IsSlow() const = 0;
+
+  // Does a part of the work. Must not throw.
+  virtual Step Run() = 0;
+};
+
+// What a server serves. For any number of threads at once.
+class Service {
+ public:
+  Service() = default;
+  Service(const Service&) = delete;
+  Service& operator=(const Service&) = delete;
+  virtual ~Service() = default;
+
+  // Begins to work on one request, whatever its bytes are. Must not throw.
+  virtual std::unique_ptr<Execution> Begin(std::string request) = 0;
+
+  // The final reply for a request that never got that far, by the limit that it exceeded.
+  virtual std::string RefuseTooLong() = 0;  // longer than quordaemon::kLongestMessage
+  virtual std::string RefuseTooManyConnections() = 0;
+};
+
+}  // namespace quorelasticd
