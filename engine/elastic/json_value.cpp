@@ -38,8 +38,10 @@ const Json::StreamWriterBuilder& Writers() {
 bool JsonValue::fromString(const std::string& text) {
   bool parsed = false;
   try {
+    // To the library, a zero byte behind the document is the end of the text, whatever follows.
     const std::unique_ptr<Json::CharReader> reader(Readers().newCharReader());
-    parsed = reader->parse(text.data(), text.data() + text.size(), this, nullptr);
+    parsed = reader->parse(text.data(), text.data() + text.size(), this, nullptr) &&
+             text.find('\0', static_cast<size_t>(getOffsetLimit())) == std::string::npos;
   } catch (const Json::Exception&) {
     // The library throws, rather than answers false, where a document is nested too deep.
   }

@@ -1,8 +1,9 @@
 #include "quordaemon/domain_sock_connection.h"
 
-#include <poll.h>
+#include <fcntl.h>
 #include <sys/socket.h>
 #include <sys/un.h>
+#include <unistd.h>
 
 #include <cerrno>
 #include <cstring>
@@ -10,15 +11,14 @@
 namespace quordaemon {
 namespace {
 
-// An interrupted connect goes on in the background: it is waited for, not begun again.
-bool WaitUntilConnected(int sock) {
-  pollfd entry{sock, POLLOUT, 0};
-  while (poll(&entry, 1, -1) < 0) {
-    if (errno != EINTR) return false;
-  }
-  int error = 0;
-  socklen_t size = sizeof error;
-  return getsockopt(sock, SOL_SOCKET, SO_ERROR, &error, &size) == 0 && error == 0;
+// Keeps off the numbers of standard streams: where a program was started without one, what it prints there
+// would go to the peer.
+int OpenSocket() {
+  const int sock = socket(AF_UNIX, SOCK_STREAM | SOCK_CLOEXEC, 0);
+  if (sock == -1 || sock > STDERR_FILENO) return sock;
+  const int moved = fcntl(sock, F_DUPFD_CLOEXEC, STDERR_FILENO + 1);
+  close(sock);
+  return moved;
 }
 
 }  // namespace
@@ -33,12 +33,15 @@ bool DomainSockConnection::Connect() {
   address.sun_family = AF_UNIX;
   if (path_.empty() || path_.size() >= sizeof address.sun_path) return false;
   std::memcpy(address.sun_path, path_.data(), path_.size());
-  sock_ = socket(AF_UNIX, SOCK_STREAM | SOCK_CLOEXEC, 0);
+  sock_ = OpenSocket();
   if (sock_ == -1) return false;
-  if (connect(sock_, reinterpret_cast<const sockaddr*>(&address), sizeof address) == 0) return true;
-  if (errno == EINTR && WaitUntilConnected(sock_)) return true;
-  Disconnect();
-  return false;
+  // Sockets of this family do not go on connecting after a signal, as others do: it is begun again.
+  while (connect(sock_, reinterpret_cast<const sockaddr*>(&address), sizeof address) != 0) {
+    if (errno == EINTR) continue;
+    Disconnect();
+    return false;
+  }
+  return true;
 }
 
 }  // namespace quordaemon

@@ -4,12 +4,17 @@
 #include <gtest/gtest.h>
 #include <sys/socket.h>
 #include <sys/stat.h>
+#include <sys/time.h>
 #include <sys/un.h>
 #include <unistd.h>
 
+#include <chrono>
+#include <csignal>
 #include <cstring>
 #include <string>
+#include <thread>
 #include <type_traits>
+#include <vector>
 
 #include "support/files.h"
 #include "support/temporary_folder.h"
@@ -27,6 +32,8 @@ class Listener {
     std::memcpy(address.sun_path, path.data(), path.size());
     EXPECT_EQ(bind(sock_, reinterpret_cast<const sockaddr*>(&address), sizeof address), 0);
     EXPECT_EQ(listen(sock_, 8), 0);
+    const timeval patience{10, 0};
+    EXPECT_EQ(setsockopt(sock_, SOL_SOCKET, SO_RCVTIMEO, &patience, sizeof patience), 0);
   }
   Listener(const Listener&) = delete;
   Listener& operator=(const Listener&) = delete;
@@ -87,6 +94,57 @@ TEST(DomainSockConnectionTest, ItsDescriptorIsNotInheritedByPrograms) {
   DomainSockConnection connection(folder / "sock");
   ASSERT_TRUE(connection.Connect());
   EXPECT_EQ(fcntl(next_free, F_GETFD), FD_CLOEXEC);
+}
+
+TEST(DomainSockConnectionTest, ItsDescriptorNeverStandsInForAClosedStandardStream) {
+  const TemporaryFolder folder;
+  const Listener listener(folder / "sock");
+  const int kept = dup(0);
+  close(0);
+  DomainSockConnection connection(folder / "sock");
+  EXPECT_TRUE(connection.Connect());
+  EXPECT_EQ(fcntl(0, F_GETFD), -1);
+  dup2(kept, 0);
+  close(kept);
+  const SockConnection accepted(listener.Accept());
+  EXPECT_TRUE(connection.Send("x"));
+}
+
+TEST(DomainSockConnectionTest, GoesOnConnectingAfterASignal) {
+  const TemporaryFolder folder;
+  const Listener listener(folder / "sock");
+  // As many connections as the system lets wait for the listener; the next has to wait itself.
+  std::vector<int> waiting;
+  sockaddr_un address{};
+  address.sun_family = AF_UNIX;
+  (folder / "sock").copy(address.sun_path, sizeof address.sun_path);
+  do {
+    waiting.push_back(socket(AF_UNIX, SOCK_STREAM | SOCK_NONBLOCK, 0));
+  } while (connect(waiting.back(), reinterpret_cast<const sockaddr*>(&address), sizeof address) == 0);
+
+  struct sigaction action {};
+  action.sa_handler = [](int) {};  // and no SA_RESTART
+  struct sigaction before {};
+  ASSERT_EQ(sigaction(SIGUSR1, &action, &before), 0);
+  const pthread_t connecting = pthread_self();
+  std::thread peer([&] {
+    for (int i = 0; i < 50; ++i) {
+      pthread_kill(connecting, SIGUSR1);
+      std::this_thread::sleep_for(std::chrono::milliseconds(1));
+    }
+    for (size_t i = 1; i < waiting.size(); ++i) close(listener.Accept());
+    SockConnection accepted(listener.Accept());
+    std::string message;
+    EXPECT_TRUE(accepted.Recv(message));
+    EXPECT_EQ(message, "hello");
+  });
+  DomainSockConnection connection(folder / "sock");
+  EXPECT_TRUE(connection.Connect());
+  EXPECT_TRUE(connection.Send("hello"));
+  connection.Disconnect();
+  peer.join();
+  sigaction(SIGUSR1, &before, nullptr);
+  for (const int sock : waiting) close(sock);
 }
 
 TEST(DomainSockConnectionTest, IsDestroyedThroughItsBase) {
