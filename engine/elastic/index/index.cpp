@@ -17,9 +17,9 @@
 #include "elastic/index/index_text.h"
 #include "elastic/index/library_writer.h"
 #include "elastic/index/settings_file.h"
-#include "elastic/index/write_lock.h"
 #include "vantrel/elastic/index_error.h"
 #include "vantrel/elastic/library_setup.h"
+#include "vantrel/elastic/write_lock.h"
 
 namespace vantrel::elastic {
 namespace {

@@ -6,7 +6,7 @@
 #include <string>
 
 #include "elastic/index/disk_directory.h"
-#include "elastic/index/write_lock.h"
+#include "vantrel/elastic/write_lock.h"
 
 namespace vantrel::elastic {
 

@@ -1,10 +1,11 @@
-#include "elastic/index/write_lock.h"
+#include "vantrel/elastic/write_lock.h"
 
 #include <fcntl.h>
 
 #include <cerrno>
 #include <cstdio>
 
+#include "elastic/format/file_descriptor.h"
 #include "elastic/format/folder.h"
 #include "vantrel/elastic/index_error.h"
 
@@ -12,15 +13,22 @@ namespace vantrel::elastic {
 
 WriteLock::WriteLock(const std::string& folder) {
   const std::string path = format::JoinPath(folder, kFileName);
-  file_ = format::FileDescriptor(open(path.c_str(), O_RDWR | O_CREAT | O_CLOEXEC | O_NONBLOCK, 0666));
-  if (!file_.is_open()) throw IndexIoError(path, "cannot open lock file", errno);
+  file_ = std::make_unique<format::FileDescriptor>(
+      open(path.c_str(), O_RDWR | O_CREAT | O_CLOEXEC | O_NONBLOCK, 0666));
+  if (!file_->is_open()) throw IndexIoError(path, "cannot open lock file", errno);
   struct flock whole_file {};
   whole_file.l_type = F_WRLCK;
   whole_file.l_whence = SEEK_SET;
-  while (fcntl(file_.get(), F_OFD_SETLK, &whole_file) != 0) {
+  while (fcntl(file_->get(), F_OFD_SETLK, &whole_file) != 0) {
     if (errno == EAGAIN || errno == EACCES) throw IndexLockedError(folder);
     if (errno != EINTR) throw IndexIoError(path, "cannot lock file", errno);
   }
 }
+
+WriteLock::WriteLock(WriteLock&& other) noexcept = default;
+
+WriteLock& WriteLock::operator=(WriteLock&& other) noexcept = default;
+
+WriteLock::~WriteLock() = default;
 
 }  // namespace vantrel::elastic
