@@ -4,6 +4,7 @@
 
 #include <algorithm>
 #include <cerrno>
+#include <mutex>
 #include <optional>
 #include <utility>
 
@@ -14,9 +15,14 @@
 #include "elastic/format/segment_files.h"
 #include "elastic/index/document_builder.h"
 #include "elastic/index/durable_file.h"
+#include "elastic/index/index_statistics.h"
 #include "elastic/index/index_text.h"
+#include "elastic/index/library_warm_up.h"
 #include "elastic/index/library_writer.h"
 #include "elastic/index/settings_file.h"
+#include "elastic/index/value_analysis.h"
+#include "elastic/search/search_run.h"
+#include "elastic/search/snapshot.h"
 #include "vantrel/elastic/index_error.h"
 #include "vantrel/elastic/library_setup.h"
 #include "vantrel/elastic/write_lock.h"
@@ -48,37 +54,53 @@ bool HoldsIndexFiles(const std::string& path) {
   });
 }
 
+// The settings of an index to be, complete.
+IndexSettings WithIdField(IndexSettings settings) {
+  const auto is_id = [&](const FieldSettings& field) { return field.name == settings.id_field; };
+  if (std::none_of(settings.fields.begin(), settings.fields.end(), is_id)) {
+    const FieldSettings id{
+        .name = settings.id_field, .type = FieldType::kKeyword, .norms = false, .frequencies = false};
+    settings.fields.insert(settings.fields.begin(), id);
+  }
+  return settings;
+}
+
 }  // namespace
 
 class Index::Impl {
  public:
   Impl(std::string path, IndexSettings settings)
-      : path_(std::move(path)), settings_(std::move(settings)), builder_(path_, settings_) {}
+      : path_(std::move(path)),
+        settings_(std::move(settings)),
+        builder_(path_, settings_),
+        snapshots_(path_) {}
 
   const std::string& path() const { return path_; }
   const IndexSettings& settings() const { return settings_; }
   const DocumentBuilder& builder() const { return builder_; }
-  bool is_writing() const { return writer_.has_value(); }
+  SnapshotKeeper& snapshots() { return snapshots_; }
 
   void StartWriting(WriteLock lock, LibraryWriter::Start start) {
     lock_ = std::move(lock);
     writer_.emplace(path_, *lock_, settings_.compound_files, start);
   }
 
-  // Runs `operation` on the writer, which is opened first where need be. A writer that failed is given up.
+  // Runs `operation` on the writer, which is opened first where need be. A writer that failed is given up. One
+  // thread at a time gets here.
   template <typename Operation>
   void Write(Operation operation) {
+    const std::lock_guard guard(write_mutex_);
     if (!lock_.has_value()) lock_.emplace(path_);
     if (!writer_.has_value()) {
       CheckCommit();
       writer_.emplace(path_, *lock_, settings_.compound_files, LibraryWriter::Start::kExistingIndex);
     }
-    try {
-      operation(*writer_);
-    } catch (...) {
-      writer_.reset();
-      throw;
-    }
+    RunWriter(operation);
+  }
+
+  void Commit() {
+    const std::lock_guard guard(write_mutex_);
+    if (writer_.has_value()) RunWriter([](LibraryWriter& writer) { writer.Commit(); });
   }
 
   // Decodes the newest commit within bounds: the library, which trusts its bytes, reads it next.
@@ -87,16 +109,30 @@ class Index::Impl {
   }
 
  private:
-  std::string path_;
-  IndexSettings settings_;
-  DocumentBuilder builder_;
+  template <typename Operation>
+  void RunWriter(Operation operation) {
+    try {
+      operation(*writer_);
+    } catch (...) {
+      writer_.reset();
+      throw;
+    }
+  }
+
+  const std::string path_;
+  const IndexSettings settings_;
+  const DocumentBuilder builder_;
+  SnapshotKeeper snapshots_;
+  std::mutex write_mutex_;  // for what follows
   std::optional<WriteLock> lock_;
   std::optional<LibraryWriter> writer_;  // after the lock: it must go first
 };
 
-std::shared_ptr<Index> Index::Create(const std::string& path, const IndexSettings& settings) {
+std::shared_ptr<Index> Index::Create(const std::string& path, const IndexSettings& wanted_settings) {
   PrepareIndexLibrary();
+  WarmUpIndexLibrary();
   CheckPath(path);
+  const IndexSettings settings = WithIdField(wanted_settings);
   CheckSettings(path, settings);
   MakeFolder(path);
   if (HoldsIndexFiles(path)) throw IndexExistsError(path);
@@ -112,6 +148,7 @@ std::shared_ptr<Index> Index::Create(const std::string& path, const IndexSetting
 
 std::shared_ptr<Index> Index::Open(const std::string& path) {
   PrepareIndexLibrary();
+  WarmUpIndexLibrary();
   CheckPath(path);
   format::UseNewestCommit(format::DiskFolder(path), [](const format::Commit&) {});
   return std::shared_ptr<Index>(new Index(std::make_unique<Impl>(path, ReadSettings(path))));
@@ -130,37 +167,41 @@ void Index::Add(const Document& document) {
   impl_->Write([&](LibraryWriter& writer) { writer.Add(built); });
 }
 
+void Index::Update(const Document& document) {
+  const Lucene::TermPtr id = impl_->builder().BuildId(document);
+  const Lucene::DocumentPtr built = impl_->builder().Build(document);
+  impl_->Write([&](LibraryWriter& writer) { writer.Update(id, built); });
+}
+
 void Index::Delete(std::string_view field, std::string_view value) {
   const Lucene::TermPtr term = impl_->builder().BuildTerm(field, value);
   impl_->Write([&](LibraryWriter& writer) { writer.Delete(term); });
 }
 
+void Index::DeleteById(std::string_view id) { Delete(settings().id_field, id); }
+
 void Index::Optimize() {
   impl_->Write([](LibraryWriter& writer) { writer.Optimize(); });
 }
 
-void Index::Commit() {
-  if (impl_->is_writing()) impl_->Write([](LibraryWriter& writer) { writer.Commit(); });
+void Index::Commit() { impl_->Commit(); }
+
+DocumentCounts Index::CountDocuments() const { return Statistics().documents; }
+
+IndexStatistics Index::Statistics() const { return ReadStatistics(format::DiskFolder(impl_->path())); }
+
+std::vector<AnalyzedToken> Index::Analyze(std::string_view field, std::string_view value) const {
+  const std::wstring checked = impl_->builder().CheckValue(field, value);
+  const auto known = std::find_if(settings().fields.begin(), settings().fields.end(),
+                                  [&](const FieldSettings& settings) { return settings.name == field; });
+  return AnalyzeValue(known->type, checked);
 }
 
-DocumentCounts Index::CountDocuments() const {
-  DocumentCounts counts;
-  const format::DiskFolder folder(impl_->path());
-  format::UseNewestCommit(folder, [&](format::Commit commit) {
-    counts = {};
-    for (format::SegmentInfo& segment : commit.segments) {
-      const auto documents = static_cast<uint64_t>(segment.document_count);
-      const format::SegmentFiles files = format::OpenSegment(folder, std::move(segment));
-      uint64_t deleted = 0;
-      if (files.deletions != nullptr) {
-        const format::Deletions deletions(files.deletions, files.info.document_count);
-        deleted = static_cast<uint64_t>(deletions.count());
-      }
-      counts.live += documents - deleted;
-      counts.deleted += deleted;
-    }
-  });
-  return counts;
+SearchResult Index::Search(const SearchRequest& request, const SearchPluginRegistry& plugins,
+                           const SearchLimits& limits) const {
+  return RunSearch({{path(), settings(), NewestSnapshot()}}, request, plugins, limits);
 }
+
+std::shared_ptr<const Snapshot> Index::NewestSnapshot() const { return impl_->snapshots().Newest(); }
 
 }  // namespace vantrel::elastic

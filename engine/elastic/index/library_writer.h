@@ -25,6 +25,7 @@ class LibraryWriter {
   ~LibraryWriter();
 
   void Add(const Lucene::DocumentPtr& document);
+  void Update(const Lucene::TermPtr& term, const Lucene::DocumentPtr& document);
   void Delete(const Lucene::TermPtr& term);
   void Optimize();
   void Commit();

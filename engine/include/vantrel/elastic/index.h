@@ -13,6 +13,8 @@
 
 namespace vantrel::elastic {
 
+class Snapshot;
+
 struct DocumentCounts {
   uint64_t live = 0;
   uint64_t deleted = 0;  // still taking space until their segments are merged
@@ -116,6 +118,8 @@ class VANTREL_ELASTIC_EXPORT Index {
                                     const SearchPluginRegistry&, const SearchLimits&);
 
   explicit Index(std::unique_ptr<Impl> impl);
+
+  std::shared_ptr<const Snapshot> NewestSnapshot() const;
 
   std::unique_ptr<Impl> impl_;
 };
