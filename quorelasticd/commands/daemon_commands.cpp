@@ -63,7 +63,8 @@ class Help : public RunningCommand {
     const std::string name = data["command"].asString();
     only_ = FindCommand(name);
     if (only_ == nullptr) {
-      throw RequestError(ErrorCode::kUnknownCommand, "data.command: there is no command " + format::Quoted(name));
+      throw RequestError(ErrorCode::kUnknownCommand,
+                         "data.command: there is no command " + format::Quoted(name));
     }
   }
 

@@ -15,8 +15,8 @@ class IndexCreate : public RunningCommand {
   IndexCreate(const Daemon& daemon, const Json::Value& data)
       : daemon_(daemon), name_(data["id"].asString()), settings_(ToSettings(data["settings"])) {
     if (IsIndexName(name_)) return;
-    throw RequestError(ErrorCode::kBadRequest,
-                       std::string("data.id: expected ") + kIndexNameRule + ", found " + format::Quoted(name_));
+    throw RequestError(ErrorCode::kBadRequest, std::string("data.id: expected ") + kIndexNameRule +
+                                                   ", found " + format::Quoted(name_));
   }
 
   boost::asio::any_io_executor executor() const override { return daemon_.registry().slow_executor(); }

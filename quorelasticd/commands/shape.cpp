@@ -99,7 +99,8 @@ void CheckArray(const Shape& shape, const Json::Value& value, const std::string&
 
 std::string MemberNames(const Shape& shape) {
   std::string names;
-  for (const Member& member : shape.members) names += (names.empty() ? "" : ", ") + format::Quoted(member.name);
+  for (const Member& member : shape.members)
+    names += (names.empty() ? "" : ", ") + format::Quoted(member.name);
   return names.empty() ? "none" : names;
 }
 

@@ -94,7 +94,8 @@ void IndexRegistry::Delete(const std::string& name) {
   const std::string lock_path = root_.IndexPath(name) + "/" + vantrel::elastic::kIndexLockFileName;
   const std::optional<FileLock> nobody_writes = FileLock::TryLock(lock_path);
   if (!nobody_writes.has_value()) {
-    throw RequestError(ErrorCode::kLocked, "index " + format::Quoted(name) + " is open for writing elsewhere");
+    throw RequestError(ErrorCode::kLocked,
+                       "index " + format::Quoted(name) + " is open for writing elsewhere");
   }
   const std::string hidden = root_.HideIndex(name);
   spdlog::info("index {} deleted", name);

@@ -2,8 +2,8 @@
 
 #include <algorithm>
 
-#include "elastic/index/index_text.h"
 #include "elastic/format/quoted.h"
+#include "elastic/index/index_text.h"
 #include "vantrel/elastic/search.h"
 #include "vantrel/elastic/search_error.h"
 
@@ -31,11 +31,12 @@ bool PluginData::TakeBool(const char* name, bool otherwise) {
 
 std::vector<std::wstring> PluginData::TakeTexts(const char* name, const SearchLimits& limits) {
   const Json::Value& values = Take(name);
-  if (!values.isArray() || values.empty()) Refuse("member " + format::Quoted(name) + " is no array with texts in it");
+  if (!values.isArray() || values.empty())
+    Refuse("member " + format::Quoted(name) + " is no array with texts in it");
   if (values.size() > limits.filter_values) {
-    throw LimitExceededError(
-        "filter_values", limits.filter_values,
-        "the data of search plugin " + format::Quoted(plugin_) + " has " + std::to_string(values.size()) + " values");
+    throw LimitExceededError("filter_values", limits.filter_values,
+                             "the data of search plugin " + format::Quoted(plugin_) + " has " +
+                                 std::to_string(values.size()) + " values");
   }
   std::vector<std::wstring> texts;
   for (const Json::Value& value : values) texts.push_back(ToText(name, value));

@@ -9,9 +9,9 @@
 #include <map>
 #include <utility>
 
+#include "elastic/format/quoted.h"
 #include "elastic/format/text.h"
 #include "elastic/index/index_text.h"
-#include "elastic/format/quoted.h"
 #include "elastic/index/text_analyzer.h"
 #include "elastic/search/pattern_query.h"
 #include "elastic/search/query_scan.h"

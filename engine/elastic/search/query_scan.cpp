@@ -277,8 +277,9 @@ class Scan {
 
   [[noreturn]] void RefuseToken(const char* expected) const {
     const Token& token = tokens_.current();
-    const std::string found =
-        token.kind == Constants::_EOF ? "the query ends" : format::Quoted(Lucene::StringUtils::toUTF8(token.image));
+    const std::string found = token.kind == Constants::_EOF
+                                  ? "the query ends"
+                                  : format::Quoted(Lucene::StringUtils::toUTF8(token.image));
     throw QuerySyntaxError(token.begin, found + " where " + expected + " is expected");
   }
 
