@@ -80,7 +80,7 @@ void RemoveCutShortCommit(const std::string& path) {
 // The settings of an index to be, complete.
 IndexSettings WithIdField(IndexSettings settings) {
   const auto is_id = [&](const FieldSettings& field) { return field.name == settings.id_field; };
-  if (std::none_of(settings.fields.begin(), settings.fields.end(), is_id)) {
+  if (!settings.fields.empty() && std::none_of(settings.fields.begin(), settings.fields.end(), is_id)) {
     const FieldSettings id{
         .name = settings.id_field, .type = FieldType::kKeyword, .norms = false, .frequencies = false};
     settings.fields.insert(settings.fields.begin(), id);

@@ -56,7 +56,8 @@ class FieldwiseParser : public Lucene::QueryParser {
   QueryPtr getFieldQuery(const String& name, const String& text, int32_t slop) override {
     return ForFields(name, [&](const String& target, bool is_text) -> QueryPtr {
       if (!is_text) return Counted(newTermQuery(newLucene<Lucene::Term>(target, text)));
-      const QueryPtr query = QueryParser::getFieldQuery(target, text, slop);
+      const QueryPtr query = QueryParser::getFieldQuery(target, text);
+      if (const auto phrase = boost::dynamic_pointer_cast<Lucene::PhraseQuery>(query)) phrase->setSlop(slop);
       if (!query) Warn("nothing of " + format::Quoted(StringUtils::toUTF8(text)) + " is left to search for");
       return Counted(WithPositions(target, query));
     });
