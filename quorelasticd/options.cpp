@@ -63,7 +63,7 @@ void Check(const Options& options) {
   CheckRange("shutdown-timeout", options.shutdown_timeout, 1, kDay);
   if (std::find(kLogLevels.begin(), kLogLevels.end(), options.log_level) == kLogLevels.end()) {
     throw OptionError("--log-level: expected debug, info, warning or error, found " +
-                      format::Quoted(options.log_level));
+                      Quoted(options.log_level));
   }
   if (options.socket.empty()) throw OptionError("--socket: expected a path, found none");
   if (options.data.empty()) throw OptionError("--data: expected a folder, found none");

@@ -58,7 +58,7 @@ std::string ToOneLine(std::string_view text) {
   return line;
 }
 
-std::string format::Quoted(std::string_view name) {
+std::string Quoted(std::string_view name) {
   bool is_cut = false;
   if (name.size() > kLongestQuote) {
     size_t end = kLongestQuote;

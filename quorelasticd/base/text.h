@@ -15,6 +15,6 @@ size_t FindInvalidUtf8(std::string_view text);
 std::string ToOneLine(std::string_view text);
 
 // A name from outside as a message shows it: in quotes, on one line, cut where it is long.
-std::string format::Quoted(std::string_view name);
+std::string Quoted(std::string_view name);
 
 }  // namespace quorelasticd

@@ -64,7 +64,7 @@ class Help : public RunningCommand {
     only_ = FindCommand(name);
     if (only_ == nullptr) {
       throw RequestError(ErrorCode::kUnknownCommand,
-                         "data.command: there is no command " + format::Quoted(name));
+                         "data.command: there is no command " + Quoted(name));
     }
   }
 

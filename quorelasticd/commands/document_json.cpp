@@ -11,7 +11,7 @@ namespace {
 [[noreturn]] void Refuse(const std::string& problem) { throw RequestError(ErrorCode::kBadRequest, problem); }
 
 [[noreturn]] void RefuseValue(const std::string& field) {
-  Refuse("field " + format::Quoted(field) + ": expected a string or an array of strings");
+  Refuse("field " + Quoted(field) + ": expected a string or an array of strings");
 }
 
 }  // namespace
@@ -33,7 +33,7 @@ vantrel::elastic::Document ToDocument(const Json::Value& json, const std::string
       for (const Json::Value& value : *member) add(field, value);
     }
   }
-  if (ids != 1) Refuse("field " + format::Quoted(id_field) + ": expected exactly one value, not empty");
+  if (ids != 1) Refuse("field " + Quoted(id_field) + ": expected exactly one value, not empty");
   return document;
 }
 

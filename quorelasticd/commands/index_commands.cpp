@@ -16,7 +16,7 @@ class IndexCreate : public RunningCommand {
       : daemon_(daemon), name_(data["id"].asString()), settings_(ToSettings(data["settings"])) {
     if (IsIndexName(name_)) return;
     throw RequestError(ErrorCode::kBadRequest, std::string("data.id: expected ") + kIndexNameRule +
-                                                   ", found " + format::Quoted(name_));
+                                                   ", found " + Quoted(name_));
   }
 
   boost::asio::any_io_executor executor() const override { return daemon_.registry().slow_executor(); }
@@ -87,7 +87,7 @@ class IndexDelete : public RunningCommand {
   IndexDelete(const Daemon& daemon, const Json::Value& data) : daemon_(daemon), name_(data["id"].asString()) {
     if (data["confirm"].asString() == name_) return;
     throw RequestError(ErrorCode::kBadRequest,
-                       "data.confirm: expected the same name as data.id, " + format::Quoted(name_));
+                       "data.confirm: expected the same name as data.id, " + Quoted(name_));
   }
 
   boost::asio::any_io_executor executor() const override { return daemon_.registry().slow_executor(); }

@@ -92,7 +92,7 @@ void TakeApart(const std::string& text, Request& request) {
   if (name.isString()) request.command = FindCommand(name.asString());
   CheckShape(RequestShape(), root, "");
   if (request.command == nullptr) {
-    throw RequestError(ErrorCode::kUnknownCommand, "there is no command " + format::Quoted(name.asString()) +
+    throw RequestError(ErrorCode::kUnknownCommand, "there is no command " + Quoted(name.asString()) +
                                                        "; the command \"help\" lists those there are");
   }
   if (root.isMember("data")) request.data.swap(root["data"]);

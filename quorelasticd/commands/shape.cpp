@@ -83,7 +83,7 @@ void CheckString(const Shape& shape, const Json::Value& value, const std::string
   if (FindInvalidUtf8(text) != std::string::npos) Refuse(path, "is no valid Unicode text");
   if (shape.choices.empty()) return;
   if (std::find(shape.choices.begin(), shape.choices.end(), text) != shape.choices.end()) return;
-  Refuse(path, "expected " + Expected(shape) + ", found " + format::Quoted(text));
+  Refuse(path, "expected " + Expected(shape) + ", found " + Quoted(text));
 }
 
 void CheckArray(const Shape& shape, const Json::Value& value, const std::string& path) {
@@ -100,7 +100,7 @@ void CheckArray(const Shape& shape, const Json::Value& value, const std::string&
 std::string MemberNames(const Shape& shape) {
   std::string names;
   for (const Member& member : shape.members)
-    names += (names.empty() ? "" : ", ") + format::Quoted(member.name);
+    names += (names.empty() ? "" : ", ") + Quoted(member.name);
   return names.empty() ? "none" : names;
 }
 
@@ -114,7 +114,7 @@ void CheckObject(const Shape& shape, const Json::Value& value, const std::string
                                       [&](const Member& member) { return member.name == name; });
     if (is_known) continue;
     Refuse(path.empty() ? "the request" : path,
-           "unknown member " + format::Quoted(name) + "; expected: " + MemberNames(shape));
+           "unknown member " + Quoted(name) + "; expected: " + MemberNames(shape));
   }
   for (const Member& member : shape.members) {
     const std::string inner = Inner(path, member.name);

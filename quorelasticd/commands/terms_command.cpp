@@ -58,7 +58,7 @@ class Terms : public RunningCommand {
     const auto& fields = open_->index().settings().fields;
     if (std::any_of(fields.begin(), fields.end(), [&](const auto& field) { return field.name == name; }))
       return;
-    throw RequestError(ErrorCode::kBadRequest, "data.field: the index has no field " + format::Quoted(name));
+    throw RequestError(ErrorCode::kBadRequest, "data.field: the index has no field " + Quoted(name));
   }
 
   // True when no more terms are to come.

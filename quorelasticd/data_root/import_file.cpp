@@ -19,7 +19,7 @@ namespace {
 constexpr size_t kReadPiece = size_t{256} << 10;
 
 [[noreturn]] void Refuse(const std::string& name, const std::string& problem) {
-  throw RequestError(ErrorCode::kBadRequest, "file " + format::Quoted(name) + ": " + problem);
+  throw RequestError(ErrorCode::kBadRequest, "file " + Quoted(name) + ": " + problem);
 }
 
 // Goes down one component at a time and follows no link: nothing that the file system holds leads out.

@@ -18,7 +18,7 @@ namespace quorelasticd {
 namespace {
 
 RequestError NotFound(const std::string& name) {
-  return RequestError(ErrorCode::kIndexNotFound, "there is no index " + format::Quoted(name));
+  return RequestError(ErrorCode::kIndexNotFound, "there is no index " + Quoted(name));
 }
 
 }  // namespace
@@ -62,7 +62,7 @@ void IndexRegistry::Create(const std::string& name, const vantrel::elastic::Inde
   {
     const std::lock_guard lock(mutex_);
     if (reserved_.contains(name) || root_.HasIndex(name)) {
-      throw RequestError(ErrorCode::kIndexExists, "there is an index " + format::Quoted(name) + " already");
+      throw RequestError(ErrorCode::kIndexExists, "there is an index " + Quoted(name) + " already");
     }
     if (root_.ListIndexes().size() + reserved_.size() >= kMostIndexes) {
       throw LimitExceeded("indexes", kMostIndexes, "in the data folder");
@@ -83,7 +83,7 @@ void IndexRegistry::Delete(const std::string& name) {
     if (const auto found = open_.find(name); found != open_.end()) {
       if (found->second.use_count() > 1) {
         throw RequestError(ErrorCode::kLocked,
-                           "index " + format::Quoted(name) + " is in use by requests still running");
+                           "index " + Quoted(name) + " is in use by requests still running");
       }
       closing = std::move(found->second);
       open_.erase(found);
@@ -95,7 +95,7 @@ void IndexRegistry::Delete(const std::string& name) {
   const std::optional<FileLock> nobody_writes = FileLock::TryLock(lock_path);
   if (!nobody_writes.has_value()) {
     throw RequestError(ErrorCode::kLocked,
-                       "index " + format::Quoted(name) + " is open for writing elsewhere");
+                       "index " + Quoted(name) + " is open for writing elsewhere");
   }
   const std::string hidden = root_.HideIndex(name);
   spdlog::info("index {} deleted", name);
