@@ -3,24 +3,46 @@
 #include <json/reader.h>
 #include <json/writer.h>
 
-#include <exception>
 #include <fstream>
 #include <memory>
 #include <sstream>
 
 namespace vantrel::elastic {
+namespace {
+
+// Making these takes longer than a short document; made once, they are only read.
+const Json::CharReaderBuilder& Readers() {
+  static const Json::CharReaderBuilder builder = [] {
+    Json::CharReaderBuilder made;
+    made["collectComments"] = false;
+    made["allowTrailingCommas"] = false;
+    made["failIfExtra"] = true;
+    made["stackLimit"] = 1000;
+    return made;
+  }();
+  return builder;
+}
+
+const Json::StreamWriterBuilder& Writers() {
+  static const Json::StreamWriterBuilder builder = [] {
+    Json::StreamWriterBuilder made;
+    made["indentation"] = "";
+    made["emitUTF8"] = true;
+    return made;
+  }();
+  return builder;
+}
+
+}  // namespace
 
 bool JsonValue::fromString(const std::string& text) {
-  Json::CharReaderBuilder builder;
-  builder["collectComments"] = false;
-  builder["allowTrailingCommas"] = false;
-  builder["failIfExtra"] = true;
-  builder["stackLimit"] = 1000;
   bool parsed = false;
   try {
-    const std::unique_ptr<Json::CharReader> reader(builder.newCharReader());
-    parsed = reader->parse(text.data(), text.data() + text.size(), this, nullptr);
-  } catch (const std::exception&) {
+    // To the library, a zero byte behind the document is the end of the text, whatever follows.
+    const std::unique_ptr<Json::CharReader> reader(Readers().newCharReader());
+    parsed = reader->parse(text.data(), text.data() + text.size(), this, nullptr) &&
+             text.find('\0', static_cast<size_t>(getOffsetLimit())) == std::string::npos;
+  } catch (const Json::Exception&) {
     // The library throws, rather than answers false, where a document is nested too deep.
   }
   if (!parsed) Json::Value::operator=(Json::Value());
@@ -38,11 +60,6 @@ bool JsonValue::fromFile(const std::string& path) {
   return fromString(text.str());
 }
 
-std::string JsonValue::toString() const {
-  Json::StreamWriterBuilder builder;
-  builder["indentation"] = "";
-  builder["emitUTF8"] = true;
-  return Json::writeString(builder, *this);
-}
+std::string JsonValue::toString() const { return Json::writeString(Writers(), *this); }
 
 }  // namespace vantrel::elastic

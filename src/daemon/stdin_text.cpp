@@ -1,5 +1,27 @@
 #include "daemon/stdin_text.h"
 
-#include <stdexcept>
+#include <unistd.h>
 
-void ReadStdinText(std::string&) { throw std::logic_error("not built yet"); }
+#include <iostream>
+#include <sstream>
+
+namespace {
+
+[[noreturn]] void WaitForever() {
+  for (;;) pause();
+}
+
+}  // namespace
+
+void ReadStdinText(std::string& text) {
+  constexpr std::streamsize kLineSize = 1024;  // the terminating NUL included
+  char line[kLineSize];
+  std::stringstream collected;
+  for (;;) {
+    std::cin.getline(line, kLineSize);
+    if (std::cin.eof()) break;
+    collected << line;
+    if (std::cin.fail()) WaitForever();  // a line that is too long
+  }
+  text = collected.str();
+}

@@ -90,6 +90,17 @@ TEST(JsonValueTest, WhatIsNoDocumentLeavesNull) {
   }
 }
 
+TEST(JsonValueTest, AZeroByteBehindADocumentIsNotItsEnd) {
+  using namespace std::string_literals;
+  for (const std::string& text :
+       {"{}\0"s, "{} \0"s, "[1]\0, and more"s, "17\0"s, "\"s\"\0"s, "null\0"s, "\0{}"s}) {
+    JsonValue value(7);
+    EXPECT_FALSE(value.fromString(text)) << text;
+    EXPECT_TRUE(value.isNull()) << text;
+  }
+  EXPECT_EQ(Parsed("{\"a\":\"b\0\"}"s)["a"].asString(), "b\0"s);
+}
+
 TEST(JsonValueTest, BlanksAroundADocumentAreNoMatter) {
   EXPECT_EQ(Parsed(" \n\t {\"a\" : [ 1 , 2 ] } \r\n").toString(), "{\"a\":[1,2]}");
 }
