@@ -10,3 +10,14 @@ find_package(Threads REQUIRED)
 add_library(quorelastic_lucene INTERFACE)
 target_include_directories(quorelastic_lucene SYSTEM INTERFACE ${LUCENE_INCLUDE_DIRS})
 target_link_libraries(quorelastic_lucene INTERFACE PkgConfig::LUCENE Boost::filesystem Boost::system Boost::thread)
+
+# The daemon's.
+find_package(Boost 1.74 REQUIRED COMPONENTS program_options)
+find_package(spdlog REQUIRED)
+pkg_check_modules(SYSTEMD REQUIRED IMPORTED_TARGET GLOBAL libsystemd)
+add_library(quorelastic_asio INTERFACE)
+target_link_libraries(quorelastic_asio INTERFACE Boost::headers Threads::Threads)
+if(QUORELASTIC_SANITIZE MATCHES "thread")
+  # The thread sanitizer knows no fences. The library's queues are locked, so that its fences add nothing for us.
+  target_compile_definitions(quorelastic_asio INTERFACE BOOST_ASIO_DISABLE_FENCED_BLOCK)
+endif()

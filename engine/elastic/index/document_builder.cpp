@@ -45,7 +45,7 @@ Lucene::FieldPtr NewField(const FieldSettings& settings, const std::wstring& nam
 }  // namespace
 
 DocumentBuilder::DocumentBuilder(std::string folder, const IndexSettings& settings)
-    : folder_(std::move(folder)) {
+    : folder_(std::move(folder)), id_field_(settings.id_field) {
   for (const FieldSettings& field : settings.fields) {
     std::wstring wide_name;
     ToIndexText(field.name, wide_name);
@@ -66,6 +66,21 @@ Lucene::DocumentPtr DocumentBuilder::Build(const Document& document) const {
     built->add(NewField(field.settings, field.wide_name, CheckedValue(field, value.value)));
   }
   return built;
+}
+
+Lucene::TermPtr DocumentBuilder::BuildId(const Document& document) const {
+  const DocumentField* id = nullptr;
+  for (const DocumentField& value : document.fields) {
+    if (value.name != id_field_) continue;
+    if (id != nullptr) Refuse(id_field_, "the document has more than one id");
+    id = &value;
+  }
+  if (id == nullptr) Refuse(id_field_, "the document has no id");
+  return BuildId(id->value);
+}
+
+std::wstring DocumentBuilder::CheckValue(std::string_view field, std::string_view value) const {
+  return CheckedValue(Find(field), value);
 }
 
 Lucene::TermPtr DocumentBuilder::BuildTerm(std::string_view field, std::string_view value) const {

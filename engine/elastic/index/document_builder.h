@@ -21,6 +21,13 @@ class DocumentBuilder {
   // Throws IndexValueError.
   Lucene::DocumentPtr Build(const Document& document) const;
 
+  // The one id of a document, as a term. Throws IndexValueError where there is none, or more than one.
+  Lucene::TermPtr BuildId(const Document& document) const;
+  Lucene::TermPtr BuildId(std::string_view id) const { return BuildTerm(id_field_, id); }
+
+  // What Add would index of a value. Throws IndexValueError.
+  std::wstring CheckValue(std::string_view field, std::string_view value) const;
+
   // A term to look for in the index. Throws IndexValueError: no such field, no valid UTF-8.
   Lucene::TermPtr BuildTerm(std::string_view field, std::string_view value) const;
 
@@ -35,6 +42,7 @@ class DocumentBuilder {
   [[noreturn]] void Refuse(std::string_view field, const std::string& problem) const;
 
   std::string folder_;
+  std::string id_field_;
   std::map<std::string, Field, std::less<>> fields_;
 };
 

@@ -5,6 +5,7 @@
 
 #include <algorithm>
 #include <cerrno>
+#include <mutex>
 #include <optional>
 #include <utility>
 
@@ -15,12 +16,17 @@
 #include "elastic/format/segment_files.h"
 #include "elastic/index/document_builder.h"
 #include "elastic/index/durable_file.h"
+#include "elastic/index/index_statistics.h"
 #include "elastic/index/index_text.h"
+#include "elastic/index/library_warm_up.h"
 #include "elastic/index/library_writer.h"
 #include "elastic/index/settings_file.h"
-#include "elastic/index/write_lock.h"
+#include "elastic/index/value_analysis.h"
+#include "elastic/search/search_run.h"
+#include "elastic/search/snapshot.h"
 #include "vantrel/elastic/index_error.h"
 #include "vantrel/elastic/library_setup.h"
+#include "vantrel/elastic/write_lock.h"
 
 namespace vantrel::elastic {
 namespace {
@@ -71,53 +77,68 @@ void RemoveCutShortCommit(const std::string& path) {
   }
 }
 
+// The settings of an index to be, complete.
+IndexSettings WithIdField(IndexSettings settings) {
+  const auto is_id = [&](const FieldSettings& field) { return field.name == settings.id_field; };
+  if (!settings.fields.empty() && std::none_of(settings.fields.begin(), settings.fields.end(), is_id)) {
+    const FieldSettings id{
+        .name = settings.id_field, .type = FieldType::kKeyword, .norms = false, .frequencies = false};
+    settings.fields.insert(settings.fields.begin(), id);
+  }
+  return settings;
+}
+
 }  // namespace
 
 class Index::Impl {
  public:
   Impl(std::string path, IndexSettings settings)
-      : path_(std::move(path)), settings_(std::move(settings)), builder_(path_, settings_) {}
+      : path_(std::move(path)),
+        settings_(std::move(settings)),
+        builder_(path_, settings_),
+        snapshots_(path_) {}
 
   const std::string& path() const { return path_; }
   const IndexSettings& settings() const { return settings_; }
   const DocumentBuilder& builder() const { return builder_; }
+  SnapshotKeeper& snapshots() { return snapshots_; }
 
   void StartWriting(WriteLock lock, LibraryWriter::Start start) {
     lock_ = std::move(lock);
     writer_.emplace(path_, *lock_, settings_.compound_files, start);
   }
 
-  // Runs `operation` on the writer, which is opened first where need be. A writer that failed is given up.
+  // Runs `operation` on the writer, which is opened first where need be. A writer that failed is given up. One
+  // thread at a time gets here.
   template <typename Operation>
   void Write(Operation operation) {
+    const std::lock_guard guard(write_mutex_);
     if (!lock_.has_value()) lock_.emplace(path_);
     if (!writer_.has_value()) {
       CheckCommit();
       writer_.emplace(path_, *lock_, settings_.compound_files, LibraryWriter::Start::kExistingIndex);
     }
-    try {
-      operation(*writer_);
-    } catch (...) {
-      writer_.reset();
-      if (std::exchange(has_changes_, false)) changes_are_lost_ = true;
-      throw;
-    }
+    RunWriter(operation);
   }
 
+  // Writes what only a commit makes visible.
   template <typename Operation>
   void Change(Operation operation) {
-    Write(operation);
-    has_changes_ = true;
+    Write([&](LibraryWriter& writer) {
+      operation(writer);
+      has_changes_ = true;
+    });
   }
 
   // Commits, unless changes of this round are lost already: that is told once, then what came since counts.
   void Commit() {
+    const std::lock_guard guard(write_mutex_);
     if (std::exchange(changes_are_lost_, false)) {
       throw IndexError(path_, "changes since the last commit were lost when a later one failed");
     }
     if (!writer_.has_value()) return;
     try {
-      Write([](LibraryWriter& writer) { writer.Commit(); });
+      RunWriter([](LibraryWriter& writer) { writer.Commit(); });
     } catch (...) {
       changes_are_lost_ = false;  // told by this very exception
       throw;
@@ -131,18 +152,33 @@ class Index::Impl {
   }
 
  private:
-  std::string path_;
-  IndexSettings settings_;
-  DocumentBuilder builder_;
+  template <typename Operation>
+  void RunWriter(Operation operation) {
+    try {
+      operation(*writer_);
+    } catch (...) {
+      writer_.reset();
+      if (std::exchange(has_changes_, false)) changes_are_lost_ = true;
+      throw;
+    }
+  }
+
+  const std::string path_;
+  const IndexSettings settings_;
+  const DocumentBuilder builder_;
+  SnapshotKeeper snapshots_;
+  std::mutex write_mutex_;  // for what follows
   std::optional<WriteLock> lock_;
   std::optional<LibraryWriter> writer_;  // after the lock: it must go first
   bool has_changes_ = false;             // that are not committed
   bool changes_are_lost_ = false;        // that a caller takes for made
 };
 
-std::shared_ptr<Index> Index::Create(const std::string& path, const IndexSettings& settings) {
+std::shared_ptr<Index> Index::Create(const std::string& path, const IndexSettings& wanted_settings) {
   PrepareIndexLibrary();
+  WarmUpIndexLibrary();
   CheckPath(path);
+  const IndexSettings settings = WithIdField(wanted_settings);
   CheckSettings(path, settings);
   MakeFolder(path);
   if (HoldsIndexFiles(path)) throw IndexExistsError(path);
@@ -159,6 +195,7 @@ std::shared_ptr<Index> Index::Create(const std::string& path, const IndexSetting
 
 std::shared_ptr<Index> Index::Open(const std::string& path) {
   PrepareIndexLibrary();
+  WarmUpIndexLibrary();
   CheckPath(path);
   format::UseNewestCommit(format::DiskFolder(path), [](const format::Commit&) {});
   return std::shared_ptr<Index>(new Index(std::make_unique<Impl>(path, ReadSettings(path))));
@@ -177,10 +214,18 @@ void Index::Add(const Document& document) {
   impl_->Change([&](LibraryWriter& writer) { writer.Add(built); });
 }
 
+void Index::Update(const Document& document) {
+  const Lucene::TermPtr id = impl_->builder().BuildId(document);
+  const Lucene::DocumentPtr built = impl_->builder().Build(document);
+  impl_->Change([&](LibraryWriter& writer) { writer.Update(id, built); });
+}
+
 void Index::Delete(std::string_view field, std::string_view value) {
   const Lucene::TermPtr term = impl_->builder().BuildTerm(field, value);
   impl_->Change([&](LibraryWriter& writer) { writer.Delete(term); });
 }
+
+void Index::DeleteById(std::string_view id) { Delete(settings().id_field, id); }
 
 void Index::Optimize() {
   impl_->Write([](LibraryWriter& writer) { writer.Optimize(); });
@@ -188,24 +233,22 @@ void Index::Optimize() {
 
 void Index::Commit() { impl_->Commit(); }
 
-DocumentCounts Index::CountDocuments() const {
-  DocumentCounts counts;
-  const format::DiskFolder folder(impl_->path());
-  format::UseNewestCommit(folder, [&](format::Commit commit) {
-    counts = {};
-    for (format::SegmentInfo& segment : commit.segments) {
-      const auto documents = static_cast<uint64_t>(segment.document_count);
-      const format::SegmentFiles files = format::OpenSegment(folder, std::move(segment));
-      uint64_t deleted = 0;
-      if (files.deletions != nullptr) {
-        const format::Deletions deletions(files.deletions, files.info.document_count);
-        deleted = static_cast<uint64_t>(deletions.count());
-      }
-      counts.live += documents - deleted;
-      counts.deleted += deleted;
-    }
-  });
-  return counts;
+DocumentCounts Index::CountDocuments() const { return Statistics().documents; }
+
+IndexStatistics Index::Statistics() const { return ReadStatistics(format::DiskFolder(impl_->path())); }
+
+std::vector<AnalyzedToken> Index::Analyze(std::string_view field, std::string_view value) const {
+  const std::wstring checked = impl_->builder().CheckValue(field, value);
+  const auto known = std::find_if(settings().fields.begin(), settings().fields.end(),
+                                  [&](const FieldSettings& settings) { return settings.name == field; });
+  return AnalyzeValue(known->type, checked);
 }
+
+SearchResult Index::Search(const SearchRequest& request, const SearchPluginRegistry& plugins,
+                           const SearchLimits& limits) const {
+  return RunSearch({{path(), settings(), NewestSnapshot()}}, request, plugins, limits);
+}
+
+std::shared_ptr<const Snapshot> Index::NewestSnapshot() const { return impl_->snapshots().Newest(); }
 
 }  // namespace vantrel::elastic

@@ -45,6 +45,10 @@ void LibraryWriter::Add(const Lucene::DocumentPtr& document) {
   Run("cannot add a document", [&] { writer_->addDocument(document); });
 }
 
+void LibraryWriter::Update(const Lucene::TermPtr& term, const Lucene::DocumentPtr& document) {
+  Run("cannot replace a document", [&] { writer_->updateDocument(term, document); });
+}
+
 void LibraryWriter::Delete(const Lucene::TermPtr& term) {
   Run("cannot delete documents", [&] { writer_->deleteDocuments(term); });
 }

@@ -6,7 +6,7 @@
 #include <string>
 
 #include "elastic/index/disk_directory.h"
-#include "elastic/index/write_lock.h"
+#include "vantrel/elastic/write_lock.h"
 
 namespace vantrel::elastic {
 
@@ -25,6 +25,7 @@ class LibraryWriter {
   ~LibraryWriter();
 
   void Add(const Lucene::DocumentPtr& document);
+  void Update(const Lucene::TermPtr& term, const Lucene::DocumentPtr& document);
   void Delete(const Lucene::TermPtr& term);
   void Optimize();
   void Commit();

@@ -116,6 +116,15 @@ std::string ReadWholeFile(const std::string& folder) {
   return text;
 }
 
+void CheckIdField(const std::string& folder, const IndexSettings& settings) {
+  for (const FieldSettings& field : settings.fields) {
+    if (field.name != settings.id_field) continue;
+    if (field.type == FieldType::kKeyword && field.stored) return;
+    throw IndexValueError(folder, "the id field " + format::Quoted(field.name) + " is no stored keyword");
+  }
+  throw IndexValueError(folder, "the settings lack the id field " + format::Quoted(settings.id_field));
+}
+
 }  // namespace
 
 void CheckSettings(const std::string& folder, const IndexSettings& settings) {
@@ -131,12 +140,14 @@ void CheckSettings(const std::string& folder, const IndexSettings& settings) {
       throw IndexValueError(folder, "the settings have two fields of the name " + format::Quoted(field.name));
     }
   }
+  CheckIdField(folder, settings);
 }
 
 void WriteSettings(const std::string& folder, const IndexSettings& settings) {
   JsonValue root(Json::objectValue);
   root["version"] = kVersion;
   root["compound_files"] = settings.compound_files;
+  root["id_field"] = settings.id_field;
   root["fields"] = Json::arrayValue;
   for (const FieldSettings& field : settings.fields) {
     Json::Value& object = root["fields"].append(Json::objectValue);
@@ -159,6 +170,7 @@ IndexSettings ReadSettings(const std::string& folder) {
   if (!version.isInt() || version.asInt() != kVersion) object.Refuse("is of an unknown version");
   IndexSettings settings;
   settings.compound_files = object.TakeBool("compound_files");
+  settings.id_field = object.TakeString("id_field");
   const Json::Value& fields = object.Take("fields");
   if (!fields.isArray()) object.Refuse("member \"fields\" is no array");
   for (const Json::Value& field : fields) {

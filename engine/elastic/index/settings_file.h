@@ -8,7 +8,7 @@ namespace vantrel::elastic {
 
 // The settings of an index, kept beside its files as JSON:
 //
-//   {"version": 1, "compound_files": true,
+//   {"version": 1, "compound_files": true, "id_field": "id",
 //    "fields": [{"name": "id", "type": "keyword", "stored": true, "term_vector": "none", "norms": false,
 //                "frequencies": false}, ...]}
 //
@@ -18,7 +18,7 @@ namespace vantrel::elastic {
 inline constexpr const char* kSettingsFileName = "quorelastic.json";  // no name of the index library's files
 
 // Throws IndexValueError, about the folder, where settings cannot be honoured: no field, two of one name, a
-// name that is empty or not valid UTF-8.
+// name that is empty or not valid UTF-8, an id field that is missing or no stored keyword.
 void CheckSettings(const std::string& folder, const IndexSettings& settings);
 
 // Durable on return. Throws IndexIoError.

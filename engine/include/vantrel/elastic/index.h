@@ -4,16 +4,36 @@
 #include <memory>
 #include <string>
 #include <string_view>
+#include <vector>
 
 #include "vantrel/elastic/document.h"
 #include "vantrel/elastic/export.h"
 #include "vantrel/elastic/index_settings.h"
+#include "vantrel/elastic/search.h"
 
 namespace vantrel::elastic {
+
+class Snapshot;
 
 struct DocumentCounts {
   uint64_t live = 0;
   uint64_t deleted = 0;  // still taking space until their segments are merged
+};
+
+// An index as of its newest commit.
+struct IndexStatistics {
+  DocumentCounts documents;
+  uint64_t segments = 0;
+  uint64_t bytes = 0;  // on disk, of every file in the folder, also those not yet committed or just replaced
+  int64_t generation = 0;  // of the commit; grows with each
+};
+
+// A word of a text as it is indexed.
+struct AnalyzedToken {
+  std::string text;
+  uint64_t position = 0;  // among the words of the value, from 0; phrases go by it
+  uint64_t start = 0;     // where it stands in the value, in characters (code points)
+  uint64_t end = 0;       // behind its last character
 };
 
 // An index in a folder of its own: the files of the index library and, beside them, the settings.
@@ -25,7 +45,13 @@ struct DocumentCounts {
 // The first change takes the index's write lock and keeps it as long as the object lives; there is one writer
 // at a time, over all processes. An Index that changes nothing leaves the folder alone.
 //
-// For one thread at a time. Errors are IndexError (index_error.h):
+// Searches see the newest commit, whoever made it. A search keeps to the commit it began with; the files of
+// that are let go with the last search that is at them.
+//
+// Any number of threads may use an Index at once. Changes are made one after another: a thread that changes
+// something waits for those before it, an Optimize or a Commit included. Searches wait for nobody.
+//
+// Errors are IndexError (index_error.h), and in searches also SearchError (search_error.h):
 //   IndexValueError   the argument cannot be taken; nothing happened, everything else still holds
 //   IndexLockedError  somebody else is writing
 //   any other         disk, memory or files failed; where a change was under way, every change since the last
@@ -52,8 +78,16 @@ class VANTREL_ELASTIC_EXPORT Index {
 
   // Adds a document, wholly or not at all. Refused are: a field without settings, a value that is not valid
   // UTF-8 or holds a character that the files cannot keep (U+FFFE, U+FFFF, U+1FFFF; in a text also U+0000), a
-  // keyword or a word of a text above 16383 characters, and values of more than 256 MiB in all.
+  // keyword or a word of a text above 16383 characters, and values of more than 256 MiB in all. The document
+  // need not have an id, and nothing is done about others of the same one: that is what Update is for.
   void Add(const Document& document);
+
+  // Puts the document in the place of every other of the same id, wholly or not at all; where there is none,
+  // it is just added. Refused is what Add refuses, and a document that has not exactly one id.
+  void Update(const Document& document);
+
+  // Deletes the documents of this id, also of this round.
+  void DeleteById(std::string_view id);
 
   // Deletes every document, also of this round, that holds exactly this term: a keyword's value, or one word
   // of a text in the form it is indexed in.
@@ -71,10 +105,25 @@ class VANTREL_ELASTIC_EXPORT Index {
   // The documents of the newest commit, whoever made it.
   DocumentCounts CountDocuments() const;
 
+  IndexStatistics Statistics() const;
+
+  // What becomes of a value of a field: the terms that are indexed. A keyword is one. Throws IndexValueError for
+  // what Add refuses.
+  std::vector<AnalyzedToken> Analyze(std::string_view field, std::string_view value) const;
+
+  // Searches this index alone; see SearchIndexes.
+  SearchResult Search(const SearchRequest& request,
+                      const SearchPluginRegistry& plugins = SearchPluginRegistry::BuiltIn(),
+                      const SearchLimits& limits = SearchLimits()) const;
+
  private:
   class Impl;
+  friend SearchResult SearchIndexes(const std::vector<std::shared_ptr<Index>>&, const SearchRequest&,
+                                    const SearchPluginRegistry&, const SearchLimits&);
 
   explicit Index(std::unique_ptr<Impl> impl);
+
+  std::shared_ptr<const Snapshot> NewestSnapshot() const;
 
   std::unique_ptr<Impl> impl_;
 };

@@ -26,7 +26,12 @@ struct FieldSettings {
 
 struct IndexSettings {
   std::vector<FieldSettings> fields;  // at least one, no two of one name
-  bool compound_files = true;         // one file a segment: fewer open files, a little more work to write
+
+  // The field that tells a document from every other, for Update and DeleteById: a stored keyword. Where it is
+  // not among the fields of an index to be created, it is put before them.
+  std::string id_field = "id";
+
+  bool compound_files = true;  // one file a segment: fewer open files, a little more work to write
 };
 
 }  // namespace vantrel::elastic

@@ -1,0 +1,54 @@
+#include "elastic/index/library_warm_up.h"
+
+#include <mutex>
+#include <vector>
+
+#include "elastic/index/text_analyzer.h"
+#include "elastic/search/hit_collector.h"
+#include "elastic/search/query_builder.h"
+
+namespace vantrel::elastic {
+namespace {
+
+using Lucene::newLucene;
+
+Lucene::IndexReaderPtr WriteAndOpen(const Lucene::DirectoryPtr& directory) {
+  const auto writer = newLucene<Lucene::IndexWriter>(directory, NewTextAnalyzer(), true,
+                                                     Lucene::IndexWriter::MaxFieldLengthUNLIMITED);
+  for (int i = 0; i < 3; ++i) {
+    const auto document = newLucene<Lucene::Document>();
+    document->add(newLucene<Lucene::Field>(L"text", L"one two three", Lucene::AbstractField::STORE_YES,
+                                           Lucene::AbstractField::INDEX_ANALYZED,
+                                           Lucene::AbstractField::TERM_VECTOR_WITH_POSITIONS_OFFSETS));
+    writer->addDocument(document);
+    writer->commit();
+  }
+  writer->deleteDocuments(newLucene<Lucene::Term>(L"text", L"four"));
+  writer->optimize();
+  writer->close();
+  return Lucene::IndexReader::open(directory, true);
+}
+
+// Goes once through everything that searching and writing use.
+void WarmUp() {
+  IndexSettings settings;
+  settings.fields = {{.name = "text"}};
+  const Lucene::IndexReaderPtr reader = WriteAndOpen(newLucene<Lucene::RAMDirectory>());
+  const auto searcher = newLucene<Lucene::IndexSearcher>(reader);
+  for (const char* query : {"one", "one two", "+one -two", "\"one two\"", "\"one three\"~5", "t*", "*o*",
+                            "twi~", "[one TO two]", "*:*", "one AND (two OR three)^2"}) {
+    searcher->search(BuildQuery(query, settings, SearchLimits()).query,
+                     newLucene<HitCollector>(10, std::nullopt));
+  }
+  reader->document(0);
+  reader->reopen()->close();
+}
+
+}  // namespace
+
+void WarmUpIndexLibrary() {
+  static std::once_flag once;
+  std::call_once(once, WarmUp);
+}
+
+}  // namespace vantrel::elastic

@@ -1,0 +1,57 @@
+#include "elastic/search/hit_collector.h"
+
+// Not without the index library's main header.
+#include <lucene++/Scorer.h>
+
+#include <algorithm>
+#include <tuple>
+#include <utility>
+
+namespace vantrel::elastic {
+namespace {
+
+// How many documents are collected between two looks at the clock.
+constexpr uint64_t kDeadlineInterval = 1024;
+
+bool IsBetter(const FoundDocument& a, const FoundDocument& b) {
+  if (a.score != b.score) return a.score > b.score;
+  return std::tie(a.index, a.document) < std::tie(b.index, b.document);
+}
+
+}  // namespace
+
+HitCollector::HitCollector(size_t most_kept, Deadline deadline)
+    : most_kept_(most_kept), deadline_(deadline) {}
+
+std::vector<FoundDocument> HitCollector::TakeBest() {
+  std::sort(heap_.begin(), heap_.end(), IsBetter);
+  return std::move(heap_);
+}
+
+void HitCollector::setScorer(const Lucene::ScorerPtr& scorer) { scorer_ = scorer.get(); }
+
+void HitCollector::collect(int32_t document) {
+  const FoundDocument found{scorer_->score(), index_, document_base_ + document};
+  max_score_ = total_ == 0 ? found.score : std::max(max_score_, found.score);
+  if (++total_ % kDeadlineInterval == 0) CheckDeadline();
+  if (heap_.size() < most_kept_) {
+    heap_.push_back(found);
+    std::push_heap(heap_.begin(), heap_.end(), IsBetter);
+  } else if (most_kept_ > 0 && IsBetter(found, heap_.front())) {
+    std::pop_heap(heap_.begin(), heap_.end(), IsBetter);
+    heap_.back() = found;
+    std::push_heap(heap_.begin(), heap_.end(), IsBetter);
+  }
+}
+
+void HitCollector::setNextReader(const Lucene::IndexReaderPtr& /*reader*/, int32_t document_base) {
+  CheckDeadline();
+  document_base_ = document_base;
+}
+
+void HitCollector::CheckDeadline() const {
+  if (!deadline_.has_value() || std::chrono::steady_clock::now() < *deadline_) return;
+  boost::throw_exception(Lucene::TimeExceededException(L"the search took too long"));
+}
+
+}  // namespace vantrel::elastic

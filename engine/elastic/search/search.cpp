@@ -1,0 +1,182 @@
+#include "vantrel/elastic/search.h"
+
+#include <algorithm>
+#include <limits>
+#include <map>
+#include <set>
+#include <utility>
+
+#include "elastic/format/quoted.h"
+#include "elastic/search/common_searcher.h"
+#include "elastic/search/field_filter.h"
+#include "elastic/search/hit_collector.h"
+#include "elastic/search/library_failure.h"
+#include "elastic/search/query_builder.h"
+#include "elastic/search/search_run.h"
+#include "elastic/search/stored_fields.h"
+#include "vantrel/elastic/index.h"
+#include "vantrel/elastic/index_error.h"
+#include "vantrel/elastic/search_error.h"
+
+namespace vantrel::elastic {
+namespace {
+
+using Lucene::newLucene;
+
+void CheckIndexCount(size_t indexes, const SearchLimits& limits) {
+  if (indexes <= limits.indexes) return;
+  throw LimitExceededError("indexes", limits.indexes,
+                           "the search goes over " + std::to_string(indexes) + " indexes");
+}
+
+void CheckRequest(const SearchRequest& request, const SearchLimits& limits) {
+  if (request.from > limits.window || request.size > limits.window - request.from) {
+    throw LimitExceededError("window", limits.window,
+                             "from " + std::to_string(request.from) + " and size " +
+                                 std::to_string(request.size) + " reach too far");
+  }
+  if (request.filters.size() > limits.filters) {
+    throw LimitExceededError("filters", limits.filters,
+                             "the search has " + std::to_string(request.filters.size()) + " filters");
+  }
+}
+
+// Null where the request has no filter.
+Lucene::FilterPtr MakeFilter(const SearchRequest& request, const SearchPluginRegistry& plugins,
+                             const SearchPluginContext& context) {
+  std::vector<Lucene::FilterPtr> made;
+  for (const SearchFilter& filter : request.filters) {
+    if (filter.plugin.empty()) continue;
+    const auto plugin = plugins.Find(filter.plugin);
+    if (plugin == nullptr) throw UnknownPluginError(filter.plugin);
+    made.push_back(plugin->MakeFilter(context, filter.data));
+    if (!made.back()) throw PluginDataError(filter.plugin, "the plugin made no filter of its data");
+  }
+  return made.empty() ? Lucene::FilterPtr() : newLucene<AllFilter>(std::move(made));
+}
+
+HitCollector::Deadline DeadlineOf(const SearchRequest& request) {
+  using Clock = std::chrono::steady_clock;
+  const auto now = Clock::now();
+  if (request.time_limit.count() <= 0) return std::nullopt;
+  // A limit past the end of the clock's time is none.
+  const auto most = std::chrono::duration_cast<std::chrono::milliseconds>(Clock::time_point::max() - now);
+  if (request.time_limit >= most) return std::nullopt;
+  return now + request.time_limit;
+}
+
+class SearchRun {
+ public:
+  SearchRun(const std::vector<SearchedIndex>& indexes, const SearchRequest& request,
+            const SearchPluginRegistry& plugins, const SearchLimits& limits)
+      : indexes_(indexes),
+        request_(request),
+        limits_(limits),
+        collector_(newLucene<HitCollector>(request.from + request.size, DeadlineOf(request))) {
+    for (const SearchedIndex& index : indexes_) {
+      queries_.push_back(BuildQuery(request.query, index.settings, limits));
+      filters_.push_back(MakeFilter(request, plugins, {index.settings, limits}));
+    }
+  }
+
+  SearchResult Run() {
+    Collect();
+    SearchResult result;
+    result.total = collector_->total();
+    result.max_score = collector_->max_score();
+    Describe(result);
+    LoadHits(result);
+    return result;
+  }
+
+ private:
+  void Collect() {
+    std::vector<Lucene::IndexReaderPtr> readers;
+    for (const SearchedIndex& index : indexes_) readers.push_back(index.snapshot->reader());
+    const auto statistics = std::make_shared<CommonStatistics>(std::move(readers));
+    const auto scale = newLucene<CommonScale>();
+    for (size_t i = 0; i < indexes_.size(); ++i) {
+      const SearchedIndex& index = indexes_[i];
+      collector_->SetIndex(i);
+      RunReading(index.path, index.snapshot->directory(), "cannot search", [&] {
+        const auto searcher = newLucene<CommonSearcher>(index.snapshot->reader(), statistics);
+        searcher->setSimilarity(scale);
+        SearchWith(*searcher, queries_[i].query->weight(searcher), filters_[i]);
+      });
+    }
+  }
+
+  void SearchWith(Lucene::IndexSearcher& searcher, const Lucene::WeightPtr& weight,
+                  const Lucene::FilterPtr& filter) const {
+    try {
+      searcher.search(weight, filter, collector_);
+    } catch (const Lucene::TimeExceededException&) {
+      throw SearchTimeoutError();
+    }
+  }
+
+  void Describe(SearchResult& result) const {
+    std::set<std::string> told;
+    const auto warn = [&](const std::string& warning) {
+      if (told.insert(warning).second) result.warnings.push_back(warning);
+    };
+    for (const UnderstoodQuery& query : queries_) {
+      if (result.query.empty()) result.query = Lucene::StringUtils::toUTF8(query.query->toString());
+      for (const std::string& warning : query.warnings) warn(warning);
+    }
+    if (!request_.load_fields.has_value()) return;
+    for (const std::string& name : *request_.load_fields) {
+      const bool is_stored = std::any_of(indexes_.begin(), indexes_.end(), [&](const SearchedIndex& index) {
+        return std::any_of(index.settings.fields.begin(), index.settings.fields.end(),
+                           [&](const FieldSettings& field) { return field.stored && field.name == name; });
+      });
+      if (!is_stored) warn("there is no stored field " + format::Quoted(name) + " to load");
+    }
+  }
+
+  void LoadHits(SearchResult& result) const {
+    const std::vector<FoundDocument> best = collector_->TakeBest();
+    std::vector<StoredFields> stored;
+    for (const SearchedIndex& index : indexes_) stored.emplace_back(index.settings, request_.load_fields);
+    size_t bytes = 0;
+    for (size_t i = request_.from; i < best.size(); ++i) {
+      const SearchedIndex& index = indexes_[best[i].index];
+      SearchHit hit{best[i].index, "", best[i].score, {}};
+      RunReading(index.path, index.snapshot->directory(), "cannot load a document", [&] {
+        bytes += stored[best[i].index].Load(*index.snapshot->reader(), best[i].document, hit);
+      });
+      if (bytes > limits_.result_bytes) {
+        throw LimitExceededError("result_bytes", limits_.result_bytes,
+                                 "the stored values of the hits take more than that in bytes");
+      }
+      result.hits.push_back(std::move(hit));
+    }
+  }
+
+  const std::vector<SearchedIndex>& indexes_;
+  const SearchRequest& request_;
+  const SearchLimits& limits_;
+  boost::shared_ptr<HitCollector> collector_;
+  std::vector<UnderstoodQuery> queries_;    // by index
+  std::vector<Lucene::FilterPtr> filters_;  // by index
+};
+
+}  // namespace
+
+SearchResult RunSearch(const std::vector<SearchedIndex>& indexes, const SearchRequest& request,
+                       const SearchPluginRegistry& plugins, const SearchLimits& limits) {
+  CheckRequest(request, limits);
+  return SearchRun(indexes, request, plugins, limits).Run();
+}
+
+SearchResult SearchIndexes(const std::vector<std::shared_ptr<Index>>& indexes, const SearchRequest& request,
+                           const SearchPluginRegistry& plugins, const SearchLimits& limits) {
+  CheckIndexCount(indexes.size(), limits);
+  std::vector<SearchedIndex> searched;
+  for (const std::shared_ptr<Index>& index : indexes) {
+    searched.push_back({index->path(), index->settings(), index->NewestSnapshot()});
+  }
+  return RunSearch(searched, request, plugins, limits);
+}
+
+}  // namespace vantrel::elastic

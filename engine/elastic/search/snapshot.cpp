@@ -1,0 +1,86 @@
+#include "elastic/search/snapshot.h"
+
+#include <cerrno>
+#include <ctime>
+#include <utility>
+
+#include "elastic/format/commit.h"
+#include "elastic/format/deletions.h"
+#include "elastic/format/folder.h"
+#include "elastic/format/segment_files.h"
+#include "elastic/search/library_failure.h"
+#include "vantrel/elastic/index_error.h"
+
+namespace vantrel::elastic {
+namespace {
+
+// Longer than the steps of any file system's clock.
+constexpr time_t kSettledSeconds = 3;
+
+// The newest commit's generation, when all of it has been decoded that is decoded at all. Of one that is known
+// already, just the commit itself.
+int64_t CheckNewestCommit(const std::string& folder_path, int64_t known_generation) {
+  const format::DiskFolder folder(folder_path);
+  int64_t generation = 0;
+  format::UseNewestCommit(folder, [&](format::Commit commit) {
+    generation = commit.generation;
+    if (generation == known_generation) return;
+    for (format::SegmentInfo& segment : commit.segments) {
+      const format::SegmentFiles files = format::OpenSegment(folder, std::move(segment));
+      if (files.deletions != nullptr) format::Deletions(files.deletions, files.info.document_count);
+    }
+  });
+  return generation;
+}
+
+}  // namespace
+
+Snapshot::Snapshot(boost::shared_ptr<DiskDirectory> directory, Lucene::IndexReaderPtr reader)
+    : directory_(std::move(directory)), reader_(std::move(reader)) {}
+
+Snapshot::~Snapshot() {
+  try {
+    reader_->close();
+  } catch (...) {
+    // Nothing was written: there is nothing to lose.
+  }
+}
+
+SnapshotKeeper::SnapshotKeeper(std::string folder) : folder_(std::move(folder)) {}
+
+std::shared_ptr<const Snapshot> SnapshotKeeper::Newest() {
+  const std::lock_guard lock(mutex_);
+  const FolderState state = Look();
+  const bool same_folder = state.device == state_.device && state.inode == state_.inode;
+  const bool unchanged = same_folder && state_.settled && state.changed.tv_sec == state_.changed.tv_sec &&
+                         state.changed.tv_nsec == state_.changed.tv_nsec;
+  if (snapshot_ != nullptr && unchanged) return snapshot_;
+  if (!same_folder) snapshot_.reset();
+  const int64_t generation = CheckNewestCommit(folder_, snapshot_ == nullptr ? 0 : generation_);
+  if (snapshot_ == nullptr || generation != generation_) Open(generation);
+  state_ = state;
+  return snapshot_;
+}
+
+SnapshotKeeper::FolderState SnapshotKeeper::Look() const {
+  struct stat status {};
+  if (stat(folder_.c_str(), &status) != 0) throw IndexIoError(folder_, "cannot examine index folder", errno);
+  const time_t age = time(nullptr) - status.st_mtim.tv_sec;
+  return {status.st_dev, status.st_ino, status.st_mtim, age >= kSettledSeconds};
+}
+
+void SnapshotKeeper::Open(int64_t generation) {
+  // An older commit than the one at hand is that of another index, put in its place.
+  const auto before = generation > generation_ ? snapshot_ : nullptr;
+  const auto directory = before == nullptr ? Lucene::newLucene<DiskDirectory>(folder_) : before->directory();
+  RunReading(folder_, directory, "cannot open the index for searching", [&] {
+    const Lucene::IndexReaderPtr reader =
+        before == nullptr ? Lucene::IndexReader::open(directory, true) : before->reader()->reopen(true);
+    if (before == nullptr || reader != before->reader()) {
+      snapshot_ = std::make_shared<const Snapshot>(directory, reader);
+    }
+  });
+  generation_ = generation;
+}
+
+}  // namespace vantrel::elastic

@@ -1,0 +1,19 @@
+#pragma once
+
+#include "commands/command.h"
+
+// The commands themselves, each beside what runs it.
+namespace quorelasticd {
+
+Command IndexCreateCommand();
+Command IndexListCommand();
+Command IndexDeleteCommand();
+Command DocumentBulkCommand();
+Command DocumentDeleteCommand();
+Command CommitCommand();
+Command OptimizeCommand();
+Command TermsCommand();
+Command StatusCommand();
+Command HelpCommand();
+
+}  // namespace quorelasticd

@@ -1,0 +1,40 @@
+#include "commands/document_json.h"
+
+#include <string>
+
+#include "base/text.h"
+#include "errors/request_error.h"
+
+namespace quorelasticd {
+namespace {
+
+[[noreturn]] void Refuse(const std::string& problem) { throw RequestError(ErrorCode::kBadRequest, problem); }
+
+[[noreturn]] void RefuseValue(const std::string& field) {
+  Refuse("field " + Quoted(field) + ": expected a string or an array of strings");
+}
+
+}  // namespace
+
+vantrel::elastic::Document ToDocument(const Json::Value& json, const std::string& id_field) {
+  if (!json.isObject()) Refuse("a document is an object of fields");
+  vantrel::elastic::Document document;
+  size_t ids = 0;
+  const auto add = [&](const std::string& field, const Json::Value& value) {
+    if (!value.isString()) RefuseValue(field);
+    document.fields.push_back({field, value.asString()});
+    if (field == id_field && !document.fields.back().value.empty()) ++ids;
+  };
+  for (auto member = json.begin(); member != json.end(); ++member) {
+    const std::string field = member.name();
+    if (!member->isArray()) {
+      add(field, *member);
+    } else {
+      for (const Json::Value& value : *member) add(field, value);
+    }
+  }
+  if (ids != 1) Refuse("field " + Quoted(id_field) + ": expected exactly one value, not empty");
+  return document;
+}
+
+}  // namespace quorelasticd

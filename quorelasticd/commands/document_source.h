@@ -1,0 +1,44 @@
+#pragma once
+
+#include <json/value.h>
+
+#include <cstdint>
+#include <memory>
+#include <optional>
+#include <string>
+
+#include "commands/document_json.h"
+
+namespace quorelasticd {
+
+// Where the documents of a bulk come from, one after the other.
+class DocumentSource {
+ public:
+  struct Item {
+    uint64_t position = 0;  // from 1: of the element, or of the line
+    Json::Value json;       // null where there is a problem
+    std::string problem;    // why there is no JSON value; empty where there is one
+
+    // Throws RequestError (bad_request).
+    vantrel::elastic::Document ToDocument(const std::string& id_field) const;
+  };
+
+  DocumentSource() = default;
+  DocumentSource(const DocumentSource&) = delete;
+  DocumentSource& operator=(const DocumentSource&) = delete;
+  virtual ~DocumentSource() = default;
+
+  // Nothing at the end. Throws std::system_error where it cannot be read.
+  virtual std::optional<Item> Next() = 0;
+
+  // Adds how far it has come, and how far it goes.
+  virtual void DescribeProgress(Json::Value& progress) const = 0;
+};
+
+// The elements of an array.
+std::unique_ptr<DocumentSource> InlineDocuments(Json::Value documents);
+
+// The lines of a file below `folder`, blank ones passed over. Throws like ImportFile.
+std::unique_ptr<DocumentSource> ImportedDocuments(const std::string& folder, const std::string& name);
+
+}  // namespace quorelasticd

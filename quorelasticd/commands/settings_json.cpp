@@ -1,0 +1,120 @@
+#include "commands/settings_json.h"
+
+#include <algorithm>
+#include <array>
+#include <string>
+#include <vector>
+
+#include "base/limits.h"
+#include "base/text.h"
+#include "errors/request_error.h"
+
+namespace quorelasticd {
+namespace {
+
+using vantrel::elastic::FieldSettings;
+using vantrel::elastic::FieldType;
+using vantrel::elastic::IndexSettings;
+using vantrel::elastic::TermVector;
+
+constexpr const char* kDefaultIdField = "id";
+
+template <typename T>
+struct Word {
+  T value;
+  const char* word;
+};
+
+constexpr std::array kTypes = {Word<FieldType>{FieldType::kText, "text"},
+                               Word<FieldType>{FieldType::kKeyword, "keyword"}};
+
+constexpr std::array kTermVectors = {
+    Word<TermVector>{TermVector::kNone, "none"}, Word<TermVector>{TermVector::kTerms, "terms"},
+    Word<TermVector>{TermVector::kPositions, "positions"}, Word<TermVector>{TermVector::kOffsets, "offsets"},
+    Word<TermVector>{TermVector::kPositionsAndOffsets, "positions_offsets"}};
+
+template <typename Table>
+Shape ChoiceOf(const Table& table) {
+  std::vector<std::string> words;
+  for (const auto& entry : table) words.emplace_back(entry.word);
+  return Choice(std::move(words));
+}
+
+template <typename Table>
+auto FromWord(const Table& table, const std::string& word) {
+  return std::find_if(table.begin(), table.end(), [&](const auto& entry) { return entry.word == word; })
+      ->value;
+}
+
+template <typename Table, typename T>
+const char* ToWord(const Table& table, T value) {
+  return std::find_if(table.begin(), table.end(), [&](const auto& entry) { return entry.value == value; })
+      ->word;
+}
+
+FieldSettings ToField(const Json::Value& json) {
+  FieldSettings field;
+  field.name = json["name"].asString();
+  field.type = FromWord(kTypes, json["type"].asString());
+  field.stored = json.get("stored", field.stored).asBool();
+  field.term_vector = FromWord(kTermVectors, json.get("term_vector", "none").asString());
+  field.norms = json.get("norms", field.norms).asBool();
+  field.frequencies = json.get("frequencies", field.frequencies).asBool();
+  return field;
+}
+
+void SettleIdField(IndexSettings& settings) {
+  const auto found = std::find_if(settings.fields.begin(), settings.fields.end(),
+                                  [&](const FieldSettings& field) { return field.name == kDefaultIdField; });
+  if (found == settings.fields.end()) {
+    settings.fields.insert(
+        settings.fields.begin(),
+        {.name = kDefaultIdField, .type = FieldType::kKeyword, .norms = false, .frequencies = false});
+  } else if (found->type != FieldType::kKeyword || !found->stored) {
+    throw RequestError(ErrorCode::kBadRequest,
+                       "data.settings.fields: expected the field \"id\" to be a stored keyword");
+  }
+}
+
+}  // namespace
+
+Shape SettingsShape() {
+  const Shape field = Object({
+      {"name", true, String(kLongestFieldName), "The field's name."},
+      {"type", true, ChoiceOf(kTypes),
+       "A text is cut into words, lower-cased, each of them a term; a keyword is one term as it is."},
+      {"stored", false, Boolean(), "Whether a search can hand back the values; true by default."},
+      {"term_vector", false, ChoiceOf(kTermVectors),
+       "What is kept about the terms of each single document; none by default."},
+      {"norms", false, Boolean(), "Whether short values score higher; true by default."},
+      {"frequencies", false, Boolean(),
+       "Whether it is kept how often and where a term stands, which phrases need; true by default."},
+  });
+  return Object({
+      {"fields", true, ArrayOf(field, kMostFields), "The fields that documents may have."},
+  });
+}
+
+IndexSettings ToSettings(const Json::Value& json) {
+  IndexSettings settings;
+  for (const Json::Value& field : json["fields"]) settings.fields.push_back(ToField(field));
+  SettleIdField(settings);
+  return settings;
+}
+
+Json::Value ToJson(const IndexSettings& settings) {
+  Json::Value json(Json::objectValue);
+  json["fields"] = Json::arrayValue;
+  for (const FieldSettings& field : settings.fields) {
+    Json::Value& object = json["fields"].append(Json::objectValue);
+    object["name"] = field.name;
+    object["type"] = ToWord(kTypes, field.type);
+    object["stored"] = field.stored;
+    object["term_vector"] = ToWord(kTermVectors, field.term_vector);
+    object["norms"] = field.norms;
+    object["frequencies"] = field.frequencies;
+  }
+  return json;
+}
+
+}  // namespace quorelasticd

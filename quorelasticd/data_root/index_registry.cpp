@@ -1,0 +1,126 @@
+#include "data_root/index_registry.h"
+
+#include <spdlog/spdlog.h>
+
+#include <boost/asio/strand.hpp>
+#include <filesystem>
+#include <stdexcept>
+#include <system_error>
+#include <utility>
+
+#include "base/limits.h"
+#include "base/text.h"
+#include "data_root/index_name.h"
+#include "errors/request_error.h"
+#include "vantrel/elastic/index_files.h"
+
+namespace quorelasticd {
+namespace {
+
+RequestError NotFound(const std::string& name) {
+  return RequestError(ErrorCode::kIndexNotFound, "there is no index " + Quoted(name));
+}
+
+}  // namespace
+
+class IndexRegistry::Reservation {
+ public:
+  // The registry's mutex is held.
+  Reservation(IndexRegistry& registry, const std::string& name) : registry_(registry), name_(name) {
+    registry_.reserved_.insert(name_);
+  }
+  Reservation(const Reservation&) = delete;
+  Reservation& operator=(const Reservation&) = delete;
+  ~Reservation() {
+    const std::lock_guard lock(registry_.mutex_);
+    registry_.reserved_.erase(name_);
+  }
+
+ private:
+  IndexRegistry& registry_;
+  std::string name_;
+};
+
+IndexRegistry::IndexRegistry(const DataRoot& root, boost::asio::any_io_executor slow_executor)
+    : root_(root), slow_executor_(std::move(slow_executor)) {}
+
+std::shared_ptr<OpenIndex> IndexRegistry::Use(const std::string& name) {
+  const std::lock_guard lock(mutex_);
+  if (const auto found = open_.find(name); found != open_.end()) return found->second;
+  // A name that none can bear is no path either.
+  if (!IsIndexName(name) || reserved_.contains(name) || !root_.HasIndex(name)) throw NotFound(name);
+  auto index = vantrel::elastic::Index::Open(root_.IndexPath(name));
+  const auto open =
+      std::make_shared<OpenIndex>(name, std::move(index), boost::asio::make_strand(slow_executor_));
+  open_.emplace(name, open);
+  return open;
+}
+
+void IndexRegistry::Create(const std::string& name, const vantrel::elastic::IndexSettings& settings) {
+  if (!IsIndexName(name)) throw std::invalid_argument("no name of an index: " + name);
+  std::unique_ptr<Reservation> reservation;
+  {
+    const std::lock_guard lock(mutex_);
+    if (reserved_.contains(name) || root_.HasIndex(name)) {
+      throw RequestError(ErrorCode::kIndexExists, "there is an index " + Quoted(name) + " already");
+    }
+    if (root_.ListIndexes().size() + reserved_.size() >= kMostIndexes) {
+      throw LimitExceeded("indexes", kMostIndexes, "in the data folder");
+    }
+    reservation = std::make_unique<Reservation>(*this, name);
+  }
+  vantrel::elastic::Index::Create(root_.HiddenPath(name), settings);
+  root_.ShowIndex(name);
+  spdlog::info("index {} created", name);
+}
+
+void IndexRegistry::Delete(const std::string& name) {
+  std::unique_ptr<Reservation> reservation;
+  std::shared_ptr<OpenIndex> closing;
+  {
+    const std::lock_guard lock(mutex_);
+    if (!IsIndexName(name) || reserved_.contains(name) || !root_.HasIndex(name)) throw NotFound(name);
+    if (const auto found = open_.find(name); found != open_.end()) {
+      if (found->second.use_count() > 1) {
+        throw RequestError(ErrorCode::kLocked,
+                           "index " + Quoted(name) + " is in use by requests still running");
+      }
+      closing = std::move(found->second);
+      open_.erase(found);
+    }
+    reservation = std::make_unique<Reservation>(*this, name);
+  }
+  closing.reset();  // which lets go of its write lock
+  const std::string lock_path = root_.IndexPath(name) + "/" + vantrel::elastic::kIndexLockFileName;
+  const std::optional<FileLock> nobody_writes = FileLock::TryLock(lock_path);
+  if (!nobody_writes.has_value()) {
+    throw RequestError(ErrorCode::kLocked,
+                       "index " + Quoted(name) + " is open for writing elsewhere");
+  }
+  const std::string hidden = root_.HideIndex(name);
+  spdlog::info("index {} deleted", name);
+  std::error_code error;  // the index is gone; files that stay behind are removed at the next start
+  std::filesystem::remove_all(hidden, error);
+  if (error) spdlog::warn("{}: cannot be removed wholly: {}", hidden, error.message());
+}
+
+size_t IndexRegistry::open_count() const {
+  const std::lock_guard lock(mutex_);
+  return open_.size();
+}
+
+bool IndexRegistry::CommitAll() {
+  const std::lock_guard lock(mutex_);
+  bool is_done = true;
+  for (const auto& [name, open] : open_) {
+    try {
+      Changes(open).Commit();
+    } catch (...) {
+      is_done = false;
+      spdlog::error("index {}: cannot commit: {}", name, ToRequestError().reason());
+    }
+  }
+  return is_done;
+}
+
+}  // namespace quorelasticd

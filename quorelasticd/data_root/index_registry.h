@@ -1,0 +1,53 @@
+#pragma once
+
+#include <boost/asio/any_io_executor.hpp>
+#include <map>
+#include <memory>
+#include <mutex>
+#include <set>
+#include <string>
+
+#include "data_root/data_root.h"
+#include "data_root/open_index.h"
+#include "vantrel/elastic/index_settings.h"
+
+namespace quorelasticd {
+
+// The indexes of a data root that are open: each is opened when it is first used, and once. For any thread.
+// Throws RequestError, what the engine throws, and std::system_error.
+class IndexRegistry {
+ public:
+  // `slow_executor` runs what takes long. `root` must outlive the registry.
+  IndexRegistry(const DataRoot& root, boost::asio::any_io_executor slow_executor);
+  IndexRegistry(const IndexRegistry&) = delete;
+  IndexRegistry& operator=(const IndexRegistry&) = delete;
+
+  const DataRoot& root() const { return root_; }
+  const boost::asio::any_io_executor& slow_executor() const { return slow_executor_; }
+
+  // The index of this name. It is not deleted as long as the result is held.
+  std::shared_ptr<OpenIndex> Use(const std::string& name);
+
+  // Makes an empty index, durably. The name must satisfy IsIndexName().
+  void Create(const std::string& name, const vantrel::elastic::IndexSettings& settings);
+
+  // Removes an index and all its files. Refused (locked) while anybody uses it, or writes to it.
+  void Delete(const std::string& name);
+
+  size_t open_count() const;
+
+  // Commits every open index; false, and log lines, where that failed. To be called when nothing else runs.
+  bool CommitAll();
+
+ private:
+  // Keeps a name from everybody else while its index is made or removed.
+  class Reservation;
+
+  const DataRoot& root_;
+  boost::asio::any_io_executor slow_executor_;
+  mutable std::mutex mutex_;
+  std::map<std::string, std::shared_ptr<OpenIndex>> open_;
+  std::set<std::string> reserved_;
+};
+
+}  // namespace quorelasticd

@@ -1,0 +1,91 @@
+// quorelasticd: serves the full-text indexes of one data folder on a Unix domain socket.
+
+#include <spdlog/spdlog.h>
+#include <sys/stat.h>
+#include <systemd/sd-daemon.h>
+
+#include <boost/asio/thread_pool.hpp>
+#include <csignal>
+#include <exception>
+#include <iostream>
+#include <optional>
+#include <string>
+
+#include "commands/command_service.h"
+#include "commands/daemon.h"
+#include "data_root/data_root.h"
+#include "data_root/index_registry.h"
+#include "logging.h"
+#include "options.h"
+#include "server/listener.h"
+#include "server/server.h"
+#include "vantrel/elastic/library_setup.h"
+#include "version.h"
+
+namespace {
+
+using namespace quorelasticd;
+
+constexpr int kFailure = 1;
+constexpr int kBadCommandLine = 2;
+
+ServerLimits LimitsOf(const Options& options) {
+  ServerLimits limits;
+  limits.threads = static_cast<size_t>(options.threads);
+  limits.connections = static_cast<size_t>(options.max_connections);
+  limits.timeouts.idle = std::chrono::seconds(options.idle_timeout);
+  limits.timeouts.stalled = std::chrono::seconds(options.stall_timeout);
+  limits.shutdown = std::chrono::seconds(options.shutdown_timeout);
+  return limits;
+}
+
+void TellReady(const std::string& socket) {
+  spdlog::info("quorelasticd {} serves on {}", kVersion, socket);
+  sd_notifyf(0, "READY=1\nSTATUS=Serving on %s", socket.c_str());
+}
+
+void TellStopping() { sd_notify(0, "STOPPING=1\nSTATUS=Finishing what is running"); }
+
+int Serve(const Options& options) {
+  const DataRoot root(options.data);
+  Listener listener(options.socket);
+  boost::asio::thread_pool slow_threads(static_cast<size_t>(options.threads));
+  IndexRegistry registry(root, slow_threads.get_executor());
+  Statistics statistics;
+  const Daemon daemon(registry, statistics);
+  CommandService service(daemon);
+  Server server(listener.Release(), service, LimitsOf(options), statistics.connections);
+  TellReady(options.socket);
+  server.Run(TellStopping);
+  slow_threads.join();
+  const bool is_committed = registry.CommitAll();
+  spdlog::info("ended");
+  return is_committed ? 0 : kFailure;
+}
+
+}  // namespace
+
+int main(int argc, char** argv) {
+  std::optional<Options> options;
+  try {
+    std::string text;
+    options = ParseOptions(argc, argv, text);
+    if (!options.has_value()) {
+      std::cout << text << std::flush;
+      return std::cout.good() ? 0 : kFailure;
+    }
+  } catch (const OptionError& error) {
+    std::cerr << "quorelasticd: " << error.what() << std::endl;
+    return kBadCommandLine;
+  }
+  try {
+    StartLogging(options->log_level);
+    std::signal(SIGPIPE, SIG_IGN);
+    umask(S_IWGRP | S_IRWXO);
+    vantrel::elastic::PrepareIndexLibrary();
+    return Serve(*options);
+  } catch (const std::exception& error) {
+    spdlog::critical("{}", error.what());
+    return kFailure;
+  }
+}

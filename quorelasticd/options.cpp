@@ -1,0 +1,106 @@
+#include "options.h"
+
+#include <algorithm>
+#include <array>
+#include <boost/program_options/options_description.hpp>
+#include <boost/program_options/parsers.hpp>
+#include <boost/program_options/positional_options.hpp>
+#include <boost/program_options/value_semantic.hpp>
+#include <boost/program_options/variables_map.hpp>
+#include <sstream>
+
+#include "base/text.h"
+#include "version.h"
+
+namespace quorelasticd {
+namespace {
+
+namespace po = boost::program_options;
+
+constexpr std::array kLogLevels = {"debug", "info", "warning", "error"};
+
+po::typed_value<std::string>* Text(std::string& value, const char* name) {
+  auto* option = po::value<std::string>(&value)->value_name(name);
+  return value.empty() ? option : option->default_value(value);
+}
+
+po::typed_value<int64_t>* Number(int64_t& value, const char* name) {
+  return po::value<int64_t>(&value)->value_name(name)->default_value(value);
+}
+
+po::options_description Describe(Options& options) {
+  constexpr unsigned kLineLength = 100;
+  po::options_description description("Options", kLineLength);
+  description.add_options()                                                                               //
+      ("socket", Text(options.socket, "PATH"), "the socket that clients connect to")                      //
+      ("data", Text(options.data, "FOLDER"), "the folder that holds the indexes")                         //
+      ("threads", Number(options.threads, "N"), "threads for quick requests, and as many for slow ones")  //
+      ("max-connections", Number(options.max_connections, "N"), "clients connected at a time")            //
+      ("idle-timeout", Number(options.idle_timeout, "SECONDS"),
+       "hang up on a client that asks for nothing")  //
+      ("stall-timeout", Number(options.stall_timeout, "SECONDS"),
+       "hang up on a client that stops within a message")  //
+      ("shutdown-timeout", Number(options.shutdown_timeout, "SECONDS"),
+       "cut off requests that run on when the daemon is to end")                                      //
+      ("log-level", Text(options.log_level, "LEVEL"), "log debug, info, warning or error and above")  //
+      ("help", "print this text")                                                                     //
+      ("version", "print the version");
+  return description;
+}
+
+void CheckRange(const char* name, int64_t value, int64_t least, int64_t most) {
+  if (value >= least && value <= most) return;
+  throw OptionError(std::string("--") + name + ": expected a number from " + std::to_string(least) + " to " +
+                    std::to_string(most) + ", found " + std::to_string(value));
+}
+
+void Check(const Options& options) {
+  constexpr int64_t kDay = 24 * 60 * 60;
+  CheckRange("threads", options.threads, 1, 256);
+  CheckRange("max-connections", options.max_connections, 1, 100000);
+  CheckRange("idle-timeout", options.idle_timeout, 1, kDay);
+  CheckRange("stall-timeout", options.stall_timeout, 1, kDay);
+  CheckRange("shutdown-timeout", options.shutdown_timeout, 1, kDay);
+  if (std::find(kLogLevels.begin(), kLogLevels.end(), options.log_level) == kLogLevels.end()) {
+    throw OptionError("--log-level: expected debug, info, warning or error, found " +
+                      Quoted(options.log_level));
+  }
+  if (options.socket.empty()) throw OptionError("--socket: expected a path, found none");
+  if (options.data.empty()) throw OptionError("--data: expected a folder, found none");
+}
+
+}  // namespace
+
+std::optional<Options> ParseOptions(int argc, const char* const* argv, std::string& text) {
+  Options options;
+  const po::options_description description = Describe(options);
+  try {
+    po::variables_map chosen;
+    // An abbreviation that works today could mean another option tomorrow.
+    constexpr int kStyle = po::command_line_style::allow_long | po::command_line_style::long_allow_next |
+                           po::command_line_style::long_allow_adjacent;
+    po::store(po::command_line_parser(argc, argv)
+                  .options(description)
+                  .positional(po::positional_options_description())
+                  .style(kStyle)
+                  .run(),
+              chosen);
+    if (chosen.count("help") > 0 || chosen.count("version") > 0) {
+      std::ostringstream out;
+      out << "quorelasticd " << kVersion << "\n";
+      if (chosen.count("help") > 0)
+        out << "Serves full-text indexes on a Unix domain socket.\n\n" << description;
+      text = out.str();
+      return std::nullopt;
+    }
+    po::notify(chosen);
+  } catch (const po::too_many_positional_options_error&) {
+    throw OptionError("expected options only, found something else");
+  } catch (const po::error& error) {
+    throw OptionError(ToOneLine(error.what()));
+  }
+  Check(options);
+  return options;
+}
+
+}  // namespace quorelasticd

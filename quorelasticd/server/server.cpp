@@ -1,0 +1,137 @@
+#include "server/server.h"
+
+#include <spdlog/spdlog.h>
+
+#include <algorithm>
+#include <boost/asio/post.hpp>
+#include <boost/asio/strand.hpp>
+#include <csignal>
+#include <exception>
+#include <thread>
+#include <utility>
+
+namespace quorelasticd {
+namespace {
+
+namespace asio = boost::asio;
+using boost::system::error_code;
+
+// Clients beyond the limit that are told so at the same time; the rest is hung up on.
+constexpr size_t kMostRefusals = 64;
+
+constexpr auto kPauseAfterFailure = std::chrono::milliseconds(100);
+
+}  // namespace
+
+Server::Server(int listener, Service& service, const ServerLimits& limits,
+               std::atomic<size_t>& connection_count)
+    : limits_(limits),
+      service_(service),
+      connection_count_(connection_count),
+      io_(static_cast<int>(limits.threads)),
+      strand_(asio::make_strand(io_)),
+      acceptor_(strand_, asio::local::stream_protocol(), listener),
+      signals_(strand_, SIGTERM, SIGINT),
+      pause_(strand_),
+      deadline_(strand_) {}
+
+Server::~Server() = default;
+
+void Server::Run(const std::function<void()>& on_stop) {
+  on_stop_ = on_stop;
+  signals_.async_wait([this](error_code error, int signal) {
+    if (error) return;
+    spdlog::info("signal {}: finishing what is running", signal);
+    BeginStop();
+  });
+  asio::post(strand_, [this] { Accept(); });
+  std::vector<std::thread> threads;
+  for (size_t i = 1; i < limits_.threads; ++i) threads.emplace_back([this] { RunThread(); });
+  RunThread();
+  for (std::thread& thread : threads) thread.join();
+}
+
+// A handler that throws, for want of memory, drops its connection; the others go on.
+void Server::RunThread() {
+  for (;;) {
+    try {
+      io_.run();
+      return;
+    } catch (const std::exception& error) {
+      spdlog::error("a connection is dropped: {}", error.what());
+    }
+  }
+}
+
+void Server::Stop() {
+  asio::post(strand_, [this] { BeginStop(); });
+}
+
+void Server::Accept() {
+  if (stopping_) return;
+  acceptor_.async_accept(asio::make_strand(io_), [this](error_code error, Connection::Socket socket) {
+    if (stopping_) return;
+    if (!error) {
+      try {
+        Admit(std::move(socket));
+      } catch (const std::exception& failure) {
+        spdlog::error("a client is dropped: {}", failure.what());
+      }
+      return Accept();
+    }
+    if (error == asio::error::connection_aborted) return Accept();
+    // Descriptors or memory have run out: trying again at once would only burn the processor.
+    spdlog::warn("cannot accept a client: {}", error.message());
+    pause_.expires_after(kPauseAfterFailure);
+    pause_.async_wait([this](error_code) { Accept(); });
+  });
+}
+
+void Server::Admit(Connection::Socket socket) {
+  // The count goes down when the last owner, a pending operation of the connection, lets go.
+  const auto release = [this](Connection* connection) {
+    delete connection;
+    --connection_count_;
+    asio::post(strand_, [this] { CancelDeadlineIfIdle(); });
+  };
+  const bool is_full = connection_count_ >= limits_.connections;
+  if (connection_count_ >= limits_.connections + kMostRefusals) return;
+  ++connection_count_;
+  const std::shared_ptr<Connection> connection(new Connection(std::move(socket), service_, limits_.timeouts),
+                                               release);
+  std::erase_if(connections_, [](const std::weak_ptr<Connection>& gone) { return gone.expired(); });
+  connections_.push_back(connection);
+  is_full ? connection->Refuse(service_.RefuseTooManyConnections(limits_.connections)) : connection->Start();
+}
+
+std::vector<std::shared_ptr<Connection>> Server::LiveConnections() {
+  std::vector<std::shared_ptr<Connection>> live;
+  for (const std::weak_ptr<Connection>& weak : connections_) {
+    if (std::shared_ptr<Connection> connection = weak.lock()) live.push_back(std::move(connection));
+  }
+  return live;
+}
+
+void Server::BeginStop() {
+  if (stopping_) return;
+  stopping_ = true;
+  on_stop_();
+  error_code ignored;
+  acceptor_.close(ignored);
+  signals_.clear(ignored);  // a second signal ends the process at once
+  pause_.cancel();
+  for (const auto& connection : LiveConnections()) connection->Finish();
+  deadline_.expires_after(limits_.shutdown);
+  deadline_.async_wait([this](error_code error) {
+    if (error) return;
+    spdlog::warn("{} clients are not done in time and are cut off", connection_count_.load());
+    for (const auto& connection : LiveConnections()) connection->Abort();
+  });
+  CancelDeadlineIfIdle();
+}
+
+void Server::CancelDeadlineIfIdle() {
+  if (stopping_ && connection_count_ == 0) deadline_.cancel();
+}
+
+}  // namespace quorelasticd

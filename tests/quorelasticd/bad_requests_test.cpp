@@ -1,0 +1,162 @@
+// What is malformed, refused or damaged, as a client sees it: always one final reply with a code, and a connection
+// that goes on where the framing is whole.
+
+#include <gmock/gmock.h>
+#include <sys/resource.h>
+#include <sys/socket.h>
+
+#include <filesystem>
+#include <fstream>
+#include <string>
+#include <vector>
+
+#include "data_root/file_lock.h"
+#include "quordaemon/wire.h"
+#include "sanitized.h"
+#include "served_index.h"
+#include "support/files.h"
+
+namespace quorelastic::testing {
+namespace {
+
+namespace fs = std::filesystem;
+
+class BadRequestsTest : public ServedIndex {};
+
+TEST_F(BadRequestsTest, EveryMalformedRequestGetsOneReplyAndTheConnectionGoesOn) {
+  DaemonClient client = Connect();
+  const std::string deep(100000, '[');
+  const struct {
+    std::string request;
+    std::string code;
+  } cases[] = {
+      {"", "bad_request"},
+      {std::string(1, '\0'), "bad_request"},
+      {"\xff\xfe", "bad_request"},
+      {"{", "bad_request"},
+      {"[]", "bad_request"},
+      {"null", "bad_request"},
+      {"\"status\"", "bad_request"},
+      {"{}", "bad_request"},
+      {R"({"command":null})", "bad_request"},
+      {R"({"command":["status"]})", "bad_request"},
+      {R"({"command":"status","data":[]})", "bad_request"},
+      {R"({"command":"status","data":{"x":1}})", "bad_request"},
+      {R"({"command":"status","extra":1})", "bad_request"},
+      {R"({"command":"status","request_id":{}})", "bad_request"},
+      {R"({"command":""})", "unknown_command"},
+      {R"({"command":"Status"})", "unknown_command"},
+      {R"({"command":"status\u0000"})", "unknown_command"},
+      {R"({"command":"commit","data":{"id":"../books"}})", "index_not_found"},
+      {R"({"command":"commit","data":{"id":"books\u0000"}})", "index_not_found"},
+      {R"({"command":"commit","data":{"id":"\udc00"}})", "bad_request"},
+      {deep, "limit_exceeded"},
+      {R"({"command":)" + deep, "limit_exceeded"},
+  };
+  for (const auto& [request, code] : cases) {
+    const auto replies = client.Exchange(request);
+    ASSERT_EQ(replies.size(), 1u) << request.substr(0, 80);
+    const JsonValue& reply = replies.front();
+    EXPECT_FALSE(reply["success"].asBool());
+    EXPECT_EQ(reply["error"]["code"].asString(), code) << request.substr(0, 80) << reply.toString();
+    EXPECT_NE(reply["error"]["reason"].asString(), "");
+    EXPECT_TRUE(reply["took_ms"].isUInt64());
+  }
+  EXPECT_EQ(client.AskForError(R"({"command":"status"})"), "");
+}
+
+TEST_F(BadRequestsTest, AnAnnouncementOfTooLongAMessageEndsTheConnection) {
+  for (const std::string& header : {std::string("\x04\x00\x00\x01", 4), std::string("\xff\xff\xff\xff")}) {
+    DaemonClient client = Connect();
+    ASSERT_EQ(send(client.descriptor(), header.data(), header.size(), MSG_NOSIGNAL), 4);
+    const JsonValue reply = client.Receive();
+    EXPECT_EQ(reply["error"]["code"].asString(), "limit_exceeded");
+    EXPECT_EQ(reply["error"]["limit"].asString(), "message length");
+    EXPECT_TRUE(client.IsHungUp());
+  }
+}
+
+TEST_F(BadRequestsTest, TheLongestMessageIsRead) {
+  DaemonClient client = Connect();
+  std::string request = R"({"command":"status","x":")";
+  request += std::string(quordaemon::kLongestMessage - request.size() - 2, 'x') + "\"}";
+  ASSERT_EQ(request.size(), quordaemon::kLongestMessage);
+  EXPECT_EQ(client.AskForError(request), "bad_request");
+}
+
+TEST_F(BadRequestsTest, AnIndexThatAnotherProcessWritesToIsLocked) {
+  DaemonClient client = Connect();
+  const auto lock = quorelasticd::FileLock::TryLock(daemon_.data() + "/books/quorelastic.lock");
+  ASSERT_TRUE(lock.has_value());
+  EXPECT_EQ(
+      client.AskForError(R"({"command":"document_bulk","data":{"id":"books","documents":[{"id":"1"}]}})"),
+      "locked");
+  EXPECT_EQ(client.AskForError(R"({"command":"index_delete","data":{"id":"books","confirm":"books"}})"),
+            "locked");
+  EXPECT_EQ(CountBooks(client), 0);
+}
+
+TEST_F(BadRequestsTest, AnIndexInUseIsNotDeleted) {
+  DaemonClient client = Connect();
+  const std::string words = ManyWords(50000);
+  ASSERT_EQ(client.AskForError(
+                R"({"command":"document_bulk","data":{"id":"books","documents":[{"id":"1","title":")" +
+                words + "\"}]}}"),
+            "");
+  DaemonClient reader = Connect();  // and its replies fill the socket before they end
+  ASSERT_TRUE(reader.Send(R"({"command":"terms","data":{"id":"books","max":1000000}})"));
+  reader.Receive();
+  EXPECT_EQ(client.AskForError(R"({"command":"index_delete","data":{"id":"books","confirm":"books"}})"),
+            "locked");
+  while (!reader.Receive().isMember("success")) continue;
+  EXPECT_EQ(client.AskForError(R"({"command":"index_delete","data":{"id":"books","confirm":"books"}})"), "");
+}
+
+TEST_F(BadRequestsTest, DamageIsCorruptAndNamesTheFile) {
+  const std::string books = daemon_.data() + "/books";
+  const std::string segments = FindFile(books, "_1");
+  WriteFile(books + "/" + segments, "garbage");
+  DaemonClient client = Connect();
+  const JsonValue reply = client.Ask(R"({"command":"index_list","data":{"id":"books"}})");
+  EXPECT_EQ(reply["error"]["code"].asString(), "corrupt");
+  EXPECT_NE(reply["error"]["reason"].asString().find(segments), std::string::npos) << reply.toString();
+}
+
+TEST_F(BadRequestsTest, AFileThatCannotBeReadIsAnIoError) {
+  fs::remove(daemon_.data() + "/books/quorelastic.json");
+  DaemonClient client = Connect();
+  EXPECT_EQ(client.AskForError(R"({"command":"commit","data":{"id":"books"}})"), "io_error");
+}
+
+// The address space that a process takes, in bytes.
+rlim_t AddressSpace(pid_t pid) {
+  std::ifstream file("/proc/" + std::to_string(pid) + "/statm");
+  rlim_t pages = 0;
+  file >> pages;
+  return pages * 4096;
+}
+
+TEST_F(BadRequestsTest, RunningOutOfMemoryFailsTheRequestAndNotTheDaemon) {
+  if (kIsSanitized) GTEST_SKIP() << "a sanitizer ends the process when memory runs out";
+  DaemonClient client = Connect();
+  ASSERT_EQ(client.AskForError(R"({"command":"status"})"), "");
+  const rlim_t most = AddressSpace(daemon_.pid()) + (rlim_t{512} << 20);
+  const rlimit limit{most, most};
+  ASSERT_EQ(prlimit(daemon_.pid(), RLIMIT_AS, &limit, nullptr), 0);
+  std::string request = R"({"command":"status","data":[[])";
+  while (request.size() < (size_t{60} << 20)) request += ",[]";
+  EXPECT_EQ(client.AskForError(request + "]}"), "internal");
+  EXPECT_EQ(client.AskForError(R"({"command":"status"})"), "");
+}
+
+TEST_F(BadRequestsTest, NoMoreIndexesThanTheLimit) {
+  for (int i = 0; i < 999; ++i) fs::create_directory(daemon_.data() + "/x" + std::to_string(i));
+  DaemonClient client = Connect();
+  const JsonValue reply =
+      client.Ask(R"({"command":"index_create","data":{"id":"y","settings":{"fields":[]}}})");
+  EXPECT_EQ(reply["error"]["code"].asString(), "limit_exceeded") << reply.toString();
+  EXPECT_EQ(reply["error"]["most"].asInt(), 1000);
+}
+
+}  // namespace
+}  // namespace quorelastic::testing

@@ -1,0 +1,93 @@
+// docs/protocol.md says of commands, errors and limits what the daemon's own tables say.
+
+#include <gmock/gmock.h>
+#include <gtest/gtest.h>
+
+#include <string>
+#include <vector>
+
+#include "base/limits.h"
+#include "commands/command_table.h"
+#include "errors/error_code.h"
+#include "options.h"
+#include "protocol_document.h"
+#include "quordaemon/wire.h"
+
+namespace quorelasticd {
+namespace {
+
+using quorelastic::testing::ProtocolDocument;
+using quorelastic::testing::ReadProtocolDocument;
+using Row = std::vector<std::string>;
+
+std::string Code(const std::string& text) { return "`" + text + "`"; }
+
+void AddRows(const Shape& shape, const std::string& prefix, std::vector<Row>& rows) {
+  for (const Member& member : shape.members) {
+    const std::string name = prefix + member.name;
+    rows.push_back({Code(name), Describe(member.shape), member.is_required ? "yes" : "no", member.meaning});
+    if (member.shape.kind == Shape::Kind::kArray) AddRows(member.shape.of.front(), name + "[].", rows);
+    AddRows(member.shape, name + ".", rows);
+  }
+}
+
+class ProtocolTables : public ::testing::Test {
+ protected:
+  const ProtocolDocument document_ = ReadProtocolDocument();
+};
+
+TEST_F(ProtocolTables, EveryCommandIsDocumentedAsItIs) {
+  for (const Command& command : CommandTable()) {
+    const auto section = document_.sections.find(Code(command.name));
+    ASSERT_NE(section, document_.sections.end()) << command.name;
+    EXPECT_EQ(section->second.paragraph, std::vector<std::string>{command.summary});
+    std::vector<Row> rows;
+    AddRows(command.data, "", rows);
+    EXPECT_EQ(section->second.table, rows) << command.name;
+  }
+}
+
+TEST_F(ProtocolTables, NoCommandIsDocumentedThatIsNot) {
+  for (const auto& [heading, section] : document_.sections) {
+    if (heading.starts_with("`")) {
+      EXPECT_NE(FindCommand(heading.substr(1, heading.size() - 2)), nullptr) << heading;
+    }
+  }
+}
+
+TEST_F(ProtocolTables, EveryErrorCodeIsDocumentedAsItIs) {
+  std::vector<Row> rows;
+  for (const ErrorEntry& entry : kErrorTable) {
+    std::string meaning = entry.meaning;
+    for (size_t quote = 0; (quote = meaning.find('"', quote)) != std::string::npos;) meaning[quote] = '`';
+    rows.push_back({Code(entry.text), meaning});
+  }
+  EXPECT_EQ(document_.sections.at("Errors").table, rows);
+}
+
+TEST_F(ProtocolTables, EveryLimitIsDocumentedAsItIs) {
+  const auto row = [](const std::string& name, int64_t most, const std::string& unit) {
+    return Row{Code(name), std::to_string(most), unit};
+  };
+  EXPECT_THAT(
+      document_.sections.at("Limits").table,
+      ::testing::ElementsAre(
+          row("message length", quordaemon::kLongestMessage, "bytes of a request"),
+          row("reply length", quordaemon::kLongestMessage, "bytes of a reply"),
+          row("JSON depth", kMostJsonDepth, "levels of a request"),
+          row("connections", Options().max_connections, "at a time; an option of the daemon"),
+          row("indexes", kMostIndexes, "in the data folder"), row("request_id", kLongestRequestId, "bytes"),
+          row("data.settings.fields", kMostFields, "elements"),
+          row("data.settings.fields[N].name", kLongestFieldName, "bytes"),
+          row("data.file", kLongestFileName, "bytes"), row("data.ids", kMostIds, "elements"),
+          row("data.ids[N]", kLongestDocumentId, "bytes")));
+}
+
+TEST_F(ProtocolTables, TheFramingIsDocumentedAsItIs) {
+  EXPECT_NE(document_.text.find(std::to_string(quordaemon::kLongestMessage)), std::string::npos);
+  EXPECT_NE(document_.text.find(std::string("This is version ") + kProtocolVersion + ";"), std::string::npos);
+  EXPECT_EQ(document_.sections.at("Framing").table.front().front(), std::to_string(quordaemon::kHeaderSize));
+}
+
+}  // namespace
+}  // namespace quorelasticd

@@ -1,0 +1,206 @@
+#include <gmock/gmock.h>
+#include <gtest/gtest.h>
+
+#include <boost/asio/thread_pool.hpp>
+#include <filesystem>
+#include <future>
+#include <string>
+#include <thread>
+#include <vector>
+
+#include "data_root/index_registry.h"
+#include "errors/request_error.h"
+#include "support/files.h"
+#include "support/temporary_folder.h"
+#include "vantrel/elastic/index_error.h"
+
+namespace quorelasticd {
+namespace {
+
+namespace fs = std::filesystem;
+using quorelastic::testing::ListFolder;
+using quorelastic::testing::TemporaryFolder;
+using ::testing::ElementsAre;
+using vantrel::elastic::FieldType;
+using vantrel::elastic::Index;
+using vantrel::elastic::IndexIoError;
+using vantrel::elastic::IndexSettings;
+
+IndexSettings Settings() {
+  IndexSettings settings;
+  settings.fields = {{.name = "id", .type = FieldType::kKeyword}};
+  return settings;
+}
+
+class RegistryTest : public ::testing::Test {
+ protected:
+  ErrorCode Failure(const std::function<void()>& action) {
+    try {
+      action();
+    } catch (...) {
+      return ToRequestError().code();
+    }
+    ADD_FAILURE() << "nothing failed";
+    return ErrorCode::kInternal;
+  }
+
+  TemporaryFolder folder_;
+  DataRoot root_{folder_.path()};
+  boost::asio::thread_pool threads_{2};
+  IndexRegistry registry_{root_, threads_.get_executor()};
+};
+
+TEST_F(RegistryTest, AnIndexIsOpenedOnce) {
+  registry_.Create("x", Settings());
+  EXPECT_EQ(registry_.open_count(), 0u);
+  const auto first = registry_.Use("x");
+  EXPECT_EQ(registry_.Use("x"), first);
+  EXPECT_EQ(registry_.open_count(), 1u);
+  EXPECT_EQ(first->index().path(), root_.IndexPath("x"));
+}
+
+TEST_F(RegistryTest, WhatIsNotThereIsNotFound) {
+  fs::create_directories(folder_ / "import/inner");
+  for (const char* name : {"x", "", "..", "import", "import/inner", ".new-x", "X"}) {
+    EXPECT_EQ(Failure([&] { registry_.Use(name); }), ErrorCode::kIndexNotFound) << name;
+    EXPECT_EQ(Failure([&] { registry_.Delete(name); }), ErrorCode::kIndexNotFound) << name;
+  }
+}
+
+TEST_F(RegistryTest, ANameIsTakenOnce) {
+  registry_.Create("x", Settings());
+  EXPECT_EQ(Failure([&] { registry_.Create("x", Settings()); }), ErrorCode::kIndexExists);
+}
+
+TEST_F(RegistryTest, AFailedCreationLeavesNothing) {
+  EXPECT_EQ(Failure([&] { registry_.Create("x", IndexSettings{}); }), ErrorCode::kBadRequest);
+  EXPECT_FALSE(root_.HasIndex("x"));
+  registry_.Create("x", Settings());
+}
+
+TEST_F(RegistryTest, DeletionWaitsForNobodyButRefuses) {
+  registry_.Create("x", Settings());
+  auto use = registry_.Use("x");
+  EXPECT_EQ(Failure([&] { registry_.Delete("x"); }), ErrorCode::kLocked);
+  use.reset();
+  registry_.Delete("x");
+  EXPECT_THAT(ListFolder(folder_.path()), ElementsAre("daemon.lock", "import"));
+  EXPECT_EQ(Failure([&] { registry_.Use("x"); }), ErrorCode::kIndexNotFound);
+  registry_.Create("x", Settings());
+}
+
+TEST_F(RegistryTest, WhatAnotherProcessWritesToIsNotDeleted) {
+  registry_.Create("x", Settings());
+  auto writer = Index::Open(root_.IndexPath("x"));
+  writer->Delete("id", "nothing");
+  EXPECT_EQ(Failure([&] { registry_.Delete("x"); }), ErrorCode::kLocked);
+  EXPECT_TRUE(root_.HasIndex("x"));
+  writer.reset();
+  registry_.Delete("x");
+}
+
+TEST_F(RegistryTest, ManyThreadsMakeUseAndDeleteAtOnce) {
+  std::vector<std::thread> threads;
+  for (int i = 0; i < 4; ++i) {
+    threads.emplace_back([&] {
+      for (int round = 0; round < 20; ++round) {
+        for (const auto& action : std::vector<std::function<void()>>{
+                 [&] { registry_.Create("x", Settings()); },
+                 [&] { registry_.Use("x")->index().CountDocuments(); }, [&] { registry_.Delete("x"); }}) {
+          try {
+            action();
+          } catch (const RequestError& error) {
+            EXPECT_THAT(error.code(), ::testing::AnyOf(ErrorCode::kIndexExists, ErrorCode::kIndexNotFound,
+                                                       ErrorCode::kLocked));
+          }
+        }
+      }
+    });
+  }
+  for (std::thread& thread : threads) thread.join();
+}
+
+TEST_F(RegistryTest, EveryOpenIndexIsCommittedAtTheEnd) {
+  for (const char* name : {"x", "y"}) {
+    registry_.Create(name, Settings());
+    Changes changes(registry_.Use(name));
+    changes.Apply([](Index& index) { index.Add({{{"id", "1"}}}); });
+    changes.Promise();
+    EXPECT_EQ(registry_.Use(name)->index().CountDocuments().live, 0u);
+  }
+  EXPECT_TRUE(registry_.CommitAll());
+  for (const char* name : {"x", "y"}) EXPECT_EQ(registry_.Use(name)->index().CountDocuments().live, 1u);
+}
+
+class ChangesTest : public RegistryTest {
+ protected:
+  ChangesTest() {
+    registry_.Create("x", Settings());
+    open_ = registry_.Use("x");
+  }
+
+  static void Fail(Changes& changes) {
+    EXPECT_THROW(changes.Apply([](Index&) { throw IndexIoError("/x", "cannot write", ENOSPC); }),
+                 IndexIoError);
+  }
+
+  static void Add(Changes& changes) {
+    changes.Apply([](Index& index) { index.Add({{{"id", "1"}}}); });
+  }
+
+  std::shared_ptr<OpenIndex> open_;
+};
+
+TEST_F(ChangesTest, AFailureUnderOneRequestIsNoticedByAnother) {
+  Changes one(open_);
+  Changes another(open_);
+  Add(one);
+  Fail(another);
+  EXPECT_EQ(Failure([&] { Add(one); }), ErrorCode::kIoError);
+  EXPECT_EQ(Failure([&] { one.Commit(); }), ErrorCode::kIoError);
+  Changes later(open_);
+  Add(later);
+  EXPECT_NO_THROW(later.Commit());
+}
+
+TEST_F(ChangesTest, AValueThatIsRefusedDoesNoHarm) {
+  Changes one(open_);
+  Changes another(open_);
+  Add(one);
+  EXPECT_THROW(another.Apply([](Index& index) {
+    index.Add({{{"unknown", "1"}}});
+  }),
+               vantrel::elastic::IndexValueError);
+  Add(one);
+  EXPECT_NO_THROW(one.Commit());
+}
+
+TEST_F(ChangesTest, ABrokenPromiseIsReportedOnce) {
+  Changes promised(open_);
+  Add(promised);
+  promised.Promise();
+  Changes failing(open_);
+  Fail(failing);
+  Changes bulk(open_);
+  Add(bulk);
+  bulk.Commit();
+  Changes commit(open_);
+  commit.Commit();
+  EXPECT_EQ(Failure([&] { commit.ReportBrokenPromise(); }), ErrorCode::kIoError);
+  EXPECT_NO_THROW(commit.ReportBrokenPromise());
+}
+
+TEST_F(ChangesTest, AKeptPromiseIsNotReported) {
+  Changes promised(open_);
+  Add(promised);
+  promised.Promise();
+  Changes commit(open_);
+  commit.Commit();
+  Changes failing(open_);
+  Fail(failing);
+  Changes last(open_);
+  EXPECT_NO_THROW(last.ReportBrokenPromise());
+}
+
+}  // namespace
+}  // namespace quorelasticd
