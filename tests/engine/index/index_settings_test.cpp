@@ -29,7 +29,9 @@ TEST(IndexSettingsTest, EverySettingComesBackAsItWas) {
   const TemporaryFolder folder;
   IndexSettings settings;
   settings.compound_files = false;
+  settings.id_field = "key";
   settings.fields = {
+      {.name = "key", .type = FieldType::kKeyword},
       {.name = "schlüssel", .type = FieldType::kKeyword, .stored = false, .norms = false},
       {.name = "a \"b\"\n", .term_vector = TermVector::kTerms, .frequencies = false},
       {.name = "p", .term_vector = TermVector::kPositions},
@@ -39,6 +41,7 @@ TEST(IndexSettingsTest, EverySettingComesBackAsItWas) {
   Index::Create(folder.path(), settings);
   const IndexSettings back = Index::Open(folder.path())->settings();
   EXPECT_FALSE(back.compound_files);
+  EXPECT_EQ(back.id_field, "key");
   ASSERT_EQ(back.fields.size(), settings.fields.size());
   for (size_t i = 0; i < back.fields.size(); ++i) {
     EXPECT_EQ(back.fields[i].name, settings.fields[i].name);
@@ -69,7 +72,25 @@ TEST(IndexSettingsTest, SettingsThatMakeNoSenseAreRefusedBeforeAnythingIsMade) {
   EXPECT_EQ(refusal({.fields = {{.name = "x\xe9"}}}), start + R"(the field name "x\xe9" is not valid UTF-8)");
   EXPECT_EQ(refusal({.fields = {{.name = "\xef\xbf\xbf"}}}),
             start + "the field name \"\xef\xbf\xbf\" holds U+FFFF, which an index cannot keep");
+  EXPECT_EQ(refusal({.fields = {{.name = "id"}}}), start + "the id field \"id\" is no stored keyword");
+  EXPECT_EQ(refusal({.fields = {{.name = "id", .type = FieldType::kKeyword, .stored = false}}}),
+            start + "the id field \"id\" is no stored keyword");
+  EXPECT_EQ(refusal({.fields = {{.name = "body"}}, .id_field = ""}),
+            start + "the settings have a field without a name");
   EXPECT_THAT(ListFolder(folder.path()), IsEmpty());
+}
+
+TEST(IndexSettingsTest, TheIdFieldIsPutBeforeTheOthersWhereItIsMissing) {
+  const TemporaryFolder folder;
+  const auto index = Index::Create(folder.path(), {.fields = {{.name = "body"}}, .id_field = "schlüssel"});
+  for (const IndexSettings& settings : {index->settings(), Index::Open(folder.path())->settings()}) {
+    EXPECT_EQ(settings.id_field, "schlüssel");
+    ASSERT_EQ(settings.fields.size(), 2U);
+    EXPECT_EQ(settings.fields[0].name, "schlüssel");
+    EXPECT_EQ(settings.fields[0].type, FieldType::kKeyword);
+    EXPECT_TRUE(settings.fields[0].stored);
+    EXPECT_EQ(settings.fields[1].name, "body");
+  }
 }
 
 // An index whose settings file each test spoils.
@@ -147,6 +168,15 @@ TEST_F(SettingsFileTest, WithAWrongMemberIsRefused) {
   EXPECT_EQ(ProblemWithSettings(), "settings file member \"fields\" is no array");
   settings()["compound_files"] = 1;
   EXPECT_EQ(ProblemWithSettings(), "settings file member \"compound_files\" is neither true nor false");
+}
+
+TEST_F(SettingsFileTest, WithAnIdFieldThatIsNoneIsRefused) {
+  settings()["id_field"] = "body";
+  EXPECT_EQ(ProblemWithSettings(), "the id field \"body\" is no stored keyword");
+  settings()["id_field"] = "key";
+  EXPECT_EQ(ProblemWithSettings(), "the settings lack the id field \"key\"");
+  settings().removeMember("id_field");
+  EXPECT_EQ(ProblemWithSettings(), "settings file lacks the member \"id_field\"");
 }
 
 TEST_F(SettingsFileTest, WithAnUnknownMemberIsRefused) {

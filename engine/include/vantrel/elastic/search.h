@@ -81,10 +81,10 @@ struct SearchResult {
       warnings;  // what may not be as meant, one line each, such as a field that is not there
 };
 
-// Searches several indexes as if they were one: what a word weighs is counted over all of them. Equal scores
-// come in the order of the indexes, and of adding. Each index is seen as of its newest commit, which this or
-// another process made; what is not committed is not seen. Each index understands the query by its own
-// settings. Any number of threads may search, also while others write.
+// Searches several indexes, none of them null, as if they were one: what a word weighs is counted over all of
+// them. Equal scores come in the order of the indexes, and of adding. Each index is seen as of its newest commit,
+// which this or another process made; what is not committed is not seen. Each index understands the query by its
+// own settings. Any number of threads may search, also while others write.
 //
 // Throws QuerySyntaxError, LimitExceededError, UnknownPluginError, PluginDataError, SearchTimeoutError (all
 // SearchError), and IndexError where an index cannot be read.
