@@ -5,6 +5,7 @@
 #include <systemd/sd-daemon.h>
 
 #include <boost/asio/thread_pool.hpp>
+#include <chrono>
 #include <csignal>
 #include <exception>
 #include <iostream>
@@ -20,6 +21,7 @@
 #include "server/listener.h"
 #include "server/server.h"
 #include "vantrel/elastic/library_setup.h"
+#include "vantrel/elastic/search_plugin.h"
 #include "version.h"
 
 namespace {
@@ -39,6 +41,10 @@ ServerLimits LimitsOf(const Options& options) {
   return limits;
 }
 
+std::chrono::milliseconds SearchTimeLimit(const Options& options) {
+  return std::chrono::ceil<std::chrono::milliseconds>(std::chrono::duration<double>(options.search_timeout));
+}
+
 void TellReady(const std::string& socket) {
   spdlog::info("quorelasticd {} serves on {}", kVersion, socket);
   sd_notifyf(0, "READY=1\nSTATUS=Serving on %s", socket.c_str());
@@ -49,14 +55,22 @@ void TellStopping() { sd_notify(0, "STOPPING=1\nSTATUS=Finishing what is running
 int Serve(const Options& options) {
   const DataRoot root(options.data);
   Listener listener(options.socket);
-  boost::asio::thread_pool slow_threads(static_cast<size_t>(options.threads));
+  vantrel::elastic::SearchPluginRegistry plugins;
+  if (!options.plugins.empty()) {
+    spdlog::info("{}: {} search plugins", options.plugins, plugins.LoadFolder(options.plugins));
+  }
+  const auto threads = static_cast<size_t>(options.threads);
+  boost::asio::thread_pool search_threads(threads);
+  boost::asio::thread_pool slow_threads(threads);
   IndexRegistry registry(root, slow_threads.get_executor());
   Statistics statistics;
-  const Daemon daemon(registry, statistics);
+  const Daemon daemon(registry, statistics,
+                      {plugins, search_threads.get_executor(), SearchTimeLimit(options)});
   CommandService service(daemon);
   Server server(listener.Release(), service, LimitsOf(options), statistics.connections);
   TellReady(options.socket);
   server.Run(TellStopping);
+  search_threads.join();
   slow_threads.join();
   const bool is_committed = registry.CommitAll();
   spdlog::info("ended");

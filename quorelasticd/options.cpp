@@ -20,47 +20,55 @@ namespace po = boost::program_options;
 constexpr std::array kLogLevels = {"debug", "info", "warning", "error"};
 
 po::typed_value<std::string>* Text(std::string& value, const char* name) {
-  auto* option = po::value<std::string>(&value)->value_name(name);
+  auto* option = po::value(&value)->value_name(name);
   return value.empty() ? option : option->default_value(value);
 }
 
-po::typed_value<int64_t>* Number(int64_t& value, const char* name) {
-  return po::value<int64_t>(&value)->value_name(name)->default_value(value);
+template <typename T>
+po::typed_value<T>* Number(T& value, const char* name) {
+  return po::value(&value)->value_name(name)->default_value(value);
 }
 
 po::options_description Describe(Options& options) {
   constexpr unsigned kLineLength = 100;
   po::options_description description("Options", kLineLength);
-  description.add_options()                                                                               //
-      ("socket", Text(options.socket, "PATH"), "the socket that clients connect to")                      //
-      ("data", Text(options.data, "FOLDER"), "the folder that holds the indexes")                         //
-      ("threads", Number(options.threads, "N"), "threads for quick requests, and as many for slow ones")  //
-      ("max-connections", Number(options.max_connections, "N"), "clients connected at a time")            //
+  description.add_options()                                                                          //
+      ("socket", Text(options.socket, "PATH"), "the socket that clients connect to")                 //
+      ("data", Text(options.data, "FOLDER"), "the folder that holds the indexes")                    //
+      ("plugins", Text(options.plugins, "FOLDER"), "load the search plugins (*.so) in this folder")  //
+      ("threads", Number(options.threads, "N"),
+       "threads for connections, as many for searches, and as many for writing")                //
+      ("max-connections", Number(options.max_connections, "N"), "clients connected at a time")  //
       ("idle-timeout", Number(options.idle_timeout, "SECONDS"),
        "hang up on a client that asks for nothing")  //
       ("stall-timeout", Number(options.stall_timeout, "SECONDS"),
        "hang up on a client that stops within a message")  //
       ("shutdown-timeout", Number(options.shutdown_timeout, "SECONDS"),
-       "cut off requests that run on when the daemon is to end")                                      //
+       "cut off requests that run on when the daemon is to end")  //
+      ("search-timeout", Number(options.search_timeout, "SECONDS"),
+       "give up a search that takes longer, such as 0.5")                                             //
       ("log-level", Text(options.log_level, "LEVEL"), "log debug, info, warning or error and above")  //
       ("help", "print this text")                                                                     //
       ("version", "print the version");
   return description;
 }
 
-void CheckRange(const char* name, int64_t value, int64_t least, int64_t most) {
+template <typename T>
+void CheckRange(const char* name, T value, T least, T most) {
   if (value >= least && value <= most) return;
-  throw OptionError(std::string("--") + name + ": expected a number from " + std::to_string(least) + " to " +
-                    std::to_string(most) + ", found " + std::to_string(value));
+  std::ostringstream problem;
+  problem << "--" << name << ": expected a number from " << least << " to " << most << ", found " << value;
+  throw OptionError(problem.str());
 }
 
 void Check(const Options& options) {
   constexpr int64_t kDay = 24 * 60 * 60;
-  CheckRange("threads", options.threads, 1, 256);
-  CheckRange("max-connections", options.max_connections, 1, 100000);
-  CheckRange("idle-timeout", options.idle_timeout, 1, kDay);
-  CheckRange("stall-timeout", options.stall_timeout, 1, kDay);
-  CheckRange("shutdown-timeout", options.shutdown_timeout, 1, kDay);
+  CheckRange<int64_t>("threads", options.threads, 1, 256);
+  CheckRange<int64_t>("max-connections", options.max_connections, 1, 100000);
+  CheckRange<int64_t>("idle-timeout", options.idle_timeout, 1, kDay);
+  CheckRange<int64_t>("stall-timeout", options.stall_timeout, 1, kDay);
+  CheckRange<int64_t>("shutdown-timeout", options.shutdown_timeout, 1, kDay);
+  CheckRange<double>("search-timeout", options.search_timeout, 0.001, kDay);
   if (std::find(kLogLevels.begin(), kLogLevels.end(), options.log_level) == kLogLevels.end()) {
     throw OptionError("--log-level: expected debug, info, warning or error, found " +
                       Quoted(options.log_level));

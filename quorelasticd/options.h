@@ -12,11 +12,13 @@ struct Options {
   std::string socket = "/var/run/quorelasticd.sock";
   std::string data = QUORELASTIC_DATA_ROOT;
   std::string log_level = "info";
+  std::string plugins;  // a folder; empty for none
   int64_t threads = 4;
   int64_t max_connections = 256;
   int64_t idle_timeout = 300;  // seconds, as the two below
   int64_t stall_timeout = 30;
   int64_t shutdown_timeout = 60;
+  double search_timeout = 30;
 };
 
 // A command line that makes no sense; what() is one line.

@@ -99,7 +99,7 @@ std::unique_ptr<Execution> CommandService::Begin(std::string request) {
 }
 
 std::string CommandService::RefuseTooLong() {
-  return Refusal(LimitExceeded("message length", quordaemon::kLongestMessage, "bytes"));
+  return Refusal(LimitExceeded("message_bytes", quordaemon::kLongestMessage, "bytes"));
 }
 
 std::string CommandService::RefuseTooManyConnections(size_t most) {

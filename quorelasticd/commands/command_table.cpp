@@ -9,8 +9,9 @@ namespace quorelasticd {
 const std::vector<Command>& CommandTable() {
   static const std::vector<Command> table = {
       IndexCreateCommand(),    IndexListCommand(), IndexDeleteCommand(), DocumentBulkCommand(),
-      DocumentDeleteCommand(), CommitCommand(),    OptimizeCommand(),    TermsCommand(),
-      StatusCommand(),         HelpCommand(),
+      DocumentDeleteCommand(), CommitCommand(),    OptimizeCommand(),    SearchCommand(),
+      AnalyzeCommand(),        TermsCommand(),     PluginListCommand(),  StatusCommand(),
+      HelpCommand(),
   };
   return table;
 }

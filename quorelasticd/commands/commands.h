@@ -12,7 +12,10 @@ Command DocumentBulkCommand();
 Command DocumentDeleteCommand();
 Command CommitCommand();
 Command OptimizeCommand();
+Command SearchCommand();
+Command AnalyzeCommand();
 Command TermsCommand();
+Command PluginListCommand();
 Command StatusCommand();
 Command HelpCommand();
 

@@ -6,10 +6,8 @@
 
 namespace quorelasticd {
 
-// Adds how many documents an index holds as of its last commit: "documents", and "deleted", those that still take
-// space.
-inline void AddCounts(const vantrel::elastic::Index& index, Json::Value& object) {
-  const vantrel::elastic::DocumentCounts counts = index.CountDocuments();
+// Adds "documents", how many an index holds, and "deleted", those that still take space.
+inline void AddCounts(const vantrel::elastic::DocumentCounts& counts, Json::Value& object) {
   object["documents"] = static_cast<Json::UInt64>(counts.live);
   object["deleted"] = static_cast<Json::UInt64>(counts.deleted);
 }

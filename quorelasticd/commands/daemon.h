@@ -1,11 +1,14 @@
 #pragma once
 
 #include <atomic>
+#include <boost/asio/any_io_executor.hpp>
 #include <chrono>
 #include <cstddef>
 #include <cstdint>
+#include <utility>
 
 #include "data_root/index_registry.h"
+#include "vantrel/elastic/search_plugin.h"
 
 namespace quorelasticd {
 
@@ -17,18 +20,28 @@ struct Statistics {
   std::atomic<uint64_t> failed_requests{0};  // those that were answered with an error
 };
 
+// What searches work with.
+struct Searching {
+  const vantrel::elastic::SearchPluginRegistry& plugins;
+  boost::asio::any_io_executor executor;  // apart from that of writers, so that no merge delays a search
+  std::chrono::milliseconds time_limit;
+};
+
 // What the commands work on. For any thread.
 class Daemon {
  public:
-  // Both must outlive it.
-  Daemon(IndexRegistry& registry, Statistics& statistics) : registry_(registry), statistics_(statistics) {}
+  // What is referred to must outlive it.
+  Daemon(IndexRegistry& registry, Statistics& statistics, Searching searching)
+      : registry_(registry), statistics_(statistics), searching_(std::move(searching)) {}
 
   IndexRegistry& registry() const { return registry_; }
   Statistics& statistics() const { return statistics_; }
+  const Searching& searching() const { return searching_; }
 
  private:
   IndexRegistry& registry_;
   Statistics& statistics_;
+  Searching searching_;
 };
 
 }  // namespace quorelasticd

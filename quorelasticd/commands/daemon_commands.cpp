@@ -34,6 +34,25 @@ class Status : public RunningCommand {
   const Daemon& daemon_;
 };
 
+class PluginList : public RunningCommand {
+ public:
+  explicit PluginList(const Daemon& daemon) : daemon_(daemon) {}
+
+  Outcome Step() override {
+    Json::Value result(Json::objectValue);
+    result["plugins"] = Json::arrayValue;
+    for (const auto& plugin : daemon_.searching().plugins.List()) {
+      Json::Value& described = result["plugins"].append(Json::objectValue);
+      described["name"] = plugin->name();
+      described["summary"] = plugin->summary();
+    }
+    return Result(std::move(result));
+  }
+
+ private:
+  const Daemon& daemon_;
+};
+
 Json::Value DescribeMembers(const Shape& shape) {
   Json::Value members(Json::arrayValue);
   for (const Member& member : shape.members) {
@@ -63,8 +82,7 @@ class Help : public RunningCommand {
     const std::string name = data["command"].asString();
     only_ = FindCommand(name);
     if (only_ == nullptr) {
-      throw RequestError(ErrorCode::kUnknownCommand,
-                         "data.command: there is no command " + Quoted(name));
+      throw RequestError(ErrorCode::kUnknownCommand, "data.command: there is no command " + Quoted(name));
     }
   }
 
@@ -83,6 +101,13 @@ class Help : public RunningCommand {
 };
 
 }  // namespace
+
+Command PluginListCommand() {
+  return {"plugin_list", "Describes the search plugins that filters can name.", Object({}),
+          [](const Daemon& daemon, Json::Value) -> std::unique_ptr<RunningCommand> {
+            return std::make_unique<PluginList>(daemon);
+          }};
+}
 
 Command StatusCommand() {
   return {"status", "Tells how the daemon is doing.", Object({}),

@@ -1,4 +1,3 @@
-#include <algorithm>
 #include <chrono>
 #include <limits>
 #include <optional>
@@ -70,14 +69,8 @@ class DocumentBulk : public RunningCommand {
 
   void Add(const DocumentSource::Item& item) {
     try {
-      const vantrel::elastic::Document document = item.ToDocument(open_->id_field());
-      const std::string& id_field = open_->id_field();
-      const auto id = std::find_if(document.fields.begin(), document.fields.end(),
-                                   [&](const auto& field) { return field.name == id_field; });
-      changes_.Apply([&](Index& index) {
-        index.Delete(id_field, id->value);
-        index.Add(document);
-      });
+      const vantrel::elastic::Document document = item.ToDocument();
+      changes_.Apply([&](Index& index) { index.Update(document); });
       ++indexed_;
     } catch (...) {
       const RequestError error = ToRequestError();
@@ -129,10 +122,9 @@ class DocumentDelete : public RunningCommand {
   boost::asio::any_io_executor executor() const override { return open_->writing_turn(); }
 
   Outcome Step() override {
-    const std::string& field = open_->id_field();
     for (size_t i = 0; i < kDocumentsPerStep && next_ < ids_.size(); ++i) {
       const std::string id = ids_[next_++].asString();
-      changes_.Apply([&](Index& index) { index.Delete(field, id); });
+      changes_.Apply([&](Index& index) { index.DeleteById(id); });
     }
     if (next_ < ids_.size()) return Nothing();
     commits_ ? changes_.Commit() : changes_.Promise();

@@ -16,14 +16,12 @@ namespace {
 
 }  // namespace
 
-vantrel::elastic::Document ToDocument(const Json::Value& json, const std::string& id_field) {
+vantrel::elastic::Document ToDocument(const Json::Value& json) {
   if (!json.isObject()) Refuse("a document is an object of fields");
   vantrel::elastic::Document document;
-  size_t ids = 0;
   const auto add = [&](const std::string& field, const Json::Value& value) {
     if (!value.isString()) RefuseValue(field);
     document.fields.push_back({field, value.asString()});
-    if (field == id_field && !document.fields.back().value.empty()) ++ids;
   };
   for (auto member = json.begin(); member != json.end(); ++member) {
     const std::string field = member.name();
@@ -33,7 +31,6 @@ vantrel::elastic::Document ToDocument(const Json::Value& json, const std::string
       for (const Json::Value& value : *member) add(field, value);
     }
   }
-  if (ids != 1) Refuse("field " + Quoted(id_field) + ": expected exactly one value, not empty");
   return document;
 }
 

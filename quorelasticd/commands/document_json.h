@@ -9,8 +9,7 @@
 namespace quorelasticd {
 
 // A document as the protocol has it: an object of fields, each a string or an array of strings. Throws RequestError
-// (bad_request) where it is none, or does not have exactly one id. Whether the index takes its fields and values
-// is the engine's to say.
-vantrel::elastic::Document ToDocument(const Json::Value& json, const std::string& id_field);
+// (bad_request) where it is none. Whether the index takes its fields and values is the engine's to say.
+vantrel::elastic::Document ToDocument(const Json::Value& json);
 
 }  // namespace quorelasticd

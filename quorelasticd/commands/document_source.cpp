@@ -69,9 +69,9 @@ class ImportSource : public DocumentSource {
 
 }  // namespace
 
-vantrel::elastic::Document DocumentSource::Item::ToDocument(const std::string& id_field) const {
+vantrel::elastic::Document DocumentSource::Item::ToDocument() const {
   if (!problem.empty()) throw RequestError(ErrorCode::kBadRequest, problem);
-  return quorelasticd::ToDocument(json, id_field);
+  return quorelasticd::ToDocument(json);
 }
 
 std::unique_ptr<DocumentSource> InlineDocuments(Json::Value documents) {

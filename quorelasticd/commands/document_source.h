@@ -20,7 +20,7 @@ class DocumentSource {
     std::string problem;    // why there is no JSON value; empty where there is one
 
     // Throws RequestError (bad_request).
-    vantrel::elastic::Document ToDocument(const std::string& id_field) const;
+    vantrel::elastic::Document ToDocument() const;
   };
 
   DocumentSource() = default;

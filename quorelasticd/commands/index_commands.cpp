@@ -15,17 +15,16 @@ class IndexCreate : public RunningCommand {
   IndexCreate(const Daemon& daemon, const Json::Value& data)
       : daemon_(daemon), name_(data["id"].asString()), settings_(ToSettings(data["settings"])) {
     if (IsIndexName(name_)) return;
-    throw RequestError(ErrorCode::kBadRequest, std::string("data.id: expected ") + kIndexNameRule +
-                                                   ", found " + Quoted(name_));
+    throw RequestError(ErrorCode::kBadRequest,
+                       std::string("data.id: expected ") + kIndexNameRule + ", found " + Quoted(name_));
   }
 
   boost::asio::any_io_executor executor() const override { return daemon_.registry().slow_executor(); }
 
   Outcome Step() override {
-    daemon_.registry().Create(name_, settings_);
     Json::Value result(Json::objectValue);
+    result["settings"] = ToJson(daemon_.registry().Create(name_, settings_));
     result["id"] = name_;
-    result["settings"] = ToJson(settings_);
     return Result(std::move(result));
   }
 
@@ -63,8 +62,10 @@ class IndexList : public RunningCommand {
     entry["id"] = name;
     try {
       const std::shared_ptr<OpenIndex> open = daemon_.registry().Use(name);
-      AddCounts(open->index(), entry);
-      entry["size_bytes"] = static_cast<Json::UInt64>(daemon_.registry().root().IndexSize(name));
+      const vantrel::elastic::IndexStatistics statistics = open->index().Statistics();
+      AddCounts(statistics.documents, entry);
+      entry["segments"] = static_cast<Json::UInt64>(statistics.segments);
+      entry["size_bytes"] = static_cast<Json::UInt64>(statistics.bytes);
       entry["settings"] = ToJson(open->index().settings());
     } catch (...) {
       const RequestError error = ToRequestError();
@@ -117,7 +118,7 @@ class Commit : public RunningCommand {
     changes_.ReportBrokenPromise();
     Json::Value result(Json::objectValue);
     result["committed"] = true;
-    AddCounts(open_->index(), result);
+    AddCounts(open_->index().CountDocuments(), result);
     return Result(std::move(result));
   }
 

@@ -55,7 +55,7 @@ std::string ReplyWriter::Finish(const Json::Value& reply) const {
   static_cast<Json::Value&>(value) = reply;
   std::string text = value.toString();
   if (text.size() <= quordaemon::kLongestMessage) return text;
-  return Error(LimitExceeded("reply length", quordaemon::kLongestMessage, "bytes"));
+  return Error(LimitExceeded("reply_bytes", quordaemon::kLongestMessage, "bytes"));
 }
 
 }  // namespace quorelasticd

@@ -59,7 +59,7 @@ Json::Value ParseRoot(const std::string& text) {
   }
   vantrel::elastic::JsonValue root;
   if (!root.fromString(text)) {
-    if (JsonDepth(text) > kMostJsonDepth) throw LimitExceeded("JSON depth", kMostJsonDepth, "levels");
+    if (JsonDepth(text) > kMostJsonDepth) throw LimitExceeded("json_depth", kMostJsonDepth, "levels");
     throw RequestError(ErrorCode::kBadRequest, "the request is no JSON document: " + ParserComplaint(text));
   }
   return root;

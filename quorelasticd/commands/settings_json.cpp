@@ -6,8 +6,6 @@
 #include <vector>
 
 #include "base/limits.h"
-#include "base/text.h"
-#include "errors/request_error.h"
 
 namespace quorelasticd {
 namespace {
@@ -16,8 +14,6 @@ using vantrel::elastic::FieldSettings;
 using vantrel::elastic::FieldType;
 using vantrel::elastic::IndexSettings;
 using vantrel::elastic::TermVector;
-
-constexpr const char* kDefaultIdField = "id";
 
 template <typename T>
 struct Word {
@@ -63,19 +59,6 @@ FieldSettings ToField(const Json::Value& json) {
   return field;
 }
 
-void SettleIdField(IndexSettings& settings) {
-  const auto found = std::find_if(settings.fields.begin(), settings.fields.end(),
-                                  [&](const FieldSettings& field) { return field.name == kDefaultIdField; });
-  if (found == settings.fields.end()) {
-    settings.fields.insert(
-        settings.fields.begin(),
-        {.name = kDefaultIdField, .type = FieldType::kKeyword, .norms = false, .frequencies = false});
-  } else if (found->type != FieldType::kKeyword || !found->stored) {
-    throw RequestError(ErrorCode::kBadRequest,
-                       "data.settings.fields: expected the field \"id\" to be a stored keyword");
-  }
-}
-
 }  // namespace
 
 Shape SettingsShape() {
@@ -91,19 +74,22 @@ Shape SettingsShape() {
        "Whether it is kept how often and where a term stands, which phrases need; true by default."},
   });
   return Object({
-      {"fields", true, ArrayOf(field, kMostFields), "The fields that documents may have."},
+      {"fields", true, NonEmptyArrayOf(field, kMostFields), "The fields that documents may have."},
+      {"id_field", false, String(kLongestFieldName),
+       "The stored keyword that tells documents apart, \"id\" by default; added where the fields lack it."},
   });
 }
 
 IndexSettings ToSettings(const Json::Value& json) {
   IndexSettings settings;
   for (const Json::Value& field : json["fields"]) settings.fields.push_back(ToField(field));
-  SettleIdField(settings);
+  settings.id_field = json.get("id_field", settings.id_field).asString();
   return settings;
 }
 
 Json::Value ToJson(const IndexSettings& settings) {
   Json::Value json(Json::objectValue);
+  json["id_field"] = settings.id_field;
   json["fields"] = Json::arrayValue;
   for (const FieldSettings& field : settings.fields) {
     Json::Value& object = json["fields"].append(Json::objectValue);

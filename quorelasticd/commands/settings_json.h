@@ -10,8 +10,7 @@ namespace quorelasticd {
 // The settings of an index as the protocol has them.
 Shape SettingsShape();
 
-// `json` is of the shape above. Defaults stand in for members left out, and the id field is added where the fields
-// lack it. Throws RequestError where the id field cannot serve as one.
+// `json` is of the shape above. Defaults stand in for members left out.
 vantrel::elastic::IndexSettings ToSettings(const Json::Value& json);
 
 Json::Value ToJson(const vantrel::elastic::IndexSettings& settings);

@@ -99,8 +99,7 @@ void CheckArray(const Shape& shape, const Json::Value& value, const std::string&
 
 std::string MemberNames(const Shape& shape) {
   std::string names;
-  for (const Member& member : shape.members)
-    names += (names.empty() ? "" : ", ") + Quoted(member.name);
+  for (const Member& member : shape.members) names += (names.empty() ? "" : ", ") + Quoted(member.name);
   return names.empty() ? "none" : names;
 }
 
@@ -178,6 +177,12 @@ Shape Choice(std::vector<std::string> choices) {
 
 Shape ArrayOf(Shape element, int64_t most) {
   return {.kind = Shape::Kind::kArray, .most = most, .of = {std::move(element)}};
+}
+
+Shape NonEmptyArrayOf(Shape element, int64_t most) {
+  Shape shape = ArrayOf(std::move(element), most);
+  shape.may_be_empty = false;
+  return shape;
 }
 
 Shape Object(std::vector<Member> members) {

@@ -39,6 +39,7 @@ Shape String(int64_t most_bytes);  // not empty
 Shape Text();                      // any string
 Shape Choice(std::vector<std::string> choices);
 Shape ArrayOf(Shape element, int64_t most);
+Shape NonEmptyArrayOf(Shape element, int64_t most);
 Shape Object(std::vector<Member> members);
 Shape Either(std::vector<Shape> shapes);
 

@@ -90,16 +90,6 @@ std::string DataRoot::HideIndex(const std::string& name) const {
   return hidden;
 }
 
-uint64_t DataRoot::IndexSize(const std::string& name) const {
-  uint64_t size = 0;
-  for (const fs::directory_entry& entry : fs::directory_iterator(IndexPath(name))) {
-    std::error_code vanished;  // a writer may be merging
-    const auto bytes = entry.is_regular_file(vanished) ? entry.file_size(vanished) : 0;
-    if (!vanished) size += bytes;
-  }
-  return size;
-}
-
 void DataRoot::Sweep() const {
   for (const fs::directory_entry& entry : fs::directory_iterator(path_)) {
     const std::string name = entry.path().filename().string();

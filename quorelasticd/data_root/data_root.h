@@ -47,9 +47,6 @@ class DataRoot {
   // Takes the name off an index, durably; what it was can then be removed from the path returned.
   std::string HideIndex(const std::string& name) const;
 
-  // The bytes that an index takes on disk.
-  uint64_t IndexSize(const std::string& name) const;
-
  private:
   void Sweep() const;
 

@@ -12,7 +12,8 @@
 #include "base/text.h"
 #include "data_root/index_name.h"
 #include "errors/request_error.h"
-#include "vantrel/elastic/index_files.h"
+#include "vantrel/elastic/index_error.h"
+#include "vantrel/elastic/write_lock.h"
 
 namespace quorelasticd {
 namespace {
@@ -56,7 +57,8 @@ std::shared_ptr<OpenIndex> IndexRegistry::Use(const std::string& name) {
   return open;
 }
 
-void IndexRegistry::Create(const std::string& name, const vantrel::elastic::IndexSettings& settings) {
+vantrel::elastic::IndexSettings IndexRegistry::Create(const std::string& name,
+                                                      const vantrel::elastic::IndexSettings& settings) {
   if (!IsIndexName(name)) throw std::invalid_argument("no name of an index: " + name);
   std::unique_ptr<Reservation> reservation;
   {
@@ -65,13 +67,14 @@ void IndexRegistry::Create(const std::string& name, const vantrel::elastic::Inde
       throw RequestError(ErrorCode::kIndexExists, "there is an index " + Quoted(name) + " already");
     }
     if (root_.ListIndexes().size() + reserved_.size() >= kMostIndexes) {
-      throw LimitExceeded("indexes", kMostIndexes, "in the data folder");
+      throw LimitExceeded("stored_indexes", kMostIndexes, "in the data folder");
     }
     reservation = std::make_unique<Reservation>(*this, name);
   }
-  vantrel::elastic::Index::Create(root_.HiddenPath(name), settings);
+  const auto created = vantrel::elastic::Index::Create(root_.HiddenPath(name), settings)->settings();
   root_.ShowIndex(name);
   spdlog::info("index {} created", name);
+  return created;
 }
 
 void IndexRegistry::Delete(const std::string& name) {
@@ -91,12 +94,7 @@ void IndexRegistry::Delete(const std::string& name) {
     reservation = std::make_unique<Reservation>(*this, name);
   }
   closing.reset();  // which lets go of its write lock
-  const std::string lock_path = root_.IndexPath(name) + "/" + vantrel::elastic::kIndexLockFileName;
-  const std::optional<FileLock> nobody_writes = FileLock::TryLock(lock_path);
-  if (!nobody_writes.has_value()) {
-    throw RequestError(ErrorCode::kLocked,
-                       "index " + Quoted(name) + " is open for writing elsewhere");
-  }
+  const vantrel::elastic::WriteLock nobody_else_writes(root_.IndexPath(name));
   const std::string hidden = root_.HideIndex(name);
   spdlog::info("index {} deleted", name);
   std::error_code error;  // the index is gone; files that stay behind are removed at the next start

@@ -28,8 +28,10 @@ class IndexRegistry {
   // The index of this name. It is not deleted as long as the result is held.
   std::shared_ptr<OpenIndex> Use(const std::string& name);
 
-  // Makes an empty index, durably. The name must satisfy IsIndexName().
-  void Create(const std::string& name, const vantrel::elastic::IndexSettings& settings);
+  // Makes an empty index, durably, and returns its settings as the engine completed them. The name must satisfy
+  // IsIndexName().
+  vantrel::elastic::IndexSettings Create(const std::string& name,
+                                         const vantrel::elastic::IndexSettings& settings);
 
   // Removes an index and all its files. Refused (locked) while anybody uses it, or writes to it.
   void Delete(const std::string& name);

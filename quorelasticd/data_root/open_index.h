@@ -21,16 +21,13 @@ class OpenIndex {
 
   const std::string& name() const { return name_; }
   vantrel::elastic::Index& index() const { return *index_; }
-  // The keyword field that tells documents apart.
-  const std::string& id_field() const { return id_field_; }
-
+  const std::shared_ptr<vantrel::elastic::Index>& shared_index() const { return index_; }
   const boost::asio::any_io_executor& writing_turn() const { return writing_turn_; }
 
  private:
   friend class Changes;
 
   std::string name_;
-  std::string id_field_ = "id";
   std::shared_ptr<vantrel::elastic::Index> index_;
   boost::asio::any_io_executor writing_turn_;
 

@@ -6,6 +6,7 @@
 
 #include "base/text.h"
 #include "vantrel/elastic/index_error.h"
+#include "vantrel/elastic/search_error.h"
 
 namespace quorelasticd {
 namespace {
@@ -15,6 +16,19 @@ std::string WithoutPath(const vantrel::elastic::IndexError& error) {
   const std::string text = error.what();
   const std::string prefix = error.path() + ": ";
   return text.starts_with(prefix) ? text.substr(prefix.size()) : text;
+}
+
+RequestError ToRequestError(const vantrel::elastic::QuerySyntaxError& error) {
+  Json::Value details(Json::objectValue);
+  details["position"] = static_cast<Json::UInt64>(error.position());
+  return RequestError(ErrorCode::kQuerySyntax, error.what(), std::move(details));
+}
+
+Json::Value LimitDetails(const std::string& limit, int64_t most) {
+  Json::Value details(Json::objectValue);
+  details["limit"] = limit;
+  details["most"] = static_cast<Json::Int64>(most);
+  return details;
 }
 
 }  // namespace
@@ -30,11 +44,8 @@ Json::Value RequestError::ToJson() const {
 }
 
 RequestError LimitExceeded(const std::string& limit, int64_t most, const std::string& unit) {
-  Json::Value details(Json::objectValue);
-  details["limit"] = limit;
-  details["most"] = static_cast<Json::Int64>(most);
   return RequestError(ErrorCode::kLimitExceeded, limit + ": at most " + std::to_string(most) + " " + unit,
-                      std::move(details));
+                      LimitDetails(limit, most));
 }
 
 RequestError ToRequestError() {
@@ -53,6 +64,18 @@ RequestError ToRequestError() {
     return RequestError(ErrorCode::kIoError, error.what());
   } catch (const IndexError& error) {
     return RequestError(ErrorCode::kCorrupt, error.what());
+  } catch (const QuerySyntaxError& error) {
+    return ToRequestError(error);
+  } catch (const LimitExceededError& error) {
+    return RequestError(ErrorCode::kLimitExceeded, error.what(),
+                        LimitDetails(error.limit(), static_cast<int64_t>(error.most())));
+  } catch (const UnknownPluginError& error) {
+    return RequestError(ErrorCode::kUnknownPlugin,
+                        std::string(error.what()) + "; the command \"plugin_list\" lists those there are");
+  } catch (const SearchTimeoutError& error) {
+    return RequestError(ErrorCode::kTimeout, error.what());
+  } catch (const SearchError& error) {
+    return RequestError(ErrorCode::kBadRequest, error.what());
   } catch (const std::system_error& error) {
     return RequestError(ErrorCode::kIoError, error.what());
   } catch (const std::bad_alloc&) {

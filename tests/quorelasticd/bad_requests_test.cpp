@@ -71,7 +71,7 @@ TEST_F(BadRequestsTest, AnAnnouncementOfTooLongAMessageEndsTheConnection) {
     ASSERT_EQ(send(client.descriptor(), header.data(), header.size(), MSG_NOSIGNAL), 4);
     const JsonValue reply = client.Receive();
     EXPECT_EQ(reply["error"]["code"].asString(), "limit_exceeded");
-    EXPECT_EQ(reply["error"]["limit"].asString(), "message length");
+    EXPECT_EQ(reply["error"]["limit"].asString(), "message_bytes");
     EXPECT_TRUE(client.IsHungUp());
   }
 }
@@ -152,8 +152,8 @@ TEST_F(BadRequestsTest, RunningOutOfMemoryFailsTheRequestAndNotTheDaemon) {
 TEST_F(BadRequestsTest, NoMoreIndexesThanTheLimit) {
   for (int i = 0; i < 999; ++i) fs::create_directory(daemon_.data() + "/x" + std::to_string(i));
   DaemonClient client = Connect();
-  const JsonValue reply =
-      client.Ask(R"({"command":"index_create","data":{"id":"y","settings":{"fields":[]}}})");
+  const JsonValue reply = client.Ask(
+      R"({"command":"index_create","data":{"id":"y","settings":{"fields":[{"name":"text","type":"text"}]}}})");
   EXPECT_EQ(reply["error"]["code"].asString(), "limit_exceeded") << reply.toString();
   EXPECT_EQ(reply["error"]["most"].asInt(), 1000);
 }

@@ -105,7 +105,10 @@ std::vector<std::string> DaemonProcess::Notifications() {
 
 std::string DaemonProcess::Log() const { return ReadFile(log_); }
 
-void DaemonProcess::Signal(int signal) const { kill(pid_, signal); }
+void DaemonProcess::Signal(int signal) const {
+  // The number of a process that was waited for may be another's by now.
+  if (!has_ended_) kill(pid_, signal);
+}
 
 bool DaemonProcess::HasEnded() {
   int status = 0;

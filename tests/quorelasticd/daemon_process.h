@@ -31,6 +31,7 @@ class DaemonProcess {
   // What it logged so far.
   std::string Log() const;
 
+  // Does nothing where it was seen to end.
   void Signal(int signal) const;
 
   // Waits until it ends: its exit status, or minus the signal that ended it.

@@ -12,6 +12,7 @@
 #include "options.h"
 #include "protocol_document.h"
 #include "quordaemon/wire.h"
+#include "vantrel/elastic/search.h"
 
 namespace quorelasticd {
 namespace {
@@ -66,21 +67,33 @@ TEST_F(ProtocolTables, EveryErrorCodeIsDocumentedAsItIs) {
 }
 
 TEST_F(ProtocolTables, EveryLimitIsDocumentedAsItIs) {
-  const auto row = [](const std::string& name, int64_t most, const std::string& unit) {
+  const vantrel::elastic::SearchLimits search;
+  const auto row = [](const std::string& name, auto most, const std::string& unit) {
     return Row{Code(name), std::to_string(most), unit};
   };
   EXPECT_THAT(
       document_.sections.at("Limits").table,
       ::testing::ElementsAre(
-          row("message length", quordaemon::kLongestMessage, "bytes of a request"),
-          row("reply length", quordaemon::kLongestMessage, "bytes of a reply"),
-          row("JSON depth", kMostJsonDepth, "levels of a request"),
+          row("message_bytes", quordaemon::kLongestMessage, "bytes of a request"),
+          row("reply_bytes", quordaemon::kLongestMessage, "bytes of a reply"),
+          row("json_depth", kMostJsonDepth, "levels of a request"),
           row("connections", Options().max_connections, "at a time; an option of the daemon"),
-          row("indexes", kMostIndexes, "in the data folder"), row("request_id", kLongestRequestId, "bytes"),
-          row("data.settings.fields", kMostFields, "elements"),
+          row("stored_indexes", kMostIndexes, "in the data folder"),
+          row("request_id", kLongestRequestId, "bytes"), row("data.settings.fields", kMostFields, "elements"),
           row("data.settings.fields[N].name", kLongestFieldName, "bytes"),
           row("data.file", kLongestFileName, "bytes"), row("data.ids", kMostIds, "elements"),
-          row("data.ids[N]", kLongestDocumentId, "bytes")));
+          row("data.ids[N]", kLongestDocumentId, "bytes"), row("data.indice", search.indexes, "elements"),
+          row("data.filters", search.filters, "elements"), row("data.load_field", kMostFields, "elements"),
+          row("query_bytes", search.query_bytes, "bytes of a query"),
+          row("query_depth", search.query_depth, "parentheses within parentheses"),
+          row("query_clauses", search.query_clauses,
+              "terms looked up, each field of a word without a field counted"),
+          row("query_expansions", search.query_expansions,
+              "of these, the ones that go through a dictionary, such as patterns"),
+          row("pattern_characters", search.pattern_characters, "characters of one pattern"),
+          row("window", search.window, "`from` and `size` together"),
+          row("filter_values", search.filter_values, "values in one filter"),
+          row("result_bytes", search.result_bytes, "bytes of the values of all hits")));
 }
 
 TEST_F(ProtocolTables, TheFramingIsDocumentedAsItIs) {

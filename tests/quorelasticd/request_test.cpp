@@ -80,7 +80,7 @@ TEST(Request, TooDeepJsonNamesTheLimit) {
   for (const int levels : {1000, 2000, 1000000}) {
     const Request request = ParseRequest(Nested(levels));
     EXPECT_EQ(request.error->code(), ErrorCode::kLimitExceeded) << levels << request.error->reason();
-    EXPECT_EQ(request.error->details()["limit"].asString(), "JSON depth");
+    EXPECT_EQ(request.error->details()["limit"].asString(), "json_depth");
   }
   // Brackets within strings are none.
   const Request flat = ParseRequest(R"({"command":"\"[[[",)" + std::string(2000, '"'));

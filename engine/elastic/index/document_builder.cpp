@@ -75,7 +75,7 @@ Lucene::TermPtr DocumentBuilder::BuildId(const Document& document) const {
     if (id != nullptr) Refuse(id_field_, "the document has more than one id");
     id = &value;
   }
-  if (id == nullptr) Refuse(id_field_, "the document has no id");
+  if (id == nullptr || id->value.empty()) Refuse(id_field_, "the document has no id");
   return BuildId(id->value);
 }
 

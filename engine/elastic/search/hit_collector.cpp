@@ -33,7 +33,7 @@ void HitCollector::setScorer(const Lucene::ScorerPtr& scorer) { scorer_ = scorer
 void HitCollector::collect(int32_t document) {
   const FoundDocument found{scorer_->score(), index_, document_base_ + document};
   max_score_ = total_ == 0 ? found.score : std::max(max_score_, found.score);
-  if (++total_ % kDeadlineInterval == 0) CheckDeadline();
+  if (total_++ % kDeadlineInterval == 0) CheckDeadline();
   if (heap_.size() < most_kept_) {
     heap_.push_back(found);
     std::push_heap(heap_.begin(), heap_.end(), IsBetter);

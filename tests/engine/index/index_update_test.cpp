@@ -70,7 +70,7 @@ TEST_F(IndexUpdateTest, AnUpdateReplacesAllThatWereAddedWithTheId) {
 }
 
 TEST_F(IndexUpdateTest, IdsAreToldApartByEveryCharacter) {
-  const std::vector<std::string> ids = {"a", "A", "a ", " a", "", "ä", "a\xcc\x88", std::string("a\0b", 3)};
+  const std::vector<std::string> ids = {"a", "A", "a ", " a", " ", "ä", "a\xcc\x88", std::string("a\0b", 3)};
   for (const std::string& id : ids) index().Update(MakeDocument(id, "word"));
   EXPECT_EQ(Live("body", "word"), ids.size());
   for (const std::string& id : ids) index().Update(MakeDocument(id, "again"));
@@ -81,6 +81,7 @@ TEST_F(IndexUpdateTest, IdsAreToldApartByEveryCharacter) {
 TEST_F(IndexUpdateTest, ADocumentWithoutExactlyOneIdIsRefusedAndNothingIsReplaced) {
   index().Update(MakeDocument("a", "one"));
   EXPECT_EQ(Refusal({{{"body", "two"}}}), "field \"id\": the document has no id");
+  EXPECT_EQ(Refusal({{{"id", ""}, {"body", "two"}}}), "field \"id\": the document has no id");
   EXPECT_EQ(Refusal({{{"id", "a"}, {"id", "b"}}}), "field \"id\": the document has more than one id");
   EXPECT_THAT(Refusal({{{"id", "a"}, {"body", "\xff"}}}), HasSubstr("not valid UTF-8"));
   EXPECT_THAT(Refusal({{{"id", "a"}, {"colour", "red"}}}), HasSubstr("no field \"colour\""));
@@ -121,21 +122,23 @@ TEST_F(IndexUpdateTest, StatisticsTellTheNewestCommit) {
 
 TEST_F(IndexUpdateTest, AnalysingShowsTheTermsOfATextAndWhereTheyStand) {
   const auto tokens = index().Analyze("body", "Grüße, an 😀 Köln-Süd");
-  ASSERT_THAT(tokens, SizeIs(4));
+  ASSERT_THAT(tokens, SizeIs(5));
   EXPECT_EQ(tokens[0].text, "grüße");
   EXPECT_EQ(tokens[0].position, 0U);
   EXPECT_EQ(tokens[0].start, 0U);
   EXPECT_EQ(tokens[0].end, 5U);
   EXPECT_EQ(tokens[1].text, "an");
   EXPECT_EQ(tokens[1].position, 1U);
-  EXPECT_EQ(tokens[2].text, "köln");
-  EXPECT_EQ(tokens[2].start, 12U);
-  EXPECT_EQ(tokens[3].text, "süd");
-  EXPECT_EQ(tokens[3].position, 3U);
-  EXPECT_EQ(tokens[3].end, 20U);
+  EXPECT_EQ(tokens[2].text, "😀");
+  EXPECT_EQ(tokens[2].end, 11U);
+  EXPECT_EQ(tokens[3].text, "köln");
+  EXPECT_EQ(tokens[3].start, 12U);
+  EXPECT_EQ(tokens[4].text, "süd");
+  EXPECT_EQ(tokens[4].position, 4U);
+  EXPECT_EQ(tokens[4].end, 20U);
   index().Update(MakeDocument("a", "Grüße, an 😀 Köln-Süd"));
   index().Commit();
-  EXPECT_THAT(Terms(path(), "body"), ElementsAre("an", "grüße", "köln", "süd"));
+  EXPECT_THAT(Terms(path(), "body"), ElementsAre("an", "grüße", "köln", "süd", "😀"));
 }
 
 TEST_F(IndexUpdateTest, AnalysingAKeywordShowsItAsItIs) {

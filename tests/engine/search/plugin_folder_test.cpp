@@ -98,7 +98,7 @@ TEST_F(PluginFolderTest, WhatIsNoPluginIsRefused) {
 }
 
 TEST_F(PluginFolderTest, AFileThatOthersCanWriteIsRefused) {
-  for (const mode_t mode : {0664, 0646, 0666}) {
+  for (const mode_t mode : {0664u, 0646u, 0666u}) {
     Put(GOOD_PLUGIN, "longer.so", mode);
     EXPECT_THAT(Problem("longer.so"), HasSubstr("can be written by others"));
     std::filesystem::remove(folder_ / "longer.so");
@@ -107,7 +107,7 @@ TEST_F(PluginFolderTest, AFileThatOthersCanWriteIsRefused) {
 
 TEST_F(PluginFolderTest, AFolderThatOthersCanWriteIsRefused) {
   Put(GOOD_PLUGIN, "longer.so");
-  for (const mode_t mode : {0775, 0757, 01777}) {
+  for (const mode_t mode : {0775u, 0757u, 01777u}) {
     chmod(folder_.path().c_str(), mode);
     EXPECT_THAT(Problem(""), HasSubstr("can be written by others"));
   }

@@ -74,7 +74,7 @@ INSTANTIATE_TEST_SUITE_P(
         BadQuery{"one (two (three)", 4, "not closed"}, BadQuery{"one)", 3, "not opened"},
         BadQuery{"()", 1, "\")\" where a word"}, BadQuery{"(one))(", 5, "not opened"},
         BadQuery{"one \"two", 4, "a quote that is not closed"}, BadQuery{"größe \"", 6, "a quote"},
-        BadQuery{"one two\\", 4, "an escape without a character"}, BadQuery{"body:", 5, "the query ends"},
+        BadQuery{"one two\\", 7, "an escape without a character"}, BadQuery{"body:", 5, "the query ends"},
         BadQuery{":one", 0, "\":\" where a word"}, BadQuery{"body:one:two", 8, "\":\" where a word"},
         BadQuery{"one^", 4, "the query ends where a number"}, BadQuery{"one^x", 4, "a number is expected"},
         BadQuery{"one^-1", 4, "a number is expected"},
@@ -83,7 +83,7 @@ INSTANTIATE_TEST_SUITE_P(
         BadQuery{"one~1.0", 3, "below 1"}, BadQuery{"one^2~7", 5, "below 1"},
         BadQuery{"\"one two\"~1000001", 9, "a distance is a number up to"},
         BadQuery{"one~~", 4, "\"~\" where a word"}, BadQuery{"[one TO two", 11, "the end of the range"},
-        BadQuery{"[one TO]", 7, "a bound of the range"}, BadQuery{"{one TO two]", 11, "the range"},
+        BadQuery{"[one TO]", 7, "a bound of the range"}, BadQuery{"{one TO two]", 12, "the end of the range"},
         BadQuery{"[one two three]", 9, "the end of the range"}, BadQuery{"body:[", 6, "a bound of the range"},
         BadQuery{"one \\u12 x", 4, "four hexadecimal digits"}, BadQuery{"\\u0000", 0, "no character"},
         BadQuery{"\\ud83d", 0, "no character"}, BadQuery{"\"a\\uffff\"", 0, "no character"},
@@ -105,6 +105,7 @@ TEST_F(QueryErrorTest, TwentyThousandParenthesesNeverReachTheParser) {
   SearchLimits limits;
   limits.query_bytes = 1'000'000;
   limits.query_clauses = 1'000'000;
+  limits.query_expansions = 1'000'000;
   EXPECT_EQ(LimitError(std::string(20'000, '(') + "one" + std::string(20'000, ')'), limits).limit(),
             "query_depth");
   EXPECT_EQ(LimitError(Repeated("+(", 20'000), limits).limit(), "query_depth");

@@ -109,7 +109,7 @@ TEST(SearchTest, PagesPutTogetherAreTheWholeOrder) {
   const SearchResult whole = index->Search(Request("word"));
   ASSERT_THAT(whole.hits, SizeIs(57));
   EXPECT_EQ(whole.max_score, whole.hits.front().score);
-  for (const uint64_t size : {1, 5, 13, 100}) {
+  for (const uint64_t size : {1u, 5u, 13u, 100u}) {
     std::vector<std::string> pages;
     for (uint64_t from = 0; from < 60; from += size) {
       SearchRequest request = Request("word");

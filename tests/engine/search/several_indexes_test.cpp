@@ -51,8 +51,8 @@ class SplitIndexTest : public ::testing::Test {
 
   static std::string Words(std::mt19937& random, unsigned most) {
     std::string text;
-    for (unsigned i = random() % most; i < most; ++i) {
-      text += "w" + std::to_string(random() % 10 * (random() % 10)) + " ";
+    for (auto i = random() % most; i < most; ++i) {
+      text.append("w").append(std::to_string(random() % 10 * (random() % 10))).append(" ");
     }
     return text;
   }

@@ -4,7 +4,6 @@
 #include <string>
 
 #include "vantrel/elastic/export.h"
-#include "vantrel/elastic/index_files.h"
 
 namespace vantrel::elastic {
 
@@ -22,7 +21,7 @@ class FileDescriptor;
 class VANTREL_ELASTIC_EXPORT WriteLock {
  public:
   // A name that no file of the index library bears.
-  static constexpr const char* kFileName = kIndexLockFileName;
+  static constexpr const char* kFileName = "quorelastic.lock";
 
   // Takes the lock without waiting. Throws IndexLockedError where another holds it, IndexIoError where the
   // file can be neither opened nor created.
