@@ -60,12 +60,13 @@ int Serve(const Options& options) {
     spdlog::info("{}: {} search plugins", options.plugins, plugins.LoadFolder(options.plugins));
   }
   const auto threads = static_cast<size_t>(options.threads);
+  Turns quick_searches(static_cast<int>(options.threads) - 1);
   boost::asio::thread_pool search_threads(threads);
   boost::asio::thread_pool slow_threads(threads);
   IndexRegistry registry(root, slow_threads.get_executor());
   Statistics statistics;
   const Daemon daemon(registry, statistics,
-                      {plugins, search_threads.get_executor(), SearchTimeLimit(options)});
+                      {plugins, quick_searches, search_threads.get_executor(), SearchTimeLimit(options)});
   CommandService service(daemon);
   Server server(listener.Release(), service, LimitsOf(options), statistics.connections);
   TellReady(options.socket);

@@ -29,6 +29,17 @@ void Figures::AddRatio(const std::string& name, const Comparison& comparison, do
       "at most " + Fixed(most, 2), Verdict(comparison.ratio <= most));
 }
 
+void Figures::AddDifference(const std::string& name, const Comparison& comparison, double most_milliseconds) {
+  const double milliseconds = comparison.difference_seconds * 1e3;
+  Row(name, Milliseconds(comparison.ours), Milliseconds(comparison.peer), Fixed(milliseconds, 2) + " ms",
+      "at most " + Fixed(most_milliseconds, 2) + " ms", Verdict(milliseconds <= most_milliseconds));
+}
+
+void Figures::AddThroughput(const std::string& name, const Comparison& comparison, double least) {
+  Row(name, Milliseconds(comparison.ours), Milliseconds(comparison.peer), Fixed(1 / comparison.ratio, 2),
+      "at least " + Fixed(least, 2), Verdict(1 / comparison.ratio >= least));
+}
+
 void Figures::AddPeak(const std::string& name, int64_t bytes, int64_t most_bytes) {
   Row(name, "", "", Mebibytes(bytes), "under " + Mebibytes(most_bytes), Verdict(bytes < most_bytes));
 }

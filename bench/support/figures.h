@@ -15,6 +15,12 @@ class Figures {
   // A ratio of times; `most` is the target.
   void AddRatio(const std::string& name, const Comparison& comparison, double most);
 
+  // What one takes longer than the other.
+  void AddDifference(const std::string& name, const Comparison& comparison, double most_milliseconds);
+
+  // How many times the work that the peer does in the same time, an inverse ratio of times; `least` is the target.
+  void AddThroughput(const std::string& name, const Comparison& comparison, double least);
+
   // A peak of memory.
   void AddPeak(const std::string& name, int64_t bytes, int64_t most_bytes);
 

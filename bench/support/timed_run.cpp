@@ -80,6 +80,8 @@ Usage Median(const std::vector<Usage>& runs) {
 
 }  // namespace
 
+pid_t Start(const std::vector<std::string>& command) { return Start(command, STDOUT_FILENO); }
+
 Usage Run(const std::vector<std::string>& command) {
   int ends[2];
   if (pipe2(ends, O_CLOEXEC) != 0) Fail("cannot make a pipe", errno);
@@ -111,12 +113,14 @@ Comparison Compare(const std::vector<std::string>& ours, const std::vector<std::
   std::vector<Usage> our_runs;
   std::vector<Usage> peer_runs;
   std::vector<double> ratios;
+  std::vector<double> differences;
   for (int i = 0; i < runs; ++i) {
     our_runs.push_back(Run(ours));
     peer_runs.push_back(Run(peer));
     ratios.push_back(our_runs.back().wall_seconds / peer_runs.back().wall_seconds);
+    differences.push_back(our_runs.back().wall_seconds - peer_runs.back().wall_seconds);
   }
-  return {Median(our_runs), Median(peer_runs), Median(ratios)};
+  return {Median(our_runs), Median(peer_runs), Median(ratios), Median(differences)};
 }
 
 }  // namespace quorelastic::bench

@@ -1,5 +1,7 @@
 #pragma once
 
+#include <sys/types.h>
+
 #include <cstdint>
 #include <string>
 #include <vector>
@@ -14,6 +16,9 @@ struct Usage {
   uint64_t output_bytes = 0;
 };
 
+// Starts a program, with the standard streams of this one.
+pid_t Start(const std::vector<std::string>& command);
+
 // Runs a program to its end, with its standard output into a pipe that is read and thrown away. Throws
 // std::runtime_error where it cannot be started or does not end with status 0.
 Usage Run(const std::vector<std::string>& command);
@@ -27,6 +32,7 @@ struct Comparison {
   Usage ours;
   Usage peer;
   double ratio = 0;
+  double difference_seconds = 0;  // the median of A - B, pair by pair
 };
 
 Comparison Compare(const std::vector<std::string>& ours, const std::vector<std::string>& peer, int runs);

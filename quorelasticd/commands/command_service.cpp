@@ -52,19 +52,19 @@ class CommandExecution : public Execution {
   }
 
   Step Continue() {
-    const Outcome outcome = running_->Step();
+    Outcome outcome = running_->Step();
     switch (outcome.kind) {
       case Outcome::Kind::kNothing:
         return {};
       case Outcome::Kind::kProgress:
-        return {replies_.Progress(outcome.value), false};
+        return {replies_.Progress(std::move(outcome.value)), false};
       case Outcome::Kind::kResult:
         break;
     }
     running_.reset();  // lets go of its index before the client can know
-    if (!outcome.failure.has_value()) return {replies_.Result(outcome.value), true};
+    if (!outcome.failure.has_value()) return {replies_.Result(std::move(outcome.value)), true};
     ++daemon_.statistics().failed_requests;
-    return {replies_.Partial(outcome.value, *outcome.failure), true};
+    return {replies_.Partial(std::move(outcome.value), *outcome.failure), true};
   }
 
   Step Fail(const RequestError& error) {

@@ -7,6 +7,7 @@
 #include <cstdint>
 #include <utility>
 
+#include "base/turns.h"
 #include "data_root/index_registry.h"
 #include "vantrel/elastic/search_plugin.h"
 
@@ -23,7 +24,11 @@ struct Statistics {
 // What searches work with.
 struct Searching {
   const vantrel::elastic::SearchPluginRegistry& plugins;
-  boost::asio::any_io_executor executor;  // apart from that of writers, so that no merge delays a search
+  // Searches that are few run on the threads of their connections, which spares them two changes of thread. These
+  // are fewer turns than such threads: one is always left for everybody else.
+  Turns& quick_turns;
+  boost::asio::any_io_executor
+      executor;  // for the others; apart from writers, so that no merge delays a search
   std::chrono::milliseconds time_limit;
 };
 

@@ -14,35 +14,35 @@ void ReplyWriter::Describe(const Command* command, Json::Value request_id) {
   request_id_ = std::move(request_id);
 }
 
-std::string ReplyWriter::Progress(const Json::Value& progress) const {
-  return Finish(Start("progress", progress));
+std::string ReplyWriter::Progress(Json::Value progress) const {
+  return Finish(Start("progress", std::move(progress)));
 }
 
-std::string ReplyWriter::Result(const Json::Value& result) const {
-  return Finish(StartFinal(true, "result", result));
+std::string ReplyWriter::Result(Json::Value result) const {
+  return Finish(StartFinal(true, "result", std::move(result)));
 }
 
-std::string ReplyWriter::Partial(const Json::Value& result, const RequestError& error) const {
-  Json::Value reply = StartFinal(false, "result", result);
+std::string ReplyWriter::Partial(Json::Value result, const RequestError& error) const {
+  Json::Value reply = StartFinal(false, "result", std::move(result));
   reply["partial"] = true;
   reply["error"] = error.ToJson();
-  return Finish(reply);
+  return Finish(std::move(reply));
 }
 
 std::string ReplyWriter::Error(const RequestError& error) const {
   return Finish(StartFinal(false, "error", error.ToJson()));
 }
 
-Json::Value ReplyWriter::Start(const char* member, const Json::Value& value) const {
+Json::Value ReplyWriter::Start(const char* member, Json::Value value) const {
   Json::Value reply(Json::objectValue);
   if (command_ != nullptr) reply["command"] = command_->name;
   if (!request_id_.isNull()) reply["request_id"] = request_id_;
-  reply[member] = value;
+  reply[member].swap(value);
   return reply;
 }
 
-Json::Value ReplyWriter::StartFinal(bool success, const char* member, const Json::Value& value) const {
-  Json::Value reply = Start(member, value);
+Json::Value ReplyWriter::StartFinal(bool success, const char* member, Json::Value value) const {
+  Json::Value reply = Start(member, std::move(value));
   const auto taken = std::chrono::steady_clock::now() - start_;
   reply["took_ms"] =
       static_cast<Json::Int64>(std::chrono::duration_cast<std::chrono::milliseconds>(taken).count());
@@ -50,9 +50,9 @@ Json::Value ReplyWriter::StartFinal(bool success, const char* member, const Json
   return reply;
 }
 
-std::string ReplyWriter::Finish(const Json::Value& reply) const {
+std::string ReplyWriter::Finish(Json::Value reply) const {
   vantrel::elastic::JsonValue value;
-  static_cast<Json::Value&>(value) = reply;
+  value.swap(reply);
   std::string text = value.toString();
   if (text.size() <= quordaemon::kLongestMessage) return text;
   return Error(LimitExceeded("reply_bytes", quordaemon::kLongestMessage, "bytes"));

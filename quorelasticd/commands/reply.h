@@ -17,18 +17,18 @@ class ReplyWriter {
   // where it gave none.
   void Describe(const Command* command, Json::Value request_id);
 
-  std::string Progress(const Json::Value& progress) const;
-  std::string Result(const Json::Value& result) const;
+  std::string Progress(Json::Value progress) const;
+  std::string Result(Json::Value result) const;
 
   // No success, though a part was done.
-  std::string Partial(const Json::Value& result, const RequestError& error) const;
+  std::string Partial(Json::Value result, const RequestError& error) const;
 
   std::string Error(const RequestError& error) const;
 
  private:
-  Json::Value Start(const char* member, const Json::Value& value) const;
-  Json::Value StartFinal(bool success, const char* member, const Json::Value& value) const;
-  std::string Finish(const Json::Value& reply) const;
+  Json::Value Start(const char* member, Json::Value value) const;
+  Json::Value StartFinal(bool success, const char* member, Json::Value value) const;
+  std::string Finish(Json::Value reply) const;
 
   const Command* command_ = nullptr;
   Json::Value request_id_;

@@ -35,7 +35,8 @@ Json::Value ToJson(const std::vector<FieldValues>& fields) {
 
 class Search : public RunningCommand {
  public:
-  Search(const Daemon& daemon, const Json::Value& data) : daemon_(daemon) {
+  Search(const Daemon& daemon, const Json::Value& data)
+      : daemon_(daemon), quick_turn_(daemon.searching().quick_turns) {
     UseIndexes(data["indice"]);
     request_.query = data["query_string"]["query"].asString();
     request_.from = data.get("from", Json::UInt64{request_.from}).asUInt64();
@@ -47,7 +48,10 @@ class Search : public RunningCommand {
     for (const Json::Value& field : data["load_field"]) request_.load_fields->push_back(field.asString());
   }
 
-  boost::asio::any_io_executor executor() const override { return daemon_.searching().executor; }
+  boost::asio::any_io_executor executor() const override {
+    if (quick_turn_.is_taken()) return {};
+    return daemon_.searching().executor;
+  }
 
   Outcome Step() override {
     const SearchResult found = SearchIndexes(indexes_, request_, daemon_.searching().plugins);
@@ -96,6 +100,7 @@ class Search : public RunningCommand {
   }
 
   const Daemon& daemon_;
+  Turns::Turn quick_turn_;
   std::vector<std::shared_ptr<OpenIndex>> open_;
   std::vector<std::shared_ptr<vantrel::elastic::Index>> indexes_;
   SearchRequest request_;

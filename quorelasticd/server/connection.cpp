@@ -65,7 +65,7 @@ void Connection::ReadHeader() {
 
 void Connection::ReadPayload() {
   if (arrived_ == request_length_) {
-    timer_.cancel();
+    DisarmTimer();
     request_.resize(arrived_);
     if (finishing_) return RefuseRequest(service_.RefuseShuttingDown());
     execution_ = service_.Begin(std::exchange(request_, std::string()));
@@ -124,7 +124,7 @@ void Connection::WriteReply(std::string reply, bool finished) {
 }
 
 void Connection::AfterReply(bool finished) {
-  timer_.cancel();
+  DisarmTimer();
   reply_.clear();
   if (reply_.capacity() > kReadPiece) reply_.shrink_to_fit();
   if (refused_) return Linger();
@@ -159,12 +159,22 @@ bool Connection::HasArrived() const {
 }
 
 void Connection::ArmTimer(std::chrono::milliseconds limit) {
-  timer_.expires_after(limit);
+  deadline_ = Clock::now() + limit;
+  if (deadline_ < waiting_until_) WaitForDeadline();
+}
+
+void Connection::DisarmTimer() { deadline_ = Clock::time_point::max(); }
+
+void Connection::WaitForDeadline() {
+  waiting_until_ = deadline_;
+  timer_.expires_at(deadline_);
   timer_.async_wait([weak = weak_from_this()](error_code error) {
     if (error) return;
-    // The timer may have been armed anew after it fired, but before we came to run.
     const std::shared_ptr<Connection> self = weak.lock();
-    if (self != nullptr && self->timer_.expiry() <= std::chrono::steady_clock::now()) self->Close();
+    if (self == nullptr) return;
+    self->waiting_until_ = Clock::time_point::max();
+    if (self->deadline_ <= Clock::now()) return self->Close();
+    if (self->deadline_ < Clock::time_point::max()) self->WaitForDeadline();
   });
 }
 

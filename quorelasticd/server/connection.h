@@ -61,12 +61,20 @@ class Connection : public std::enable_shared_from_this<Connection> {
   bool HasArrived() const;
 
   void ArmTimer(std::chrono::milliseconds limit);
+  void DisarmTimer();
+  void WaitForDeadline();
   void Close();
 
   Socket socket_;
   Service& service_;
   ConnectionTimeouts timeouts_;
+
+  // What is under way is given up at the deadline. Deadlines move with every message, but seldom come: the timer is
+  // set anew only where it would fire too late, and looks at the deadline when it fires.
+  using Clock = std::chrono::steady_clock;
   boost::asio::steady_timer timer_;
+  Clock::time_point deadline_ = Clock::time_point::max();
+  Clock::time_point waiting_until_ = Clock::time_point::max();
 
   quordaemon::Header header_{};
   uint32_t request_length_ = 0;

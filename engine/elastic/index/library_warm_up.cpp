@@ -1,5 +1,10 @@
 #include "elastic/index/library_warm_up.h"
 
+#include <lucene++/LuceneHeaders.h>
+
+// Not without the headers above.
+#include <lucene++/SerialMergeScheduler.h>
+
 #include <mutex>
 #include <vector>
 
@@ -15,6 +20,8 @@ using Lucene::newLucene;
 Lucene::IndexReaderPtr WriteAndOpen(const Lucene::DirectoryPtr& directory) {
   const auto writer = newLucene<Lucene::IndexWriter>(directory, NewTextAnalyzer(), true,
                                                      Lucene::IndexWriter::MaxFieldLengthUNLIMITED);
+  // The default one leaves a thread behind, which could outlive the library's statics.
+  writer->setMergeScheduler(newLucene<Lucene::SerialMergeScheduler>());
   for (int i = 0; i < 3; ++i) {
     const auto document = newLucene<Lucene::Document>();
     document->add(newLucene<Lucene::Field>(L"text", L"one two three", Lucene::AbstractField::STORE_YES,

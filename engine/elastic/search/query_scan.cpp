@@ -43,6 +43,7 @@ class Tokens {
       : length_(query.size()),
         stream_(Lucene::newLucene<Lucene::FastCharStream>(Lucene::newLucene<Lucene::StringReader>(query))),
         manager_(Lucene::newLucene<Lucene::QueryParserTokenManager>(stream_)) {
+    manager_->ReInit(stream_);  // the constructor leaves what the lexer counts by as the memory had it
     Advance();
   }
 

@@ -54,6 +54,11 @@ struct BadQuery {
   const char* problem;
 };
 
+// Names the instances.
+std::ostream& operator<<(std::ostream& stream, const BadQuery& bad) {
+  return stream << ::testing::PrintToString(bad.query);
+}
+
 class BadQueryTest : public QueryErrorTest, public ::testing::WithParamInterface<BadQuery> {};
 
 TEST_P(BadQueryTest, IsRefusedWithThePlaceAndTheReason) {
