@@ -21,7 +21,9 @@ constexpr size_t kReadPiece = size_t{64} << 10;
 }  // namespace
 
 Connection::Connection(Socket socket, Service& service, const ConnectionTimeouts& timeouts)
-    : socket_(std::move(socket)), service_(service), timeouts_(timeouts), timer_(socket_.get_executor()) {}
+    : socket_(std::move(socket)), service_(service), timeouts_(timeouts), timer_(socket_.get_executor()) {
+  socket_.non_blocking(true);  // what can be done at once is, without a detour through the scheduler
+}
 
 void Connection::Start() {
   asio::post(socket_.get_executor(), [self = shared_from_this()] { self->ReadHeader(); });
@@ -64,23 +66,28 @@ void Connection::ReadHeader() {
 }
 
 void Connection::ReadPayload() {
-  if (arrived_ == request_length_) {
-    DisarmTimer();
-    request_.resize(arrived_);
-    if (finishing_) return RefuseRequest(service_.RefuseShuttingDown());
-    execution_ = service_.Begin(std::exchange(request_, std::string()));
-    return RunStep();
+  while (arrived_ < request_length_) {
+    // The announced length is believed only as far as bytes came; doubling keeps the copying linear.
+    const size_t room = std::min<size_t>(request_length_, std::max(arrived_ * 2, kReadPiece));
+    if (request_.size() < room) request_.resize(room);
+    error_code error;
+    arrived_ +=
+        socket_.read_some(asio::buffer(request_.data() + arrived_, request_.size() - arrived_), error);
+    if (error == asio::error::would_block) return AwaitPayload();
+    if (error) return Close();
   }
+  DisarmTimer();
+  request_.resize(arrived_);
+  if (finishing_) return RefuseRequest(service_.RefuseShuttingDown());
+  execution_ = service_.Begin(std::exchange(request_, std::string()));
+  RunStep();
+}
+
+void Connection::AwaitPayload() {
   ArmTimer(timeouts_.stalled);
-  // The announced length is believed only as far as bytes came; doubling keeps the copying linear.
-  const size_t room = std::min<size_t>(request_length_, std::max(arrived_ * 2, kReadPiece));
-  if (request_.size() < room) request_.resize(room);
-  socket_.async_read_some(asio::buffer(request_.data() + arrived_, request_.size() - arrived_),
-                          [self = shared_from_this()](error_code error, size_t got) {
-                            if (error) return self->Close();
-                            self->arrived_ += got;
-                            self->ReadPayload();
-                          });
+  socket_.async_wait(Socket::wait_read, [self = shared_from_this()](error_code error) {
+    error ? self->Close() : self->ReadPayload();
+  });
 }
 
 void Connection::RunStep() {
@@ -98,7 +105,12 @@ void Connection::AfterStep(Execution::Step step) {
   if (step.finished || !socket_.is_open()) execution_.reset();
   if (!socket_.is_open()) return;
   if (step.reply.has_value()) return WriteReply(std::move(*step.reply), step.finished);
-  // Posted, so that a long row of silent steps neither nests nor keeps this thread from others.
+  RunNextStep();
+}
+
+void Connection::RunNextStep() {
+  if (execution_->executor()) return RunStep();
+  // Posted, so that a long row of steps neither nests nor keeps this thread from others.
   asio::post(socket_.get_executor(), [self = shared_from_this()] { self->RunStep(); });
 }
 
@@ -106,15 +118,24 @@ void Connection::WriteReply(std::string reply, bool finished) {
   if (!socket_.is_open()) return;
   reply_ = std::move(reply);
   header_ = quordaemon::EncodeHeader(static_cast<uint32_t>(reply_.size()));
-  written_ = 0;
+  error_code error;
+  written_ = socket_.write_some(std::array{asio::buffer(header_), asio::buffer(reply_)}, error);
+  if (error && error != asio::error::would_block) return Close();
+  if (written_ == header_.size() + reply_.size()) return AfterReply(finished);
+  WriteRest(finished);
+}
+
+void Connection::WriteRest(bool finished) {
   ArmTimer(timeouts_.stalled);
-  const std::array<asio::const_buffer, 2> pieces{asio::buffer(header_), asio::buffer(reply_)};
+  const size_t of_header = std::min(written_, header_.size());
+  const std::array pieces{asio::buffer(header_) + of_header, asio::buffer(reply_) + (written_ - of_header)};
   asio::async_write(
       socket_, pieces,
-      [self = shared_from_this()](const error_code& error, size_t written) -> size_t {
+      [self = shared_from_this(), last = size_t{0}](const error_code& error,
+                                                    size_t written) mutable -> size_t {
         if (error) return 0;
-        if (written > self->written_) self->ArmTimer(self->timeouts_.stalled);
-        self->written_ = written;
+        if (written > last) self->ArmTimer(self->timeouts_.stalled);
+        last = written;
         return kReadPiece;
       },
       [self = shared_from_this(), finished](error_code error, size_t) {
@@ -128,7 +149,7 @@ void Connection::AfterReply(bool finished) {
   reply_.clear();
   if (reply_.capacity() > kReadPiece) reply_.shrink_to_fit();
   if (refused_) return Linger();
-  finished ? ReadHeader() : RunStep();
+  finished ? ReadHeader() : RunNextStep();
 }
 
 void Connection::RefuseRequest(std::string reply) {

@@ -49,9 +49,12 @@ class Connection : public std::enable_shared_from_this<Connection> {
  private:
   void ReadHeader();
   void ReadPayload();
+  void AwaitPayload();
   void RunStep();
+  void RunNextStep();
   void AfterStep(Execution::Step step);
   void WriteReply(std::string reply, bool finished);
+  void WriteRest(bool finished);
   void AfterReply(bool finished);
   void RefuseRequest(std::string reply);
   void Linger();
