@@ -17,13 +17,14 @@ using ::quorelastic::testing::ThrowOutOfPageCache;
 using ::quorelastic::testing::WriteFile;
 
 constexpr uint64_t kMebibyte = uint64_t{1} << 20;
+constexpr uint64_t kFileSize = 12 * kMebibyte + 1000;  // more than is read at once
 
 class PageCacheTest : public ::testing::Test {
  protected:
   void SetUp() override {
     std::filesystem::create_directory(folder_ / "index");
     for (const char* name : {"segments_1", "_0.tii", "_0.frq", "_0.fdt"}) {
-      WriteFile(Path(name), std::string(4 * kMebibyte + 1000, 'x'));
+      WriteFile(Path(name), std::string(kFileSize, 'x'));
     }
     if (!ThrowOutOfPageCache(folder_.path())) {
       GTEST_SKIP() << "files cannot be thrown out of the page cache on the file system of " << folder_.path();
@@ -44,13 +45,13 @@ class PageCacheTest : public ::testing::Test {
 TEST_F(PageCacheTest, HoldsEveryPageOnceItIsWarm) {
   const PageCacheWarmUp result = WarmPageCache(folder_.path());
   for (const char* name : {"segments_1", "_0.tii", "_0.frq", "_0.fdt"}) EXPECT_TRUE(IsResident(name)) << name;
-  EXPECT_EQ(result.bytes, 4 * (4 * kMebibyte + 1000));
+  EXPECT_EQ(result.bytes, 4 * kFileSize);
   EXPECT_TRUE(result.is_whole);
 }
 
 TEST_F(PageCacheTest, IsFilledNoFurtherThanThereIsRoomAndWithTheFirstThings) {
-  const PageCacheWarmUp result = BringIn(PlanWarmUp(folder_.path()), 6 * kMebibyte);
-  EXPECT_EQ(result.bytes, 6 * kMebibyte);
+  const PageCacheWarmUp result = BringIn(PlanWarmUp(folder_.path()), kFileSize + 2 * kMebibyte);
+  EXPECT_EQ(result.bytes, kFileSize + 2 * kMebibyte);
   EXPECT_FALSE(result.is_whole);
   EXPECT_TRUE(IsResident("_0.tii"));
   EXPECT_FALSE(IsResident("_0.frq"));
@@ -80,7 +81,7 @@ TEST_F(PageCacheTest, FilesThatAreGoneOrShrankArePassedOver) {
   std::filesystem::resize_file(Path("_0.frq"), kMebibyte);
   plan.push_back({folder_.path(), 0, 4096});
   const PageCacheWarmUp result = BringIn(plan, 1024 * kMebibyte);
-  EXPECT_EQ(result.bytes, kMebibyte + 2 * (4 * kMebibyte + 1000));
+  EXPECT_EQ(result.bytes, kMebibyte + 2 * kFileSize);
   EXPECT_TRUE(result.is_whole);
   EXPECT_TRUE(IsResident("_0.fdt"));
 }

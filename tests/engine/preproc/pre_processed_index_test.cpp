@@ -1,6 +1,10 @@
 #include <gmock/gmock.h>
 #include <gtest/gtest.h>
 
+#include <algorithm>
+#include <tuple>
+#include <utility>
+
 #include "engine/index/read_back.h"
 #include "support/expect_damage.h"
 #include "support/files.h"
@@ -22,6 +26,7 @@ using ::quorelastic::testing::WriteFile;
 using ::testing::ElementsAre;
 using ::testing::HasSubstr;
 using ::testing::IsEmpty;
+using ::testing::Pair;
 
 const std::vector<PreProcSettings> kLower = {{"tolower", ""}};
 const std::vector<PreProcSettings> kBigrams = {{"ngram", "2"}};
@@ -132,6 +137,14 @@ TEST_F(PreProcessedIndexTest, AnalyzeShowsWhatIsIndexed) {
   EXPECT_EQ(tokens.at(2).end, 6U);
 }
 
+TEST_F(PreProcessedIndexTest, GramsThatBeginTogetherAreIndexedAtOnePosition) {
+  Make(Field(FieldType::kText, {{"ngram", "2,3"}}), {});
+  std::vector<std::pair<std::string, uint64_t>> found;
+  for (const AnalyzedToken& token : index_->Analyze("f", "abc xy"))
+    found.emplace_back(token.text, token.position);
+  EXPECT_THAT(found, ElementsAre(Pair("ab", 0), Pair("abc", 0), Pair("bc", 1), Pair("xy", 2)));
+}
+
 TEST_F(PreProcessedIndexTest, AnalyzeShowsAKeywordWithItsCharacters) {
   Make(Field(FieldType::kKeyword, kLower), {});
   EXPECT_THAT(Analyze("\xc3\x84 B"), ElementsAre("\xc3\xa4 b"));
@@ -162,14 +175,15 @@ TEST_F(PreProcessedIndexTest, AWordTooShortForAnyGramIsToldAbout) {
 TEST_F(PreProcessedIndexTest, EachGramOfAQueryCountsAsAClause) {
   SearchLimits limits;
   limits.query_clauses = 10;
-  for (const char* lengths : {"2", "2,3"}) {
-    const std::string path = folder_ / lengths;
-    const auto index = Index::Create(path, {.fields = {Field(FieldType::kText, {{"ngram", lengths}})}});
+  for (const auto& [lengths, fits, exceeds] :
+       {std::tuple{"2", "abcdefghijk", "abcdefghijkl"}, {"2,3", "abcdef", "abcdefg"}}) {
+    const auto index =
+        Index::Create(folder_ / lengths, {.fields = {Field(FieldType::kText, {{"ngram", lengths}})}});
     index->Commit();
     SearchRequest request;
-    request.query = "f:abcdef";
+    request.query = std::string("f:").append(fits);
     EXPECT_NO_THROW(index->Search(request, SearchPluginRegistry::BuiltIn(), limits)) << lengths;
-    request.query = "f:abcdefghijklm";
+    request.query = std::string("f:").append(exceeds);
     EXPECT_THROW(index->Search(request, SearchPluginRegistry::BuiltIn(), limits), LimitExceededError)
         << lengths;
   }

@@ -16,7 +16,6 @@ namespace {
 
 using ::quorelastic::testing::ByteWriter;
 using ::quorelastic::testing::ExpectDamage;
-using ::quorelastic::testing::ExpectIndexError;
 using ::quorelastic::testing::ListFolder;
 using ::quorelastic::testing::ReadFile;
 using ::quorelastic::testing::TemporaryFolder;
