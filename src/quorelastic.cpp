@@ -21,19 +21,16 @@
 //
 //   quorelastic -a term -d /var/lib/quorelastic/mail --info -f subject -m 20
 //   quorelastic -a doc_term -d /var/lib/quorelastic/mail -f subject -n 7
-//   quorelastic -a check -d /var/lib/quorelastic/mail
 //
 // How a run ends:
 //
-//   status 0      the action's body returned, whatever it printed: errors of the daemon, a failed connection,
-//                 the exceptions that "position", "doc_term" and "term_suggest" report
+//   status 0      the action's body returned, whatever it printed: also where it reported an error itself
 //   status 1      a command-line error, --help, or no known action word; standard error has the usage text
 //   abort         an exception left a body; nothing catches it, the runtime names it on standard error
 //
 // Options are read by the C library's parser, which words its own diagnostics; a last occurrence wins, and
-// words that belong to no option are passed over. What one run needs is held by main and handed to the
-// bodies; what bodies everywhere read (--field, --info, --max, --size, --offset) is held by the process, see
-// option_set.h. Nothing is checked while options are parsed: what an action cannot use, it rejects itself.
+// words that belong to no option are passed over. Where the values are kept, option_set.h tells. Nothing is
+// checked while options are parsed: what an action cannot use, it rejects itself.
 //
 // A rejected option value is logged with the line of its check in this file. Scripts that read the system log
 // know those lines; static assertions beside the checks hold them in place.
@@ -54,8 +51,11 @@
 #include "inspect/document_terms.h"
 #include "inspect/term_dump.h"
 #include "inspect/term_positions.h"
+#include "memory/occupy_memory.h"
 #include "option_set.h"
+#include "suggest/term_suggestions.h"
 #include "vantrel/elastic/json_value.h"
+#include "vantrel/elastic/vm_touch.h"
 
 namespace {
 
@@ -296,11 +296,11 @@ bool RunAction(const OptionSet& options) {
   } else if (action == "position") {
     ShowTermPositions(options.db, OptionSet::field, options.token, options.ndoc);
   } else if (action == "term_suggest") {
-    NotBuiltYet("term_suggest");
+    ShowSuggestions(options.db, OptionSet::field, options.token);
   } else if (action == "doc_term") {
     ShowDocTerms(options.db, OptionSet::field, options.ndoc);
   } else if (action == "occupy_mem") {
-    NotBuiltYet("occupy_mem");
+    OccupyMemory(static_cast<uint32_t>(OptionSet::size));
   } else if (action == "check") {
     Check(options.db);
   } else if (action == "repair") {
@@ -308,7 +308,7 @@ bool RunAction(const OptionSet& options) {
   } else if (action == "plugin") {
     // Accepted, and does nothing.
   } else if (action == "vmtouch") {
-    NotBuiltYet("vmtouch");
+    vantrel::elastic::VMTouch();
   } else {
     return false;
   }

@@ -6,6 +6,7 @@
 
 #include <iostream>
 
+#include "error/report_lucene_errors.h"
 #include "inspect/index_reader.h"
 
 namespace {

@@ -7,6 +7,7 @@
 #include <algorithm>
 #include <iostream>
 
+#include "error/report_lucene_errors.h"
 #include "inspect/index_reader.h"
 
 namespace {

@@ -1,6 +1,6 @@
 // Pieces of the tool, apart from the program.
 
-#include "inspect/index_reader.h"
+#include "error/report_lucene_errors.h"
 
 #include <gtest/gtest.h>
 #include <lucene++/LuceneHeaders.h>

@@ -14,8 +14,17 @@ namespace vantrel::elastic::format {
 //   the sub-files in the order of the table, without gaps, the last up to the end
 class CompoundFile {
  public:
+  // Where a sub-file stands.
+  struct Part {
+    uint64_t offset;
+    uint64_t size;
+  };
+
   // Reads the table. Throws IndexDamagedError, IndexIoError.
   explicit CompoundFile(std::shared_ptr<const ByteSource> source);
+
+  // By name.
+  const std::map<std::string, Part>& parts() const { return parts_; }
 
   bool Exists(const std::string& name) const { return parts_.contains(name); }
 
@@ -23,11 +32,6 @@ class CompoundFile {
   std::shared_ptr<const ByteSource> Open(const std::string& name) const;
 
  private:
-  struct Part {
-    uint64_t offset;
-    uint64_t size;
-  };
-
   std::shared_ptr<const ByteSource> source_;
   std::map<std::string, Part> parts_;
 };

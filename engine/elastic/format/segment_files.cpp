@@ -49,4 +49,17 @@ SegmentFiles OpenSegment(const Folder& folder, SegmentInfo info, Need need) {
   return files;
 }
 
+std::vector<SegmentFiles> OpenNewestSegments(const Folder& folder, Need need) {
+  std::vector<SegmentFiles> opened;
+  UseNewestCommit(folder, [&](Commit commit) {
+    // Apart, so that a failure closes what is open before another commit is tried.
+    std::vector<SegmentFiles> segments;
+    for (SegmentInfo& segment : commit.segments) {
+      segments.push_back(OpenSegment(folder, std::move(segment), need));
+    }
+    opened = std::move(segments);
+  });
+  return opened;
+}
+
 }  // namespace vantrel::elastic::format

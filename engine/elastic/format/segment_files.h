@@ -3,6 +3,7 @@
 #include <exception>
 #include <memory>
 #include <string>
+#include <vector>
 
 #include "elastic/format/byte_source.h"
 #include "elastic/format/commit.h"
@@ -28,5 +29,9 @@ enum class Need { kAll, kTerms };
 
 // Throws IndexError where a file is missing or cannot be opened.
 SegmentFiles OpenSegment(const Folder& folder, SegmentInfo info, Need need = Need::kAll);
+
+// The same for every segment of the folder's newest commit, also where a writer replaces it meanwhile. Throws
+// IndexError.
+std::vector<SegmentFiles> OpenNewestSegments(const Folder& folder, Need need);
 
 }  // namespace vantrel::elastic::format

@@ -12,7 +12,6 @@ namespace {
 // Format numbers, each named after what it brought.
 constexpr int32_t kWithFormat = -1;
 constexpr int32_t kWithSkipLevels = -3;
-constexpr int32_t kWithUtf8 = -4;
 
 constexpr int32_t kNeverSkips = std::numeric_limits<int32_t>::max();
 constexpr size_t kBufferSize = size_t{64} << 10;
@@ -30,7 +29,7 @@ TermCursor::TermCursor(std::shared_ptr<const ByteSource> source, File file, uint
 
 void TermCursor::ReadHeader() {
   const int32_t first = reader_.ReadInt();
-  if (first < kWithUtf8) {
+  if (first < kUtf8Format) {
     reader_.Damaged(0, "format is " + std::to_string(first) + ", but -4 is the newest known");
   }
   format_ = first < 0 ? first : 0;
@@ -64,12 +63,36 @@ bool TermCursor::Next() {
     if (reader_.remaining() == 0) return false;
     Damaged("terms end here, but the file goes on to " + std::to_string(reader_.size()));
   }
-  format_ == kWithUtf8 ? ReadUtf8Text() : ReadUtf16Text();
+  is_utf8() ? ReadUtf8Text() : ReadUtf16Text();
   ReadField();
   ReadInfo();
   if (file_ == File::kIndex) dictionary_pointer_ = Advanced(dictionary_pointer_);
   ++walked_;
   return true;
+}
+
+void TermCursor::CopyPlace(TermPlace& place) const {
+  place.field = field_;
+  place.text = text_;
+  place.units = units_;
+  place.info = info_;
+  place.dictionary_pointer = dictionary_pointer_;
+}
+
+void TermCursor::Resume(const TermPlace& place, uint64_t walked) {
+  if (place.dictionary_pointer > reader_.size() || walked > count_) {
+    reader_.Damaged(place.dictionary_pointer, "the index over this dictionary places term " +
+                                                  std::to_string(walked) + " of " + std::to_string(count_) +
+                                                  " here, in a file of " + std::to_string(reader_.size()) +
+                                                  " bytes");
+  }
+  reader_.Seek(place.dictionary_pointer);
+  walked_ = walked;
+  field_ = place.field;
+  text_ = place.text;
+  units_ = place.units;
+  text_is_stale_ = !is_utf8();
+  info_ = place.info;
 }
 
 void TermCursor::ReadUtf8Text() {

@@ -18,6 +18,15 @@ struct TermInfo {
   uint32_t skip_offset = 0;        // of the skip data, from postings_pointer; 0 where the term has none
 };
 
+// A place in a dictionary, as the index over it tells: behind a term, whose numbers and text the next one builds on.
+struct TermPlace {
+  int32_t field = -1;
+  std::string text;      // in the layout of today,
+  std::u16string units;  // or in the older ones
+  TermInfo info;
+  uint64_t dictionary_pointer = 0;  // where the next term begins
+};
+
 // Walks a term dictionary (.tis) or the index over it (.tii), which holds every n-th term of the dictionary.
 // Memory does not grow with the number of terms. For one thread at a time. Layout, by format F (the newer the
 // smaller; -4 is written today):
@@ -46,6 +55,7 @@ class TermCursor {
   uint64_t count() const { return count_; }
   int32_t index_interval() const { return index_interval_; }
   int32_t skip_interval() const { return skip_interval_; }
+  bool is_utf8() const { return format_ == kUtf8Format; }  // the layout of today, sorted by bytes
 
   // Moves to the next term, at first to the first one; false at the end. At the end it is checked that the
   // file ends there too.
@@ -61,6 +71,14 @@ class TermCursor {
   const TermInfo& info() const { return info_; }
   uint64_t dictionary_pointer() const { return dictionary_pointer_; }  // in .tii only
 
+  // Copies the place that the entry at the cursor tells; in .tii only.
+  void CopyPlace(TermPlace& place) const;
+
+  // Moves to a place in this dictionary, behind the first `walked` of its terms; Next() goes on from there. Throws
+  // IndexDamagedError where the dictionary has no such place. A place that lies between terms by mistake shows as
+  // damage or as wrong terms, as wrong bytes of a dictionary do.
+  void Resume(const TermPlace& place, uint64_t walked);
+
   // Where the term at the cursor begins, and throws IndexDamagedError about it.
   uint64_t offset() const { return term_offset_; }
   [[noreturn]] void Damaged(const std::string& problem) const { reader_.Damaged(term_offset_, problem); }
@@ -74,6 +92,8 @@ class TermCursor {
   void ReadInfo();
   bool HasSkipOffset() const;
   uint64_t Advanced(uint64_t pointer);
+
+  static constexpr int32_t kUtf8Format = -4;
 
   ByteReader reader_;
   File file_;

@@ -3,8 +3,10 @@
 #include <utility>
 
 #include "elastic/format/quoted.h"
+#include "elastic/index/field_analyzer.h"
 #include "elastic/index/index_text.h"
 #include "elastic/index/text_analyzer.h"
+#include "elastic/preproc/pre_proc_chain.h"
 #include "vantrel/elastic/index_error.h"
 
 namespace vantrel::elastic {
@@ -35,7 +37,7 @@ Lucene::FieldPtr NewField(const FieldSettings& settings, const std::wstring& nam
                           const std::wstring& value) {
   const auto field = Lucene::newLucene<Lucene::Field>(
       name, value, settings.stored ? AbstractField::STORE_YES : AbstractField::STORE_NO,
-      settings.type == FieldType::kText ? AbstractField::INDEX_ANALYZED : AbstractField::INDEX_NOT_ANALYZED,
+      IsAnalyzed(settings) ? AbstractField::INDEX_ANALYZED : AbstractField::INDEX_NOT_ANALYZED,
       ToLibrary(settings.term_vector));
   field->setOmitNorms(!settings.norms);
   field->setOmitTermFreqAndPositions(!settings.frequencies);
@@ -49,20 +51,20 @@ DocumentBuilder::DocumentBuilder(std::string folder, const IndexSettings& settin
   for (const FieldSettings& field : settings.fields) {
     std::wstring wide_name;
     ToIndexText(field.name, wide_name);
-    fields_.emplace(field.name, Field{field, std::move(wide_name)});
+    fields_.emplace(field.name, Field{field, std::move(wide_name), MostGrowth(field.pre_processors)});
   }
 }
 
 Lucene::DocumentPtr DocumentBuilder::Build(const Document& document) const {
   size_t size = 0;
   for (const DocumentField& value : document.fields) size += value.value.size();
-  if (size > kLargestDocument) {
-    throw IndexValueError(folder_, "a document of " + std::to_string(size) + " bytes is larger than " +
-                                       std::to_string(kLargestDocument) + ", the most that is taken");
-  }
+  CheckSize("a document of ", size);
+  size_t indexed_size = 0;
   const auto built = Lucene::newLucene<Lucene::Document>();
   for (const DocumentField& value : document.fields) {
     const Field& field = Find(value.name);
+    indexed_size += value.value.size() * field.most_growth;
+    CheckSize("a document whose pre-processors may make of it ", indexed_size);
     built->add(NewField(field.settings, field.wide_name, CheckedValue(field, value.value)));
   }
   return built;
@@ -101,19 +103,26 @@ std::wstring DocumentBuilder::CheckedValue(const Field& field, std::string_view 
   if (const char* problem = ToIndexText(value, wide)) {
     Refuse(field.settings.name, std::string("the value ") + problem);
   }
-  if (field.settings.type == FieldType::kKeyword) {
-    if (wide.size() <= kLongestTerm) return wide;
+  const bool is_keyword = field.settings.type == FieldType::kKeyword;
+  if (is_keyword && wide.size() > kLongestTerm) {
     Refuse(field.settings.name, "the value has " + std::to_string(wide.size()) +
                                     " characters; a keyword has at most " + std::to_string(kLongestTerm));
   }
-  if (wide.find(L'\0') != std::wstring::npos) {
+  if (IsAnalyzed(field.settings) && wide.find(L'\0') != std::wstring::npos) {
     Refuse(field.settings.name, "the value holds U+0000, after which a text is not indexed");
   }
+  if (is_keyword) return wide;
   if (const size_t length = FindTooLongWord(wide); length > 0) {
     Refuse(field.settings.name, "the value holds a word of " + std::to_string(length) +
                                     " characters; a word has at most " + std::to_string(kLongestTerm));
   }
   return wide;
+}
+
+void DocumentBuilder::CheckSize(const std::string& what, size_t size) const {
+  if (size <= kLargestDocument) return;
+  throw IndexValueError(folder_, what + std::to_string(size) + " bytes is larger than " +
+                                     std::to_string(kLargestDocument) + ", the most that is taken");
 }
 
 void DocumentBuilder::Refuse(std::string_view field, const std::string& problem) const {

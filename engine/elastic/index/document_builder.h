@@ -35,9 +35,11 @@ class DocumentBuilder {
   struct Field {
     FieldSettings settings;
     std::wstring wide_name;
+    uint64_t most_growth;
   };
 
   const Field& Find(std::string_view name) const;
+  void CheckSize(const std::string& what, size_t size) const;
   std::wstring CheckedValue(const Field& field, std::string_view value) const;
   [[noreturn]] void Refuse(std::string_view field, const std::string& problem) const;
 

@@ -92,31 +92,38 @@ IndexSettings WithIdField(IndexSettings settings) {
 
 class Index::Impl {
  public:
-  Impl(std::string path, IndexSettings settings)
-      : path_(std::move(path)),
-        settings_(std::move(settings)),
-        builder_(path_, settings_),
-        snapshots_(path_) {}
+  explicit Impl(std::string path) : path_(std::move(path)), snapshots_(path_) {}
 
   const std::string& path() const { return path_; }
-  const IndexSettings& settings() const { return settings_; }
-  const DocumentBuilder& builder() const { return builder_; }
-  SnapshotKeeper& snapshots() { return snapshots_; }
+  const IndexSettings& settings() { return Opened().settings; }
+  const DocumentBuilder& builder() { return Opened().builder; }
+
+  // Opens the index, unless it is open.
+  void Open() { Opened(); }
+
+  // With settings that are known already.
+  void Open(const IndexSettings& settings) { open_.emplace(path_, settings); }
+
+  std::shared_ptr<const Snapshot> NewestSnapshot() {
+    Open();
+    return snapshots_.Newest();
+  }
 
   void StartWriting(WriteLock lock, LibraryWriter::Start start) {
     lock_ = std::move(lock);
-    writer_.emplace(path_, *lock_, settings_.compound_files, start);
+    writer_.emplace(path_, *lock_, settings(), start);
   }
 
   // Runs `operation` on the writer, which is opened first where need be. A writer that failed is given up. One
   // thread at a time gets here.
   template <typename Operation>
   void Write(Operation operation) {
+    Open();
     const std::lock_guard guard(write_mutex_);
     if (!lock_.has_value()) lock_.emplace(path_);
     if (!writer_.has_value()) {
       CheckCommit();
-      writer_.emplace(path_, *lock_, settings_.compound_files, LibraryWriter::Start::kExistingIndex);
+      writer_.emplace(path_, *lock_, settings(), LibraryWriter::Start::kExistingIndex);
     }
     RunWriter(operation);
   }
@@ -152,6 +159,26 @@ class Index::Impl {
   }
 
  private:
+  struct OpenedIndex {
+    OpenedIndex(const std::string& path, const IndexSettings& read)
+        : settings(read), builder(path, settings) {}
+
+    const IndexSettings settings;
+    const DocumentBuilder builder;
+  };
+
+  const OpenedIndex& Opened() {
+    const std::lock_guard guard(open_mutex_);
+    if (!open_.has_value()) {
+      PrepareIndexLibrary();
+      WarmUpIndexLibrary();
+      CheckPath(path_);
+      CheckCommit();
+      open_.emplace(path_, ReadSettings(path_));
+    }
+    return *open_;
+  }
+
   template <typename Operation>
   void RunWriter(Operation operation) {
     try {
@@ -164,10 +191,10 @@ class Index::Impl {
   }
 
   const std::string path_;
-  const IndexSettings settings_;
-  const DocumentBuilder builder_;
   SnapshotKeeper snapshots_;
-  std::mutex write_mutex_;  // for what follows
+  std::mutex open_mutex_;
+  std::optional<OpenedIndex> open_;  // once it is there, it stays
+  std::mutex write_mutex_;           // for what follows
   std::optional<WriteLock> lock_;
   std::optional<LibraryWriter> writer_;  // after the lock: it must go first
   bool has_changes_ = false;             // that are not committed
@@ -188,17 +215,20 @@ std::shared_ptr<Index> Index::Create(const std::string& path, const IndexSetting
   if (HoldsIndexFiles(path)) throw IndexExistsError(path);
   RemoveCutShortCommit(path);
   WriteSettings(path, settings);
-  auto impl = std::make_unique<Impl>(path, settings);
+  auto impl = std::make_unique<Impl>(path);
+  impl->Open(settings);
   impl->StartWriting(std::move(lock), LibraryWriter::Start::kEmptyIndex);
   return std::shared_ptr<Index>(new Index(std::move(impl)));
 }
 
 std::shared_ptr<Index> Index::Open(const std::string& path) {
-  PrepareIndexLibrary();
-  WarmUpIndexLibrary();
-  CheckPath(path);
-  format::UseNewestCommit(format::DiskFolder(path), [](const format::Commit&) {});
-  return std::shared_ptr<Index>(new Index(std::make_unique<Impl>(path, ReadSettings(path))));
+  std::shared_ptr<Index> index = OpenLater(path);
+  index->impl_->Open();
+  return index;
+}
+
+std::shared_ptr<Index> Index::OpenLater(const std::string& path) {
+  return std::shared_ptr<Index>(new Index(std::make_unique<Impl>(path)));
 }
 
 Index::Index(std::unique_ptr<Impl> impl) : impl_(std::move(impl)) {}
@@ -239,9 +269,7 @@ IndexStatistics Index::Statistics() const { return ReadStatistics(format::DiskFo
 
 std::vector<AnalyzedToken> Index::Analyze(std::string_view field, std::string_view value) const {
   const std::wstring checked = impl_->builder().CheckValue(field, value);
-  const auto known = std::find_if(settings().fields.begin(), settings().fields.end(),
-                                  [&](const FieldSettings& settings) { return settings.name == field; });
-  return AnalyzeValue(known->type, checked);
+  return AnalyzeValue(settings(), field, checked);
 }
 
 SearchResult Index::Search(const SearchRequest& request, const SearchPluginRegistry& plugins,
@@ -249,6 +277,6 @@ SearchResult Index::Search(const SearchRequest& request, const SearchPluginRegis
   return RunSearch({{path(), settings(), NewestSnapshot()}}, request, plugins, limits);
 }
 
-std::shared_ptr<const Snapshot> Index::NewestSnapshot() const { return impl_->snapshots().Newest(); }
+std::shared_ptr<const Snapshot> Index::NewestSnapshot() const { return impl_->NewestSnapshot(); }
 
 }  // namespace vantrel::elastic

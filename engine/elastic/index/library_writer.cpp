@@ -7,7 +7,7 @@
 #include <exception>
 #include <utility>
 
-#include "elastic/index/text_analyzer.h"
+#include "elastic/index/field_analyzer.h"
 
 namespace vantrel::elastic {
 namespace {
@@ -20,20 +20,22 @@ constexpr double kBufferMegabytes = 64;
 
 }  // namespace
 
-LibraryWriter::LibraryWriter(std::string folder, const WriteLock& /*lock*/, bool compound_files, Start start)
+LibraryWriter::LibraryWriter(std::string folder, const WriteLock& /*lock*/, const IndexSettings& settings,
+                             Start start)
     : folder_(std::move(folder)) {
-  Run("cannot open the index for writing", [&] { Open(compound_files, start); });
+  Run("cannot open the index for writing", [&] { Open(settings, start); });
 }
 
 LibraryWriter::~LibraryWriter() { RollBack(); }
 
-void LibraryWriter::Open(bool compound_files, Start start) {
+void LibraryWriter::Open(const IndexSettings& settings, Start start) {
   directory_ = newLucene<DiskDirectory>(folder_);
-  writer_ = newLucene<Lucene::IndexWriter>(directory_, NewTextAnalyzer(), start == Start::kEmptyIndex,
-                                           Lucene::IndexWriter::MaxFieldLengthUNLIMITED);
+  writer_ =
+      newLucene<Lucene::IndexWriter>(directory_, NewFieldAnalyzer(settings), start == Start::kEmptyIndex,
+                                     Lucene::IndexWriter::MaxFieldLengthUNLIMITED);
   const auto policy = newLucene<Lucene::LogByteSizeMergePolicy>(writer_);
-  policy->setUseCompoundFile(compound_files);
-  policy->setUseCompoundDocStore(compound_files);
+  policy->setUseCompoundFile(settings.compound_files);
+  policy->setUseCompoundDocStore(settings.compound_files);
   policy->setNoCFSRatio(1.0);  // also for segments that make up most of the index
   writer_->setMergePolicy(policy);
   // Merges on the caller's thread: the library's background merges report failures to nobody.

@@ -6,6 +6,7 @@
 #include <string>
 
 #include "elastic/index/disk_directory.h"
+#include "vantrel/elastic/index_settings.h"
 #include "vantrel/elastic/write_lock.h"
 
 namespace vantrel::elastic {
@@ -19,7 +20,7 @@ class LibraryWriter {
 
   // `lock` stands on `folder` as long as the writer lives. With kEmptyIndex, an empty commit is made at once.
   // Throws IndexError.
-  LibraryWriter(std::string folder, const WriteLock& lock, bool compound_files, Start start);
+  LibraryWriter(std::string folder, const WriteLock& lock, const IndexSettings& settings, Start start);
   LibraryWriter(const LibraryWriter&) = delete;
   LibraryWriter& operator=(const LibraryWriter&) = delete;
   ~LibraryWriter();
@@ -33,7 +34,7 @@ class LibraryWriter {
  private:
   // Runs an operation of the library; `purpose` says what cannot be done where it fails.
   void Run(const char* purpose, const std::function<void()>& operation);
-  void Open(bool compound_files, Start start);
+  void Open(const IndexSettings& settings, Start start);
   void RollBack();
 
   std::string folder_;

@@ -4,6 +4,7 @@
 #include <cstddef>
 #include <set>
 #include <span>
+#include <stdexcept>
 #include <string_view>
 #include <utility>
 #include <vector>
@@ -12,6 +13,7 @@
 #include "elastic/format/quoted.h"
 #include "elastic/index/durable_file.h"
 #include "elastic/index/index_text.h"
+#include "elastic/preproc/pre_proc_chain.h"
 #include "vantrel/elastic/index_error.h"
 #include "vantrel/elastic/json_value.h"
 
@@ -50,6 +52,8 @@ class SettingsObject {
       : path_(path), object_(object), where_(std::move(where)) {
     if (!object_.isObject()) Refuse("is no object");
   }
+
+  bool Has(const char* name) const { return object_.isMember(name); }
 
   const Json::Value& Take(const char* name) {
     if (!object_.isMember(name)) Refuse("lacks the member " + format::Quoted(name));
@@ -95,6 +99,15 @@ class SettingsObject {
   std::set<std::string> taken_;
 };
 
+PreProcSettings ReadPreProcessor(const std::string& path, const Json::Value& value, size_t field_number) {
+  SettingsObject object(path, value, "pre-processor of field " + std::to_string(field_number));
+  PreProcSettings step;
+  step.name = object.TakeString("name");
+  step.argument = object.TakeString("argument");
+  object.RefuseOthers();
+  return step;
+}
+
 FieldSettings ReadField(const std::string& path, const Json::Value& value, size_t number) {
   SettingsObject object(path, value, "field " + std::to_string(number));
   FieldSettings field;
@@ -104,6 +117,12 @@ FieldSettings ReadField(const std::string& path, const Json::Value& value, size_
   field.term_vector = object.TakeWord("term_vector", kTermVectors);
   field.norms = object.TakeBool("norms");
   field.frequencies = object.TakeBool("frequencies");
+  if (object.Has("pre_processors")) {
+    const Json::Value& steps = object.Take("pre_processors");
+    if (!steps.isArray()) object.Refuse("member \"pre_processors\" is no array");
+    for (const Json::Value& step : steps)
+      field.pre_processors.push_back(ReadPreProcessor(path, step, number));
+  }
   object.RefuseOthers();
   return field;
 }
@@ -119,10 +138,21 @@ std::string ReadWholeFile(const std::string& folder) {
 void CheckIdField(const std::string& folder, const IndexSettings& settings) {
   for (const FieldSettings& field : settings.fields) {
     if (field.name != settings.id_field) continue;
+    if (!field.pre_processors.empty()) {
+      throw IndexValueError(folder, "the id field " + format::Quoted(field.name) + " has pre-processors");
+    }
     if (field.type == FieldType::kKeyword && field.stored) return;
     throw IndexValueError(folder, "the id field " + format::Quoted(field.name) + " is no stored keyword");
   }
   throw IndexValueError(folder, "the settings lack the id field " + format::Quoted(settings.id_field));
+}
+
+void CheckPreProcessors(const std::string& folder, const FieldSettings& field) {
+  try {
+    BuildPreProcChain(field.pre_processors);
+  } catch (const std::invalid_argument& error) {
+    throw IndexValueError(folder, "field " + format::Quoted(field.name) + ": " + error.what());
+  }
 }
 
 }  // namespace
@@ -139,6 +169,7 @@ void CheckSettings(const std::string& folder, const IndexSettings& settings) {
     if (!names.insert(field.name).second) {
       throw IndexValueError(folder, "the settings have two fields of the name " + format::Quoted(field.name));
     }
+    CheckPreProcessors(folder, field);
   }
   CheckIdField(folder, settings);
 }
@@ -157,6 +188,11 @@ void WriteSettings(const std::string& folder, const IndexSettings& settings) {
     object["term_vector"] = ToWord(kTermVectors, field.term_vector);
     object["norms"] = field.norms;
     object["frequencies"] = field.frequencies;
+    for (const PreProcSettings& step : field.pre_processors) {
+      Json::Value& step_object = object["pre_processors"].append(Json::objectValue);
+      step_object["name"] = step.name;
+      step_object["argument"] = step.argument;
+    }
   }
   WriteFileDurably(folder, kSettingsFileName, root.toString() + "\n");
 }

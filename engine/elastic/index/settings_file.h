@@ -10,15 +10,16 @@ namespace vantrel::elastic {
 //
 //   {"version": 1, "compound_files": true, "id_field": "id",
 //    "fields": [{"name": "id", "type": "keyword", "stored": true, "term_vector": "none", "norms": false,
-//                "frequencies": false}, ...]}
+//                "frequencies": false, "pre_processors": [{"name": "ngram", "argument": "2"}, ...]}, ...]}
 //
 // type: "text", "keyword". term_vector: "none", "terms", "positions", "offsets", "positions_offsets". Every
-// member is there. A file of another version, or with a member unknown, is refused: to pass over what it asks
+// member is there, but for "pre_processors" where there are none. A file of another version, or with a member unknown, is refused: to pass over what it asks
 // for would index documents differently from those that are there.
 inline constexpr const char* kSettingsFileName = "quorelastic.json";  // no name of the index library's files
 
 // Throws IndexValueError, about the folder, where settings cannot be honoured: no field, two of one name, a
-// name that is empty or not valid UTF-8, an id field that is missing or no stored keyword.
+// name that is empty or not valid UTF-8, pre-processors that cannot be, an id field that is missing or no stored
+// keyword.
 void CheckSettings(const std::string& folder, const IndexSettings& settings);
 
 // Durable on return. Throws IndexIoError.

@@ -1,21 +1,27 @@
 #include "elastic/index/value_analysis.h"
 
-#include "elastic/index/text_analyzer.h"
+#include "elastic/index/field_analyzer.h"
 
 // Not without the index library's main header.
 #include <lucene++/OffsetAttribute.h>
 #include <lucene++/PositionIncrementAttribute.h>
 #include <lucene++/TermAttribute.h>
 
+#include <algorithm>
+
 namespace vantrel::elastic {
 
 using Lucene::newLucene;
 using Lucene::StringUtils;
 
-std::vector<AnalyzedToken> AnalyzeValue(FieldType type, const std::wstring& value) {
-  if (type == FieldType::kKeyword) return {{StringUtils::toUTF8(value), 0, 0, value.size()}};
-  const Lucene::TokenStreamPtr words =
-      NewTextAnalyzer()->tokenStream(L"", newLucene<Lucene::StringReader>(value));
+std::vector<AnalyzedToken> AnalyzeValue(const IndexSettings& settings, std::string_view field,
+                                        const std::wstring& value) {
+  const auto known = std::find_if(settings.fields.begin(), settings.fields.end(),
+                                  [&](const FieldSettings& candidate) { return candidate.name == field; });
+  if (known == settings.fields.end()) return {};
+  if (!IsAnalyzed(*known)) return {{StringUtils::toUTF8(value), 0, 0, value.size()}};
+  const Lucene::TokenStreamPtr words = NewFieldAnalyzer(settings)->tokenStream(
+      StringUtils::toUnicode(known->name), newLucene<Lucene::StringReader>(value));
   const auto term = words->getAttribute<Lucene::TermAttribute>();
   const auto offsets = words->getAttribute<Lucene::OffsetAttribute>();
   const auto step = words->getAttribute<Lucene::PositionIncrementAttribute>();

@@ -1,6 +1,7 @@
 #pragma once
 
 #include <string>
+#include <string_view>
 #include <vector>
 
 #include "vantrel/elastic/index.h"
@@ -8,8 +9,9 @@
 
 namespace vantrel::elastic {
 
-// The terms that a value becomes in a field of this type, as the index would hold them. The value has passed
-// DocumentBuilder::CheckValue.
-std::vector<AnalyzedToken> AnalyzeValue(FieldType type, const std::wstring& value);
+// The terms that a value becomes in a field, as the index would hold them. The value has passed
+// DocumentBuilder::CheckValue for this field.
+std::vector<AnalyzedToken> AnalyzeValue(const IndexSettings& settings, std::string_view field,
+                                        const std::wstring& value);
 
 }  // namespace vantrel::elastic

@@ -11,8 +11,9 @@
 
 #include "elastic/format/quoted.h"
 #include "elastic/format/text.h"
+#include "elastic/index/field_analyzer.h"
 #include "elastic/index/index_text.h"
-#include "elastic/index/text_analyzer.h"
+#include "elastic/preproc/pre_proc_chain.h"
 #include "elastic/search/pattern_query.h"
 #include "elastic/search/query_scan.h"
 #include "vantrel/elastic/search_error.h"
@@ -32,7 +33,7 @@ const String kNoField;  // of a clause that names none
 class FieldwiseParser : public Lucene::QueryParser {
  public:
   FieldwiseParser(const IndexSettings& settings, const SearchLimits& limits)
-      : QueryParser(Lucene::LuceneVersion::LUCENE_30, kNoField, NewTextAnalyzer()), limits_(limits) {
+      : QueryParser(Lucene::LuceneVersion::LUCENE_30, kNoField, NewFieldAnalyzer(settings)), limits_(limits) {
     for (const FieldSettings& known : settings.fields) {
       fields_.emplace(StringUtils::toUnicode(known.name), &known);
     }
@@ -54,10 +55,12 @@ class FieldwiseParser : public Lucene::QueryParser {
   }
 
   QueryPtr getFieldQuery(const String& name, const String& text, int32_t slop) override {
-    return ForFields(name, [&](const String& target, bool is_text) -> QueryPtr {
-      if (!is_text) return Counted(newTermQuery(newLucene<Lucene::Term>(target, text)));
+    return ForFields(name, [&](const String& target, const FieldSettings& settings) -> QueryPtr {
+      if (!IsAnalyzed(settings)) return Counted(newTermQuery(newLucene<Lucene::Term>(target, text)));
       const QueryPtr query = QueryParser::getFieldQuery(target, text);
       if (const auto phrase = boost::dynamic_pointer_cast<Lucene::PhraseQuery>(query)) phrase->setSlop(slop);
+      if (const auto phrase = boost::dynamic_pointer_cast<Lucene::MultiPhraseQuery>(query))
+        phrase->setSlop(slop);
       if (!query) Warn("nothing of " + format::Quoted(StringUtils::toUTF8(text)) + " is left to search for");
       return Counted(WithPositions(target, query));
     });
@@ -65,33 +68,33 @@ class FieldwiseParser : public Lucene::QueryParser {
 
   QueryPtr getWildcardQuery(const String& name, const String& text) override {
     if (text == L"*" && (name == kNoField || name == kAnyField)) return Counted(newMatchAllDocsQuery());
-    return ForFields(name, [&](const String& target, bool is_text) -> QueryPtr {
+    return ForFields(name, [&](const String& target, const FieldSettings& settings) -> QueryPtr {
       CountExpansion();
-      const auto query = newLucene<PatternQuery>(newLucene<Lucene::Term>(target, Folded(text, is_text)));
+      const auto query = newLucene<PatternQuery>(newLucene<Lucene::Term>(target, Folded(text, settings)));
       query->setRewriteMethod(multiTermRewriteMethod);
       return query;
     });
   }
 
   QueryPtr getPrefixQuery(const String& name, const String& text) override {
-    return ForFields(name, [&](const String& target, bool is_text) {
+    return ForFields(name, [&](const String& target, const FieldSettings& settings) {
       CountExpansion();
-      return newPrefixQuery(newLucene<Lucene::Term>(target, Folded(text, is_text)));
+      return newPrefixQuery(newLucene<Lucene::Term>(target, Folded(text, settings)));
     });
   }
 
   QueryPtr getFuzzyQuery(const String& name, const String& text, double similarity) override {
-    return ForFields(name, [&](const String& target, bool is_text) {
+    return ForFields(name, [&](const String& target, const FieldSettings& settings) {
       CountExpansion();
-      return newFuzzyQuery(newLucene<Lucene::Term>(target, Folded(text, is_text)), similarity,
+      return newFuzzyQuery(newLucene<Lucene::Term>(target, Folded(text, settings)), similarity,
                            fuzzyPrefixLength);
     });
   }
 
   QueryPtr getRangeQuery(const String& name, const String& from, const String& to, bool inclusive) override {
-    return ForFields(name, [&](const String& target, bool is_text) -> QueryPtr {
+    return ForFields(name, [&](const String& target, const FieldSettings& settings) -> QueryPtr {
       CountExpansion();
-      const auto query = newLucene<Lucene::TermRangeQuery>(target, Bound(from, is_text), Bound(to, is_text),
+      const auto query = newLucene<Lucene::TermRangeQuery>(target, Bound(from, settings), Bound(to, settings),
                                                            inclusive, inclusive);
       query->setRewriteMethod(multiTermRewriteMethod);
       return query;
@@ -101,15 +104,16 @@ class FieldwiseParser : public Lucene::QueryParser {
  private:
   // What a clause means: the query for its field or, where it names none, for any of the default fields. No
   // query is left where the analysis leaves nothing.
-  QueryPtr ForFields(const String& name, const std::function<QueryPtr(const String&, bool)>& make) {
+  QueryPtr ForFields(const String& name,
+                     const std::function<QueryPtr(const String&, const FieldSettings&)>& make) {
     if (name != kNoField && name != kAnyField) {
       const auto known = fields_.find(name);
       if (known == fields_.end()) return UnknownField(name);
-      return make(name, known->second->type == FieldType::kText);
+      return make(name, *known->second);
     }
     auto clauses = Lucene::Collection<Lucene::BooleanClausePtr>::newInstance();
     for (const String& target : default_fields_) {
-      const QueryPtr query = make(target, fields_.at(target)->type == FieldType::kText);
+      const QueryPtr query = make(target, *fields_.at(target));
       if (query) clauses.add(newBooleanClause(query, Lucene::BooleanClause::SHOULD));
     }
     if (clauses.size() == 1) return clauses[0]->getQuery();
@@ -133,7 +137,13 @@ class FieldwiseParser : public Lucene::QueryParser {
 
   QueryPtr Counted(const QueryPtr& query) {
     const auto phrase = boost::dynamic_pointer_cast<Lucene::PhraseQuery>(query);
-    CountClauses(phrase ? static_cast<size_t>(phrase->getTerms().size()) : 1);
+    const auto alternatives = boost::dynamic_pointer_cast<Lucene::MultiPhraseQuery>(query);
+    size_t terms = phrase ? static_cast<size_t>(phrase->getTerms().size()) : 1;
+    if (alternatives) {
+      terms = 0;
+      for (const auto& place : alternatives->getTermArrays()) terms += static_cast<size_t>(place.size());
+    }
+    CountClauses(terms);
     return query;
   }
 
@@ -152,15 +162,16 @@ class FieldwiseParser : public Lucene::QueryParser {
         "the query has too many prefixes, wildcards, ranges and similar words, over the fields it looks at");
   }
 
-  // Lower-cased as the analysis of texts does.
-  static String Folded(String text, bool is_text) {
-    if (is_text) Lucene::CharFolder::toLower(text.begin(), text.end());
+  // Lower-cased as the analysis of the field's values does.
+  static String Folded(String text, const FieldSettings& settings) {
+    const bool folds = settings.type == FieldType::kText || LowersCase(settings.pre_processors);
+    if (folds) Lucene::CharFolder::toLower(text.begin(), text.end());
     return text;
   }
 
-  static Lucene::StringValue Bound(const String& text, bool is_text) {
+  static Lucene::StringValue Bound(const String& text, const FieldSettings& settings) {
     if (text == L"*") return Lucene::VariantNull();
-    return Folded(text, is_text);
+    return Folded(text, settings);
   }
 
   void Warn(const std::string& warning) {

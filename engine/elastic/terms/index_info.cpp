@@ -4,7 +4,6 @@
 #include <stdexcept>
 #include <utility>
 
-#include "elastic/format/commit.h"
 #include "elastic/format/segment_files.h"
 #include "elastic/format/term_cursor.h"
 #include "elastic/terms/term_walk.h"
@@ -38,19 +37,6 @@ uint64_t LoadedBytes(const TermsIndexSize& size, uint64_t divisor) {
   return loaded * kBytesPerTerm + bytes * kBytesPerCharacter;
 }
 
-std::vector<format::SegmentFiles> OpenSegments(const format::Folder& folder, format::Need need) {
-  std::vector<format::SegmentFiles> opened;
-  format::UseNewestCommit(folder, [&](format::Commit commit) {
-    // Apart, so that a failure closes what is open before another commit is tried.
-    std::vector<format::SegmentFiles> segments;
-    for (format::SegmentInfo& segment : commit.segments) {
-      segments.push_back(format::OpenSegment(folder, std::move(segment), need));
-    }
-    opened = std::move(segments);
-  });
-  return opened;
-}
-
 }  // namespace
 
 IndexInfo::IndexInfo(const std::string& path) : path_(path) {}
@@ -60,11 +46,11 @@ IndexInfo::~IndexInfo() = default;
 void IndexInfo::initialize() {
   const format::DiskFolder folder(path_);
   try {
-    segments_ = OpenSegments(folder, format::Need::kAll);
+    segments_ = format::OpenNewestSegments(folder, format::Need::kAll);
   } catch (const IndexError&) {
     // It is no writer that took the file away, or a newer commit had been found. What all terms are can be told
     // without knowing which documents are deleted.
-    segments_ = OpenSegments(folder, format::Need::kTerms);
+    segments_ = format::OpenNewestSegments(folder, format::Need::kTerms);
   }
 }
 

@@ -14,8 +14,7 @@ LiveTermFilter::LiveTermFilter(const format::SegmentFiles& files)
       postings_(files.postings, files.info.document_count) {}
 
 bool LiveTermFilter::IsLive(const format::TermInfo& term, bool omits_frequencies) {
-  // Not all of them can be deleted: most terms are settled here, without a look at their postings.
-  if (term.document_frequency > deletions_.count()) return true;
+  if (IsLiveAtFirstSight(term)) return true;
   postings_.Seek(term, omits_frequencies);
   while (postings_.Next()) {
     if (!deletions_.Contains(postings_.document())) return true;

@@ -20,6 +20,11 @@ class LiveTermFilter {
  public:
   explicit LiveTermFilter(const format::SegmentFiles& files);
 
+  // Not all of its documents can be deleted: most terms are settled so, without a look at their postings.
+  bool IsLiveAtFirstSight(const format::TermInfo& term) const {
+    return term.document_frequency > deletions_.count();
+  }
+
   bool IsLive(const format::TermInfo& term, bool omits_frequencies);
 
  private:

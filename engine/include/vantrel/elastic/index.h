@@ -69,6 +69,10 @@ class VANTREL_ELASTIC_EXPORT Index {
   // Opens the index in a folder. Nothing is created, locked or changed.
   static std::shared_ptr<Index> Open(const std::string& path);
 
+  // The same, but the folder is not looked at before something is first asked of the index; what Open would throw
+  // is thrown by each such operation until one succeeds. Only path() needs nothing.
+  static std::shared_ptr<Index> OpenLater(const std::string& path);
+
   Index(const Index&) = delete;
   Index& operator=(const Index&) = delete;
   ~Index();

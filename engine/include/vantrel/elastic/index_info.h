@@ -37,9 +37,10 @@ class VANTREL_ELASTIC_EXPORT IndexInfo {
   // and std::out_of_range for a segment that does not exist.
   std::shared_ptr<TermDict> GetTermDict(int segment, bool live_only) const;
 
-  // The term-index divisor at which the term suggester opens this index: the smallest power of two that keeps
-  // the index terms it loads, of all segments together, under 64 MiB; 1 for an index without segments. What a
-  // loaded term takes is estimated from the headers and sizes of the term-index files; none is walked.
+  // The term-index divisor for suggestions from index terms that are held in memory: the smallest power of two
+  // that keeps those of all segments together under 64 MiB; 1 for an index without segments. What a loaded term
+  // takes is estimated from the headers and sizes of the term-index files; none is walked. SuggestTerms() itself
+  // holds none of them.
   int GetSuggestDivisor() const;
 
  private:

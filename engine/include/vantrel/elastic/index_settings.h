@@ -13,6 +13,18 @@ enum class FieldType {
 // What is kept, beside the postings, about the words of each single document.
 enum class TermVector { kNone, kTerms, kPositions, kOffsets, kPositionsAndOffsets };
 
+// A step that the terms of a field go through before they are indexed; a query's words go the same way.
+//
+//   name       argument
+//   "tolower"  none: letters become lower-case
+//   "ngram"    lengths, such as "2" or "2,3": every run of so many characters is a term
+struct PreProcSettings {
+  std::string name;
+  std::string argument;
+
+  bool operator==(const PreProcSettings&) const = default;
+};
+
 // How the values of one field are indexed. Settled when the index is created.
 struct FieldSettings {
   std::string name;  // valid UTF-8, not empty
@@ -22,6 +34,9 @@ struct FieldSettings {
   bool norms = true;  // short values score higher; takes one byte a document
   // How often and where a term stands in a document; without them, no phrase is found.
   bool frequencies = true;
+  // What the words of a text or the whole value of a keyword go through, in this order; at most eight. What is
+  // stored, and what a search plugin compares with, is not touched. Not for the id field.
+  std::vector<PreProcSettings> pre_processors = {};
 };
 
 struct IndexSettings {
