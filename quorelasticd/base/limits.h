@@ -13,6 +13,7 @@ inline constexpr int64_t kLongestRequestId = 256;     // bytes
 inline constexpr int64_t kMostIndexes = 1000;         // in the data folder
 inline constexpr int64_t kMostFields = 1000;          // of one index
 inline constexpr int64_t kLongestFieldName = 256;     // bytes
+inline constexpr int64_t kMostPreProcessors = 8;      // of one field
 inline constexpr int64_t kMostIds = 100000;           // of one document_delete
 inline constexpr int64_t kLongestDocumentId = 65536;  // bytes
 inline constexpr int64_t kLongestFileName = 4096;     // bytes

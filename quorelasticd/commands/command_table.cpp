@@ -10,8 +10,8 @@ const std::vector<Command>& CommandTable() {
   static const std::vector<Command> table = {
       IndexCreateCommand(),    IndexListCommand(), IndexDeleteCommand(), DocumentBulkCommand(),
       DocumentDeleteCommand(), CommitCommand(),    OptimizeCommand(),    SearchCommand(),
-      AnalyzeCommand(),        TermsCommand(),     PluginListCommand(),  StatusCommand(),
-      HelpCommand(),
+      SuggestCommand(),        AnalyzeCommand(),   TermsCommand(),       PluginListCommand(),
+      StatusCommand(),         HelpCommand(),
   };
   return table;
 }

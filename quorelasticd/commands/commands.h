@@ -13,6 +13,7 @@ Command DocumentDeleteCommand();
 Command CommitCommand();
 Command OptimizeCommand();
 Command SearchCommand();
+Command SuggestCommand();
 Command AnalyzeCommand();
 Command TermsCommand();
 Command PluginListCommand();

@@ -1,12 +1,11 @@
 #include <limits>
-#include <set>
 #include <utility>
 #include <vector>
 
 #include "base/limits.h"
-#include "base/text.h"
 #include "commands/commands.h"
 #include "commands/daemon.h"
+#include "commands/used_indexes.h"
 #include "vantrel/elastic/search.h"
 
 namespace quorelasticd {
@@ -36,8 +35,9 @@ Json::Value ToJson(const std::vector<FieldValues>& fields) {
 class Search : public RunningCommand {
  public:
   Search(const Daemon& daemon, const Json::Value& data)
-      : daemon_(daemon), quick_turn_(daemon.searching().quick_turns) {
-    UseIndexes(data["indice"]);
+      : daemon_(daemon),
+        quick_turn_(daemon.searching().quick_turns),
+        used_(daemon.registry(), data["indice"]) {
     request_.query = data["query_string"]["query"].asString();
     request_.from = data.get("from", Json::UInt64{request_.from}).asUInt64();
     request_.size = data.get("size", Json::UInt64{request_.size}).asUInt64();
@@ -54,7 +54,9 @@ class Search : public RunningCommand {
   }
 
   Outcome Step() override {
-    const SearchResult found = SearchIndexes(indexes_, request_, daemon_.searching().plugins);
+    std::vector<std::shared_ptr<vantrel::elastic::Index>> indexes;
+    for (const auto& open : used_.open()) indexes.push_back(open->shared_index());
+    const SearchResult found = SearchIndexes(indexes, request_, daemon_.searching().plugins);
     Json::Value result(Json::objectValue);
     result["total"] = static_cast<Json::UInt64>(found.total);
     result["max_score"] = found.max_score;
@@ -67,19 +69,6 @@ class Search : public RunningCommand {
   }
 
  private:
-  void UseIndexes(const Json::Value& names) {
-    std::set<std::string> told;
-    for (const Json::Value& value : names) {
-      const std::string name = value.asString();
-      if (!told.insert(name).second) {
-        throw RequestError(ErrorCode::kBadRequest,
-                           "data.indice: expected each index once, found " + Quoted(name) + " twice");
-      }
-      open_.push_back(daemon_.registry().Use(name));
-      indexes_.push_back(open_.back()->shared_index());
-    }
-  }
-
   void AddFilter(const Json::Value& filter) {
     const std::string plugin = filter["name"].asString();
     vantrel::elastic::JsonValue data;
@@ -92,7 +81,7 @@ class Search : public RunningCommand {
 
   Json::Value Describe(const SearchHit& hit) const {
     Json::Value described(Json::objectValue);
-    described["index"] = open_[hit.index]->name();
+    described["index"] = used_.open()[hit.index]->name();
     described["id"] = hit.id;
     described["score"] = hit.score;
     described["fields"] = ToJson(hit.fields);
@@ -101,8 +90,7 @@ class Search : public RunningCommand {
 
   const Daemon& daemon_;
   Turns::Turn quick_turn_;
-  std::vector<std::shared_ptr<OpenIndex>> open_;
-  std::vector<std::shared_ptr<vantrel::elastic::Index>> indexes_;
+  UsedIndexes used_;
   SearchRequest request_;
   Json::Value warnings_ = Json::arrayValue;
 };
@@ -124,22 +112,22 @@ Shape FilterShape() {
 Command SearchCommand() {
   const vantrel::elastic::SearchLimits limits;
   constexpr int64_t kAnyMost = std::numeric_limits<int64_t>::max();
-  return {"search", "Finds documents, the best first.",
-          Object({
-              {"indice", true, NonEmptyArrayOf(Text(), static_cast<int64_t>(limits.indexes)),
-               "The names of the indexes to search, as if they were one."},
-              {"query_string", true, Object({{"query", true, Text(), "The query, see below."}}),
-               "What to search for."},
-              {"from", false, Integer(0, kAnyMost), "How many hits to pass over; 0 by default."},
-              {"size", false, Integer(0, kAnyMost), "How many hits to return at most; 10 by default."},
-              {"filters", false, ArrayOf(FilterShape(), static_cast<int64_t>(limits.filters)),
-               "What all have to let a document through."},
-              {"load_field", false, ArrayOf(Text(), kMostFields),
-               "The only stored fields to return; all by default."},
-          }),
-          [](const Daemon& daemon, Json::Value data) -> std::unique_ptr<RunningCommand> {
-            return std::make_unique<Search>(daemon, data);
-          }};
+  return {
+      "search", "Finds documents, the best first.",
+      Object({
+          {"indice", true, UsedIndexes::Names(), "The names of the indexes to search, as if they were one."},
+          {"query_string", true, Object({{"query", true, Text(), "The query, see below."}}),
+           "What to search for."},
+          {"from", false, Integer(0, kAnyMost), "How many hits to pass over; 0 by default."},
+          {"size", false, Integer(0, kAnyMost), "How many hits to return at most; 10 by default."},
+          {"filters", false, ArrayOf(FilterShape(), static_cast<int64_t>(limits.filters)),
+           "What all have to let a document through."},
+          {"load_field", false, ArrayOf(Text(), kMostFields),
+           "The only stored fields to return; all by default."},
+      }),
+      [](const Daemon& daemon, Json::Value data) -> std::unique_ptr<RunningCommand> {
+        return std::make_unique<Search>(daemon, data);
+      }};
 }
 
 }  // namespace quorelasticd

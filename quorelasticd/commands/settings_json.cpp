@@ -56,12 +56,19 @@ FieldSettings ToField(const Json::Value& json) {
   field.term_vector = FromWord(kTermVectors, json.get("term_vector", "none").asString());
   field.norms = json.get("norms", field.norms).asBool();
   field.frequencies = json.get("frequencies", field.frequencies).asBool();
+  for (const Json::Value& step : json["pre_processors"]) {
+    field.pre_processors.push_back({step["name"].asString(), step.get("argument", "").asString()});
+  }
   return field;
 }
 
 }  // namespace
 
 Shape SettingsShape() {
+  const Shape step = Object({
+      {"name", true, Choice({"tolower", "ngram"}), "Lower case, or the runs of so many characters."},
+      {"argument", false, Text(), "Of ngram: the lengths, such as \"2\" or \"2,3\"."},
+  });
   const Shape field = Object({
       {"name", true, String(kLongestFieldName), "The field's name."},
       {"type", true, ChoiceOf(kTypes),
@@ -72,6 +79,9 @@ Shape SettingsShape() {
       {"norms", false, Boolean(), "Whether short values score higher; true by default."},
       {"frequencies", false, Boolean(),
        "Whether it is kept how often and where a term stands, which phrases need; true by default."},
+      {"pre_processors", false, ArrayOf(step, kMostPreProcessors),
+       "What the words of a text, or a keyword as a whole, go through before they become terms; none by "
+       "default."},
   });
   return Object({
       {"fields", true, NonEmptyArrayOf(field, kMostFields), "The fields that documents may have."},
@@ -99,6 +109,11 @@ Json::Value ToJson(const IndexSettings& settings) {
     object["term_vector"] = ToWord(kTermVectors, field.term_vector);
     object["norms"] = field.norms;
     object["frequencies"] = field.frequencies;
+    for (const auto& step : field.pre_processors) {
+      Json::Value& described = object["pre_processors"].append(Json::objectValue);
+      described["name"] = step.name;
+      if (!step.argument.empty()) described["argument"] = step.argument;
+    }
   }
   return json;
 }

@@ -81,6 +81,7 @@ TEST_F(ProtocolTables, EveryLimitIsDocumentedAsItIs) {
           row("stored_indexes", kMostIndexes, "in the data folder"),
           row("request_id", kLongestRequestId, "bytes"), row("data.settings.fields", kMostFields, "elements"),
           row("data.settings.fields[N].name", kLongestFieldName, "bytes"),
+          row("data.settings.fields[N].pre_processors", kMostPreProcessors, "elements"),
           row("data.file", kLongestFileName, "bytes"), row("data.ids", kMostIds, "elements"),
           row("data.ids[N]", kLongestDocumentId, "bytes"), row("data.indice", search.indexes, "elements"),
           row("data.filters", search.filters, "elements"), row("data.load_field", kMostFields, "elements"),

@@ -278,6 +278,49 @@ TEST_F(SearchCommandTest, AnalysisShowsTheTermsOfAField) {
             "bad_request");
 }
 
+TEST_F(SearchCommandTest, APrefixIsCompletedByTheMostFrequentTerms) {
+  const auto suggest = [&](const std::string& prefix, const std::string& more = "") {
+    const Json::Value reply =
+        client_.Ask(R"({"command":"suggest","data":{"indice":["books"],"field":"title","prefix":")" + prefix +
+                    "\"" + more + "}}");
+    std::vector<std::string> terms;
+    for (const Json::Value& term : reply["result"]["suggestions"]) {
+      terms.push_back(term["term"].asString() + " " + term["doc_freq"].asString());
+    }
+    if (!reply["success"].asBool()) terms.push_back(reply["error"]["code"].asString());
+    return terms;
+  };
+  EXPECT_THAT(suggest("o"), ElementsAre("old 3", "of 1", "or 1"));
+  EXPECT_THAT(suggest("o", R"(,"from":1,"size":1)"), ElementsAre("of 1"));
+  EXPECT_THAT(suggest("O"), IsEmpty());
+  EXPECT_THAT(suggest("o", R"(,"size":10001)"), ElementsAre("limit_exceeded"));
+  EXPECT_EQ(client_.AskForError(
+                R"({"command":"suggest","data":{"indice":["films"],"field":"title","prefix":"o"}})"),
+            "index_not_found");
+}
+
+TEST_F(SearchCommandTest, QueriesGoThroughTheSamePreProcessorsAsValues) {
+  ASSERT_EQ(client_.AskForError(
+                R"({"command":"index_create","data":{"id":"names","settings":{"fields":[
+                  {"name":"name","type":"keyword","pre_processors":[{"name":"tolower"}]},
+                  {"name":"part","type":"text","pre_processors":[{"name":"ngram","argument":"2"}]}]}}})"),
+            "");
+  ASSERT_EQ(client_.AskForError(
+                R"({"command":"document_bulk","data":{"id":"names","documents":[
+                  {"id":"1","name":"Anna","part":"Anna"},{"id":"2","name":"ANNA","part":"Hanno"}]}})"),
+            "");
+  const auto find = [&](const std::string& query) {
+    return Ids(client_.Ask(SearchRequest(query, "", R"(["names"])")));
+  };
+  EXPECT_THAT(find("name:aNNa"), ElementsAre("1", "2"));
+  EXPECT_THAT(find("part:na"), ElementsAre("1"));
+  EXPECT_THAT(find("part:no"), ElementsAre("2"));
+  EXPECT_EQ(client_.AskForError(
+                R"({"command":"index_create","data":{"id":"x","settings":{"fields":[
+                  {"name":"name","type":"text","pre_processors":[{"name":"ngram","argument":"0"}]}]}}})"),
+            "bad_request");
+}
+
 TEST_F(SearchCommandTest, ADocumentStaysWhenItsReplacementIsRefused) {
   EXPECT_EQ(
       client_.AskForError(
