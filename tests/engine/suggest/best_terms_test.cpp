@@ -49,8 +49,7 @@ TEST(BestTermsTest, IsTheFrontOfAllSorted) {
   std::mt19937 random(7);
   for (int round = 0; round < 200; ++round) {
     Terms all;
-    for (uint32_t i = 0; i < random() % 60; ++i)
-      all.push_back({std::to_string(1000 + i), random() % 5});
+    for (uint32_t i = 0; i < random() % 60; ++i) all.push_back({std::to_string(1000 + i), random() % 5});
     std::shuffle(all.begin(), all.end(), random);
     const uint64_t most = random() % 20;
     BestTerms best(most);

@@ -35,7 +35,7 @@ struct FieldSettings {
   // How often and where a term stands in a document; without them, no phrase is found.
   bool frequencies = true;
   // What the words of a text or the whole value of a keyword go through, in this order; at most eight. What is
-  // stored, and what a search plugin compares with, is not touched. Not for the id field.
+  // stored is not touched. Search plugins compare with the terms as they are indexed. Not for the id field.
   std::vector<PreProcSettings> pre_processors = {};
 };
 

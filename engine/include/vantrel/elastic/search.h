@@ -46,7 +46,8 @@ struct SearchFilter {
 // field is looked for in every text field; in an index without any, in every keyword. Words and phrases are
 // analysed as the field's texts are; patterns and range bounds over a text field are only lower-cased. A value of
 // a keyword field is taken as it is; it needs quotes or escapes where it holds blanks or marks of the syntax.
-// A pattern may begin with * or ?, and walks the whole dictionary of the field then.
+// A pattern may begin with * or ?, and walks the whole dictionary of the field then. Where a field has
+// pre-processors, words, phrases and values go through them too; of patterns and bounds just the case is changed.
 struct SearchRequest {
   std::string query;  // UTF-8
   uint64_t from = 0;  // hits passed over
