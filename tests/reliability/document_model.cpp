@@ -38,6 +38,14 @@ bool DocumentModel::IsCommitted(const State& state) const {
   return state.is_committed || state.acknowledged <= committed_up_to_;
 }
 
+bool DocumentModel::HasCommit() const {
+  const std::lock_guard lock(mutex_);
+  return std::any_of(states_.begin(), states_.end(), [&](const auto& entry) {
+    return std::any_of(entry.second.begin(), entry.second.end(),
+                       [&](const State& state) { return state.sent > 0 && IsCommitted(state); });
+  });
+}
+
 std::string DocumentModel::Judge(const std::string& id, const std::vector<State>& states,
                                  uint64_t found) const {
   // The one committed version that none of the others can be older than and still be there.

@@ -42,6 +42,9 @@ class DocumentModel {
   // To be called once its final reply tells success, with what it says about a commit.
   void Acknowledge(const Request& request, bool committed);
 
+  // Whether a commit has been acknowledged after anything was written.
+  bool HasCommit() const;
+
   // Compares with what is there, a version for each id that exists. The result says what should not be so, a line
   // each. From then on, what is there counts as committed.
   std::vector<std::string> Compare(const std::map<std::string, uint64_t>& found);
