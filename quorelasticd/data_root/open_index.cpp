@@ -12,7 +12,14 @@ OpenIndex::OpenIndex(std::string name, std::shared_ptr<vantrel::elastic::Index> 
     : name_(std::move(name)), index_(std::move(index)), writing_turn_(std::move(writing_turn)) {}
 
 void Changes::Commit() {
-  Apply([](vantrel::elastic::Index& index) { index.Commit(); });
+  Apply([](vantrel::elastic::Index& index) {
+    try {
+      index.Commit();
+    } catch (const vantrel::elastic::IndexChangesLostError&) {
+      // Noted when it happened, and told to those who lose by it; it is no reason to refuse the changes made since.
+      index.Commit();
+    }
+  });
   open_->has_promised_ = false;
 }
 

@@ -62,6 +62,8 @@ RequestError ToRequestError() {
     return RequestError(ErrorCode::kBadRequest, WithoutPath(error));
   } catch (const IndexIoError& error) {
     return RequestError(ErrorCode::kIoError, error.what());
+  } catch (const IndexChangesLostError& error) {
+    return RequestError(ErrorCode::kIoError, error.what());
   } catch (const IndexError& error) {
     return RequestError(ErrorCode::kCorrupt, error.what());
   } catch (const QuerySyntaxError& error) {

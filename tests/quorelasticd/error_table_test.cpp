@@ -40,6 +40,7 @@ TEST(RequestError, WhatTheEngineThrowsHasACode) {
   EXPECT_EQ(Translate(IndexLockedError("/x")).code(), ErrorCode::kLocked);
   EXPECT_EQ(Translate(IndexExistsError("/x")).code(), ErrorCode::kIndexExists);
   EXPECT_EQ(Translate(IndexIoError("/x", "cannot read", EIO)).code(), ErrorCode::kIoError);
+  EXPECT_EQ(Translate(IndexChangesLostError("/x")).code(), ErrorCode::kIoError);
   EXPECT_EQ(Translate(IndexDamagedError("/x", 3, "wrong")).code(), ErrorCode::kCorrupt);
   EXPECT_EQ(Translate(IndexError("/x", "wrong")).code(), ErrorCode::kCorrupt);
   EXPECT_EQ(Translate(IndexValueError("/x", "wrong")).code(), ErrorCode::kBadRequest);

@@ -1,5 +1,7 @@
 #include <gmock/gmock.h>
 #include <gtest/gtest.h>
+#include <signal.h>
+#include <sys/resource.h>
 
 #include <boost/asio/thread_pool.hpp>
 #include <filesystem>
@@ -132,6 +134,27 @@ TEST_F(RegistryTest, EveryOpenIndexIsCommittedAtTheEnd) {
   for (const char* name : {"x", "y"}) EXPECT_EQ(registry_.Use(name)->index().CountDocuments().live, 1u);
 }
 
+// As long as it lives, writing fails: what a full disk looks like.
+class NoFileGrows {
+ public:
+  NoFileGrows() {
+    signal(SIGXFSZ, SIG_IGN);
+    getrlimit(RLIMIT_FSIZE, &before_);
+    rlimit limit = before_;
+    limit.rlim_cur = 0;
+    setrlimit(RLIMIT_FSIZE, &limit);
+  }
+  NoFileGrows(const NoFileGrows&) = delete;
+  NoFileGrows& operator=(const NoFileGrows&) = delete;
+  ~NoFileGrows() {
+    setrlimit(RLIMIT_FSIZE, &before_);
+    signal(SIGXFSZ, SIG_DFL);
+  }
+
+ private:
+  rlimit before_{};
+};
+
 class ChangesTest : public RegistryTest {
  protected:
   ChangesTest() {
@@ -188,6 +211,21 @@ TEST_F(ChangesTest, ABrokenPromiseIsReportedOnce) {
   commit.Commit();
   EXPECT_EQ(Failure([&] { commit.ReportBrokenPromise(); }), ErrorCode::kIoError);
   EXPECT_NO_THROW(commit.ReportBrokenPromise());
+}
+
+TEST_F(ChangesTest, WhatAFailureLostIsNoReasonToRefuseALaterCommit) {
+  Changes promised(open_);
+  Add(promised);
+  promised.Promise();
+  Changes failing(open_);
+  {
+    const NoFileGrows full_disk;
+    EXPECT_THROW(failing.Apply([](Index& index) { index.Optimize(); }), IndexIoError);
+  }
+  Changes later(open_);
+  Add(later);
+  EXPECT_NO_THROW(later.Commit());
+  EXPECT_EQ(open_->index().CountDocuments().live, 1u);
 }
 
 TEST_F(ChangesTest, AKeptPromiseIsNotReported) {

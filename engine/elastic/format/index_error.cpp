@@ -20,4 +20,7 @@ IndexExistsError::IndexExistsError(const std::string& path)
 IndexLockedError::IndexLockedError(const std::string& path)
     : IndexError(path, "the index is open for writing elsewhere") {}
 
+IndexChangesLostError::IndexChangesLostError(const std::string& path)
+    : IndexError(path, "changes since the last commit were lost when a later one failed") {}
+
 }  // namespace vantrel::elastic

@@ -140,9 +140,7 @@ class Index::Impl {
   // Commits, unless changes of this round are lost already: that is told once, then what came since counts.
   void Commit() {
     const std::lock_guard guard(write_mutex_);
-    if (std::exchange(changes_are_lost_, false)) {
-      throw IndexError(path_, "changes since the last commit were lost when a later one failed");
-    }
+    if (std::exchange(changes_are_lost_, false)) throw IndexChangesLostError(path_);
     if (!writer_.has_value()) return;
     try {
       RunWriter([](LibraryWriter& writer) { writer.Commit(); });

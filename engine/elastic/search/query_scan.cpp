@@ -43,7 +43,8 @@ class Tokens {
       : length_(query.size()),
         stream_(Lucene::newLucene<Lucene::FastCharStream>(Lucene::newLucene<Lucene::StringReader>(query))),
         manager_(Lucene::newLucene<Lucene::QueryParserTokenManager>(stream_)) {
-    manager_->ReInit(stream_);  // the constructor leaves what the lexer counts by as the memory had it
+    // Its constructor leaves the lexer's marks as the memory happens to be; only this sets them.
+    manager_->ReInit(stream_);
     Advance();
   }
 

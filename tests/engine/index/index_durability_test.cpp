@@ -221,7 +221,7 @@ TEST_F(IndexDurabilityTest, AWriteThatFailsFailsTheRoundAndKeepsTheCommitBefore)
     ExpectOnlyTheOldCommit();
     try {
       index().Commit();
-    } catch (const IndexError& error) {
+    } catch (const IndexChangesLostError& error) {
       // Where it was not the commit that failed: what had gone well before is lost with it.
       EXPECT_THAT(error.what(), HasSubstr("changes since the last commit were lost"));
     }
@@ -236,7 +236,7 @@ TEST_F(IndexDurabilityTest, ACommitTellsOnceThatEarlierChangesAreLost) {
     EXPECT_THROW(index().Optimize(), IndexIoError);  // writes the segment of what was added
   }
   index().Add(MakeDocument("late", "text"));
-  EXPECT_THROW(index().Commit(), IndexError);
+  EXPECT_THROW(index().Commit(), IndexChangesLostError);
   EXPECT_THAT(Terms(path(), "id"), ElementsAre("old"));
   index().Commit();
   EXPECT_THAT(Terms(path(), "id"), ElementsAre("late", "old"));

@@ -3,6 +3,7 @@
 #include <gmock/gmock.h>
 #include <gtest/gtest.h>
 
+#include <cstdint>
 #include <string>
 #include <vector>
 
@@ -37,6 +38,24 @@ class QueryTest : public ::testing::Test {
 
   OwnIndex index_;
 };
+
+// Frees memory that holds nothing but this number, in pieces of many sizes, for what comes next to be made in.
+void LeaveInMemory(int32_t number) {
+  std::vector<std::vector<int32_t>> pieces;
+  for (size_t bytes = 16; bytes <= 512; bytes += 16) {
+    for (int i = 0; i < 20; ++i) pieces.emplace_back(bytes / sizeof number, number);
+  }
+}
+
+TEST_F(QueryTest, AQueryMeansTheSameWhateverStoodInMemoryBefore) {
+  for (int32_t number = 0; number < 50; ++number) {
+    SCOPED_TRACE(number);
+    LeaveInMemory(number);
+    EXPECT_THAT(Find("title:red"), ElementsAre("fox"));
+    LeaveInMemory(number);
+    EXPECT_THAT(Find("+quick -laz* \"brown fox\"~2"), ElementsAre("fox"));
+  }
+}
 
 TEST_F(QueryTest, AWordIsLookedForInEveryText) {
   EXPECT_THAT(Find("red"), ElementsAre("fox"));

@@ -54,6 +54,7 @@ struct AnalyzedToken {
 // Errors are IndexError (index_error.h), and in searches also SearchError (search_error.h):
 //   IndexValueError   the argument cannot be taken; nothing happened, everything else still holds
 //   IndexLockedError  somebody else is writing
+//   IndexChangesLostError  of Commit: an earlier failure lost changes; those made since then still hold
 //   any other         disk, memory or files failed; where a change was under way, every change since the last
 //                     commit is lost, and the next one starts anew from that commit
 //
@@ -103,7 +104,7 @@ class VANTREL_ELASTIC_EXPORT Index {
 
   // Makes every change durable and visible: once this has returned, a crash or a loss of power does not undo
   // it. Without changes it does nothing. Where an earlier failure has lost changes, it commits nothing and throws
-  // once; what was changed since then is committed by the next call.
+  // IndexChangesLostError once; what was changed since then is committed by the next call.
   void Commit();
 
   // The documents of the newest commit, whoever made it.

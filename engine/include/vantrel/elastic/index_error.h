@@ -58,6 +58,13 @@ class VANTREL_ELASTIC_EXPORT IndexLockedError : public IndexError {
   explicit IndexLockedError(const std::string& path);
 };
 
+// Changes that were made but not committed are gone: dropped when a later one failed, which was told then. Nothing
+// else is wrong with the index. path() is the folder.
+class VANTREL_ELASTIC_EXPORT IndexChangesLostError : public IndexError {
+ public:
+  explicit IndexChangesLostError(const std::string& path);
+};
+
 // What was handed in cannot be taken: settings that contradict themselves, a document that does not fit the
 // settings, a text that is not valid. The index is as it was before the call. path() is the folder.
 class VANTREL_ELASTIC_EXPORT IndexValueError : public IndexError {
