@@ -35,6 +35,7 @@ class ReliabilityCrowd : public ::testing::Test {
   void RunAtOnce(std::deque<CrowdClient>& clients, int requests) {
     std::latch start(static_cast<std::ptrdiff_t>(clients.size()));
     std::vector<std::thread> threads;
+    threads.reserve(clients.size());
     for (CrowdClient& client : clients) {
       threads.emplace_back([&] {
         start.arrive_and_wait();

@@ -1,20 +1,12 @@
 #pragma once
 
 #include <string>
-#include <vector>
 
 namespace quorelastic::testing {
 
-// What the index library's own checker finds wrong with the index in a folder that nobody writes to; "" where it
-// finds nothing. It runs in a child process, because damage can crash it.
-std::string FindDamageByLibrary(const std::string& path);
-
-// The ids of the documents that are not deleted, as the engine's own reading finds them: every live term of every
-// segment is walked, and those of the field "id" are handed back, sorted. An id that two segments hold comes twice.
-// Throws IndexError where the index is damaged.
-std::vector<std::string> WalkLiveIds(const std::string& path);
-
-// Expects that both find nothing wrong, that each id is there once, and that the documents are as many.
+// Expects that the index in a folder that nobody writes to is clean by two checkers: the index library's own, and the
+// engine's reading, which walks every live term of every segment, finds each id once, and as many ids as there are
+// documents. They run in a child process, because damage can crash the first.
 void ExpectCleanIndex(const std::string& path);
 
 }  // namespace quorelastic::testing

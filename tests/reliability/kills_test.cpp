@@ -49,9 +49,9 @@ JsonValue Request(const char* command) {
 }
 
 // Writes to the index "books" in random ways until the daemon is gone.
-class Writer {
+class LoadingClient {
  public:
-  Writer(const std::string& socket, DocumentModel& model, int ids, uint32_t seed)
+  LoadingClient(const std::string& socket, DocumentModel& model, int ids, uint32_t seed)
       : client_(socket), model_(model), ids_(ids), random_(seed) {}
 
   // `expects_the_end` is set before the daemon is killed. What goes wrong before is handed back.
@@ -183,7 +183,7 @@ class ReliabilityKills : public ::testing::Test {
   void WriteAndKill(DaemonProcess& daemon, int ids, std::chrono::milliseconds when, bool needs_commit,
                     uint32_t seed) {
     std::atomic<bool> expects_the_end{false};
-    std::deque<Writer> writers;
+    std::deque<LoadingClient> writers;
     for (uint32_t i = 0; i < kWriters; ++i) writers.emplace_back(daemon.socket(), model_, ids, seed + i);
     DaemonClient maker(daemon.socket());
     std::vector<std::string> problems(kWriters + 1);
