@@ -68,6 +68,12 @@ int64_t ByteReader::ReadLong() {
 }
 
 uint32_t ByteReader::ReadLongVInt() {
+  // Two bytes, both in the buffer: most of those that take more than one.
+  if (filled_ - position_ >= 2 && buffer_[position_ + 1] < 0x80) {
+    const uint32_t value = (buffer_[position_] & 0x7fU) | uint32_t{buffer_[position_ + 1]} << 7;
+    position_ += 2;
+    return value;
+  }
   const uint64_t start = offset();
   uint32_t value = 0;
   for (int shift = 0; shift < 28; shift += 7) {
@@ -110,6 +116,14 @@ void ByteReader::ReadBytes(std::span<uint8_t> out) {
   Refill(out.size());
   std::copy_n(buffer_.begin(), out.size(), out.begin());
   position_ = out.size();
+}
+
+std::span<const uint8_t> ByteReader::Take(uint64_t most) {
+  if (position_ == filled_) Refill(1);
+  const auto length = static_cast<size_t>(std::min<uint64_t>(most, filled_ - position_));
+  const std::span<const uint8_t> taken(buffer_.data() + position_, length);
+  position_ += length;
+  return taken;
 }
 
 std::string ByteReader::ReadString() {

@@ -55,6 +55,10 @@ class ByteReader {
 
   void ReadBytes(std::span<uint8_t> out);
 
+  // Moves past the next bytes, at least one and at most `most` (which is not 0), and hands them out as they lie
+  // in the buffer, valid until the next call. For who goes through many bytes without keeping them.
+  std::span<const uint8_t> Take(uint64_t most);
+
   // A string; throws also when it is not valid UTF-8, or longer than kLongestText.
   std::string ReadString();
 
