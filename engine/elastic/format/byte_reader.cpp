@@ -1,6 +1,8 @@
 #include "elastic/format/byte_reader.h"
 
 #include <algorithm>
+#include <bit>
+#include <cstring>
 #include <limits>
 #include <utility>
 
@@ -10,7 +12,7 @@
 namespace vantrel::elastic::format {
 
 ByteReader::ByteReader(std::shared_ptr<const ByteSource> source, size_t buffer_size)
-    : source_(std::move(source)), buffer_size_(buffer_size) {}
+    : source_(std::move(source)), size_(source_->size()), buffer_size_(buffer_size) {}
 
 void ByteReader::Damaged(uint64_t offset, const std::string& problem) const {
   throw IndexDamagedError(name(), offset, problem);
@@ -124,6 +126,47 @@ std::span<const uint8_t> ByteReader::Take(uint64_t most) {
   const std::span<const uint8_t> taken(buffer_.data() + position_, length);
   position_ += length;
   return taken;
+}
+
+// Eight bytes at a time, of which six are counted: so a run of three bytes that announce another one lies within some
+// eight of them, wherever it begins.
+bool ByteReader::PassShortVInts(uint64_t count) {
+  constexpr size_t kLoaded = 8;
+  constexpr size_t kCounted = 6;
+  constexpr uint64_t kHighBits = 0x8080808080808080;
+  constexpr uint64_t kCountedBits = kHighBits >> (8 * (kLoaded - kCounted));
+  static_assert(std::endian::native == std::endian::little, "the first byte is the lowest of the eight");
+  while (count > 0) {
+    if (Window(kLoaded).size() < kLoaded) return PassShortVIntsAtEnd(count);
+    const uint8_t* next = buffer_.data() + position_;
+    const uint8_t* const last = buffer_.data() + filled_ - kLoaded;
+    for (; next <= last; next += kCounted) {
+      uint64_t bytes = 0;
+      std::memcpy(&bytes, next, sizeof bytes);
+      const uint64_t more = bytes & kHighBits;
+      if ((more & more >> 8 & more >> 16) != 0) return false;
+      uint64_t ends = ~bytes & kCountedBits;
+      const uint64_t ended = (ends >> 7) * 0x0101010101010101 >> 56;  // how many bits are set
+      if (ended >= count) {
+        while (--count > 0) ends &= ends - 1;
+        position_ = static_cast<size_t>(next - buffer_.data() + std::countr_zero(ends) / 8 + 1);
+        return true;
+      }
+      count -= ended;
+    }
+    position_ = static_cast<size_t>(next - buffer_.data());
+  }
+  return true;
+}
+
+bool ByteReader::PassShortVIntsAtEnd(uint64_t count) {
+  for (int length = 1; count > 0; ++length) {
+    if (remaining() == 0 || length > 3) return false;
+    if (ReadByte() >= 0x80) continue;
+    --count;
+    length = 0;
+  }
+  return true;
 }
 
 std::string ByteReader::ReadString() {

@@ -6,6 +6,7 @@
 
 #include "elastic/format/byte_reader.h"
 #include "elastic/format/byte_source.h"
+#include "elastic/format/postings.h"
 
 namespace vantrel::elastic::format {
 
@@ -28,6 +29,9 @@ class PositionsReader {
 
   // Moves past one document's positions. They must not descend, nor lie before -1.
   void PassDocument(uint32_t frequency) { has_payloads_ ? PassPayloads(frequency) : PassPlain(frequency); }
+
+  // Moves past the positions of the documents of a block.
+  void PassBlock(const PostingsReader& postings);
 
   // The length of the last payload; nothing before the term's first one.
   std::optional<uint32_t> payload_length() const { return payload_length_; }

@@ -17,6 +17,69 @@ void PostingsReader::Seek(const TermInfo& term, bool omits_frequencies) {
   document_ = 0;
 }
 
+namespace {
+
+constexpr size_t kLongestPosting = 10;  // bytes
+
+// Goes on with a VInt whose first byte announces more; `is_long` where it takes five bytes or more.
+inline const uint8_t* FinishVInt(const uint8_t* next, uint32_t& value, bool& is_long) {
+  value = (value & 0x7f) | static_cast<uint32_t>(*next & 0x7f) << 7;
+  if (*next++ < 0x80) return next;
+  value |= static_cast<uint32_t>(*next & 0x7f) << 14;
+  if (*next++ < 0x80) return next;
+  value |= static_cast<uint32_t>(*next & 0x7f) << 21;
+  if (*next++ >= 0x80) is_long = true;
+  return next;
+}
+
+}  // namespace
+
+// Decodes without looking at each number, and only then whether all were good. False, having done nothing, where they
+// were not, or are such that only Next() can tell.
+template <bool kOmitsFrequencies>
+bool PostingsReader::PassQuickly(int32_t count) {
+  const auto window = reader_.Window(static_cast<size_t>(count) * kLongestPosting);
+  if (window.size() < static_cast<size_t>(count) * kLongestPosting) return false;
+  const uint8_t* next = window.data();
+  uint64_t document = static_cast<uint32_t>(document_);
+  bool is_bad = false;
+  for (int32_t i = 0; i < count; ++i) {
+    uint32_t code = *next++;
+    if (code >= 0x80) next = FinishVInt(next, code, is_bad);
+    uint32_t distance = code;
+    uint32_t frequency = 1;
+    if constexpr (!kOmitsFrequencies) {
+      distance = code >> 1;
+      if ((code & 1) == 0) {
+        frequency = *next++;
+        if (frequency >= 0x80) next = FinishVInt(next, frequency, is_bad);
+      }
+    }
+    is_bad = is_bad || distance == 0 || frequency == 0;
+    document += distance;
+    block_[static_cast<size_t>(block_count_ + i)] = frequency;
+  }
+  if (is_bad || document >= document_count_) return false;
+  reader_.Advance(static_cast<size_t>(next - window.data()));
+  document_ = static_cast<int32_t>(document);
+  left_ -= count;
+  for (int32_t i = 0; i < count; ++i) AddToBlock(block_[static_cast<size_t>(block_count_)]);
+  return true;
+}
+
+void PostingsReader::PassBlock(int32_t count) {
+  block_count_ = 0;
+  block_occurrences_ = 0;
+  block_bound_ = 0;
+  // The first one may be document 0, at no distance.
+  if (at_first_ && count > 0 && Next()) {
+    AddToBlock(frequency_);
+    --count;
+  }
+  if (omits_frequencies_ ? PassQuickly<true>(count) : PassQuickly<false>(count)) return;
+  for (; count > 0 && Next(); --count) AddToBlock(frequency_);
+}
+
 void PostingsReader::Refuse(uint32_t distance) const {
   const auto before = static_cast<uint32_t>(document_);
   if ((distance == 0 && !at_first_) || distance >= document_count_ - before) {

@@ -1,7 +1,9 @@
 #pragma once
 
+#include <array>
 #include <cstdint>
 #include <memory>
+#include <span>
 
 #include "elastic/format/byte_reader.h"
 #include "elastic/format/byte_source.h"
@@ -44,6 +46,17 @@ class PostingsReader {
     return true;
   }
 
+  // Moves past that many documents at once, as Next() would, of those that are left; at most kLongestBlock.
+  void PassBlock(int32_t count);
+  static constexpr int32_t kLongestBlock = 128;
+
+  // Of the documents of the block: how often each holds the term, all of them together, and a bound for each.
+  std::span<const uint32_t> block_frequencies() const {
+    return std::span(block_).first(static_cast<size_t>(block_count_));
+  }
+  uint64_t block_occurrences() const { return block_occurrences_; }
+  uint32_t block_bound() const { return block_bound_; }
+
   int32_t document() const { return document_; }
   uint32_t frequency() const { return frequency_; }
 
@@ -55,6 +68,13 @@ class PostingsReader {
 
  private:
   [[noreturn]] void Refuse(uint32_t distance) const;
+  template <bool kOmitsFrequencies>
+  bool PassQuickly(int32_t count);
+  void AddToBlock(uint32_t frequency) {
+    block_[static_cast<size_t>(block_count_++)] = frequency;
+    block_occurrences_ += frequency;
+    block_bound_ |= frequency;
+  }
 
   ByteReader reader_;
   uint32_t document_count_;
@@ -64,6 +84,11 @@ class PostingsReader {
   int32_t document_ = 0;
   uint32_t frequency_ = 0;
   uint64_t start_ = 0;
+
+  std::array<uint32_t, kLongestBlock> block_{};
+  int32_t block_count_ = 0;
+  uint64_t block_occurrences_ = 0;
+  uint32_t block_bound_ = 0;
 };
 
 }  // namespace vantrel::elastic::format

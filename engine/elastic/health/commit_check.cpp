@@ -80,6 +80,10 @@ void CheckSegment(const std::string& file, const Commit& commit, const SegmentIn
     refuse(Grade::kDamaged, "a count of deleted documents up to " + std::to_string(segment.document_count),
            std::to_string(segment.deleted_count));
   }
+  if (segment.deletions_generation == SegmentInfo::kNoDeletions && segment.deleted_count > 0) {
+    refuse(Grade::kDamaged, "no deleted documents, having no file of them",
+           std::to_string(segment.deleted_count));
+  }
   if (!segment.norm_generations.has_value()) return;
   for (const int64_t generation : *segment.norm_generations) {
     if (generation < SegmentInfo::kNoOwnNorms)

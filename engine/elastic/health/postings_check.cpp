@@ -1,5 +1,6 @@
 #include "elastic/health/postings_check.h"
 
+#include <algorithm>
 #include <utility>
 
 #include "elastic/health/mismatch.h"
@@ -42,20 +43,31 @@ void PostingsCheck::Check(const format::TermCursor& dictionary, const format::Fi
 }
 
 void PostingsCheck::PassDocuments(const format::TermInfo& term) {
-  int32_t until_skip = has_skips_ ? skip_interval_ : 0;
-  for (int32_t number = 1; number <= term.document_frequency; ++number) {
-    if (--until_skip == 0) {
-      CompareSkips(term, number);
-      until_skip = skip_interval_;
-    }
-    postings_.Next();
-    if (!has_positions_) continue;
-    positions_->PassDocument(postings_.frequency());
-    if (must_state_length_ && !positions_->states_length()) {
+  // A skip entry describes the place before each n-th document.
+  int32_t next_skip = has_skips_ ? skip_interval_ - 1 : term.document_frequency;
+  for (int32_t passed = 0; passed < term.document_frequency;) {
+    const int32_t block = std::min(std::min(next_skip, term.document_frequency) - passed,
+                                   format::PostingsReader::kLongestBlock);
+    postings_.PassBlock(block);
+    if (has_positions_) PassPositions();
+    passed += block;
+    if (passed != next_skip || passed == term.document_frequency) continue;
+    CompareSkips(term, passed + 1);
+    next_skip += std::min(skip_interval_, term.document_frequency - next_skip);
+  }
+}
+
+void PostingsCheck::PassPositions() {
+  if (!must_state_length_) return positions_->PassBlock(postings_);
+  must_state_length_ = false;
+  bool at_first = true;
+  for (const uint32_t frequency : postings_.block_frequencies()) {
+    positions_->PassDocument(frequency);
+    if (at_first && !positions_->states_length()) {
       Refuse(Grade::kDamaged, positions_->name(), positions_->offset(),
              "the length of the payload that a skip entry leads to", "that of the one before");
     }
-    must_state_length_ = false;
+    at_first = false;
   }
 }
 

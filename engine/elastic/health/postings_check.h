@@ -36,6 +36,7 @@ class PostingsCheck {
 
  private:
   void PassDocuments(const format::TermInfo& term);
+  void PassPositions();
   void CompareSkips(const format::TermInfo& term, int32_t number);
   void CompareSkip(const format::TermInfo& term, int level, const format::SkipListReader::Entry& entry);
   void CheckSkipEnds(const format::TermCursor& dictionary);
