@@ -85,9 +85,11 @@ TEST_P(DamagedHealthTest, WhatTheLibrarysCheckerReportsIsFound) {
     const LibraryVerdict verdict = CheckWithLibrary(path());
     ++counts[static_cast<int>(verdict)];
     const bool is_clean = verdict == LibraryVerdict::kClean;
-    EXPECT_TRUE(is_clean || !report.clean()) << "the index library's verdict is " << static_cast<int>(verdict);
+    EXPECT_TRUE(is_clean || !report.clean())
+        << "the index library's verdict is " << static_cast<int>(verdict);
     if (is_clean && !report.clean()) ++more;
-    EXPECT_TRUE(verdict != LibraryVerdict::kFailed || HoldsUnsafe(report)) << "but the library's checker failed";
+    EXPECT_TRUE(verdict != LibraryVerdict::kFailed || HoldsUnsafe(report))
+        << "but the library's checker failed";
   }
   std::cout << "the library's checker calls " << counts[0] << " damages clean, " << counts[1]
             << " not, and fails on " << counts[2] << "; " << more << " of the first are found all the same\n";
