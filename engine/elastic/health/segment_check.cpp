@@ -175,13 +175,11 @@ bool SegmentCheck::HasPositions() const {
 
 void SegmentCheck::CheckTerms() const {
   TermSources sources{files_.Open(".tis"), files_.Open(".tii"), files_.Open(".frq"), nullptr};
-  if (HasPositions()) {
-    sources.positions = files_.Open(".prx");
-  } else if (files_.Has(".prx") && files_.Open(".prx")->size() > 0) {
-    Refuse(Grade::kDamaged, files_.Open(".prx")->name(), 0, "no positions, since no field has any",
-           std::to_string(files_.Open(".prx")->size()) + " bytes");
-  }
+  if (HasPositions()) sources.positions = files_.Open(".prx");
   TermsCheck(sources, *fields_, files_.info().document_count).Run();
+  if (HasPositions() || !files_.Has(".prx")) return;
+  RequireEqual(Grade::kDamaged, files_.Open(".prx")->name(), 0,
+               "positions, since no field has any, in bytes:", 0, files_.Open(".prx")->size());
 }
 
 StoreSlice SegmentCheck::Slice() const {
