@@ -32,15 +32,15 @@ struct SegmentInfo {
 
   // Where the stored fields and term vectors begin in a document store that several segments share.
   int32_t store_offset = kOwnStore;
-  std::string store_segment;  // the store's name, that of a segment
+  std::string store_segment = {};  // the store's name, that of a segment
   bool store_is_compound = false;
 
   // All norms in one file (.nrm), but for those that were changed: by field number, the generation of the file
   // with a field's own norms (.sN). Absent: the norms of no field were changed; in the older layouts, look.
   bool has_norms_file = false;
-  std::optional<std::vector<int64_t>> norm_generations;
+  std::optional<std::vector<int64_t>> norm_generations = {};
 
-  std::optional<bool> has_positions;  // whether any field's postings have some
+  std::optional<bool> has_positions = {};  // whether any field's postings have some
 };
 
 // A point in the index's life: the segments that make it up.

@@ -144,8 +144,10 @@ TEST(CommitTest, RefusesCountsThatCannotBe) {
   ExpectDamage(27, "generation of deletions is -2", [&] { Read(ByteWriter(one).Int(1).Long(-2).bytes()); });
   const ByteWriter norms = ByteWriter(one).Int(1).Long(-1).Int(-1).Byte(1);
   ExpectDamage(40, "count of norm generations is -2", [&] { Read(ByteWriter(norms).Int(-2).bytes()); });
-  ExpectDamage(44, "wanted to skip 17179869176 bytes",
+  ExpectDamage(40, "count of norm generations is 2147483647",
                [&] { Read(ByteWriter(norms).Int(0x7fffffff).bytes()); });
+  ExpectDamage(40, "count of norm generations is 2",
+               [&] { Read(ByteWriter(norms).Int(2).Long(1).Raw("short").bytes()); });
   const ByteWriter strings = ByteWriter(norms).Int(-1).Byte(1).Int(0).Byte(1);
   ExpectDamage(54, "more bytes", [&] { Read(ByteWriter(strings).Int(0x7fffffff).bytes()); });
   ExpectDamage(59, "wanted to skip 4294967295 bytes",
