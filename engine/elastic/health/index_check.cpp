@@ -164,8 +164,10 @@ HealthReport CheckFolder(const format::Folder& folder, const HealthOptions& opti
     report.findings = run.findings().Take();
     report.files = meter.TakeFiles();
     meter.Tell();
-    const bool is_overtaken =
-        run.findings().file_is_missing() && format::ListedGeneration(folder) > commit.generation;
+    // Not by the names alone: a newer one that is incomplete does not take over.
+    format::Commit newest;
+    if (run.findings().file_is_missing()) finding_it.Run("", [&] { newest = FindCommit(metered); });
+    const bool is_overtaken = newest.generation > commit.generation;
     if (!is_overtaken) return report;
     if (left == 0) throw IndexError(folder.path(), "the index changes faster than it can be checked");
   }

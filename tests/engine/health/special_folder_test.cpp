@@ -163,6 +163,12 @@ TEST_F(SpecialFolderTest, WithoutOneOfTheSegmentsFilesIsDamaged) {
   }
 }
 
+TEST_F(SpecialFolderTest, WithAFileMissingAndANewerCommitIncompleteIsDamaged) {
+  WriteFile(CommitPath(generation_ + 1), "incomplete");
+  std::filesystem::remove(folder_ / "_0.prx");
+  ExpectDamaged("_0.prx", "No such file or directory");
+}
+
 TEST_F(SpecialFolderTest, WithAStrayNormsFileWhereTheCommitSaysLookIsDamaged) {
   const TemporaryFolder other;
   WriteVariedIndex(other.path(),
