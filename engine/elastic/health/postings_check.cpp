@@ -15,7 +15,7 @@ constexpr int32_t kWithSkipLists = -2;
 
 }  // namespace
 
-PostingsCheck::PostingsCheck(std::shared_ptr<const format::ByteSource> postings,
+PostingsCheck::PostingsCheck(const std::shared_ptr<const format::ByteSource>& postings,
                              std::shared_ptr<const format::ByteSource> positions, int32_t document_count,
                              const format::TermCursor& dictionary)
     : postings_(postings, document_count, kBufferSize),

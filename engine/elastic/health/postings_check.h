@@ -19,7 +19,7 @@ namespace vantrel::elastic::health {
 class PostingsCheck {
  public:
   // `positions` is empty in a segment without any. The skip interval and levels are the dictionary's.
-  PostingsCheck(std::shared_ptr<const format::ByteSource> postings,
+  PostingsCheck(const std::shared_ptr<const format::ByteSource>& postings,
                 std::shared_ptr<const format::ByteSource> positions, int32_t document_count,
                 const format::TermCursor& dictionary);
 

@@ -25,6 +25,12 @@ using vantrel::elastic::CheckIndexHealth;
 using vantrel::elastic::HealthFinding;
 using vantrel::elastic::HealthReport;
 
+#if defined(__SANITIZE_ADDRESS__) || defined(__SANITIZE_THREAD__)
+constexpr int kCases = 20;  // a child takes many times as long
+#else
+constexpr int kCases = 100;
+#endif
+
 // QUORELASTIC_DAMAGES makes it a longer campaign, QUORELASTIC_SEED another one.
 int Setting(const char* name, int otherwise) {
   const char* value = std::getenv(name);
@@ -72,7 +78,7 @@ bool HoldsUnsafe(const HealthReport& report) {
 
 TEST_P(DamagedHealthTest, WhatTheLibrarysCheckerReportsIsFound) {
   std::mt19937 random(static_cast<uint32_t>(Setting("QUORELASTIC_SEED", 20240517)) + GetParam().index.seed);
-  const int cases = Setting("QUORELASTIC_DAMAGES", 100);
+  const int cases = Setting("QUORELASTIC_DAMAGES", kCases);
   int counts[4] = {};
   int more = 0;
   for (int i = 0; i < cases; ++i) {
