@@ -41,6 +41,7 @@ bool PostingsReader::PassQuickly(int32_t count) {
   const auto window = reader_.Window(static_cast<size_t>(count) * kLongestPosting);
   if (window.size() < static_cast<size_t>(count) * kLongestPosting) return false;
   const uint8_t* next = window.data();
+  uint32_t* const frequencies = block_.data() + block_count_;
   uint64_t document = static_cast<uint32_t>(document_);
   bool is_bad = false;
   for (int32_t i = 0; i < count; ++i) {
@@ -57,13 +58,13 @@ bool PostingsReader::PassQuickly(int32_t count) {
     }
     is_bad = is_bad || distance == 0 || frequency == 0;
     document += distance;
-    block_[static_cast<size_t>(block_count_ + i)] = frequency;
+    frequencies[i] = frequency;
   }
   if (is_bad || document >= document_count_) return false;
   reader_.Advance(static_cast<size_t>(next - window.data()));
   document_ = static_cast<int32_t>(document);
   left_ -= count;
-  for (int32_t i = 0; i < count; ++i) AddToBlock(block_[static_cast<size_t>(block_count_)]);
+  for (int32_t i = 0; i < count; ++i) AddToBlock(frequencies[i]);
   return true;
 }
 
