@@ -106,6 +106,7 @@ const Craft kCrafts[] = {
     {"TermSuffixHuge", Index::kSmall, ".tis", 25, VInt(1 << 30), ".tis"},
     {"TermTextNoUtf8", Index::kSmall, ".tis", 26, "\xff", ".tis"},
     {"TermTextLost", Index::kSmall, ".tis", 26, "\xef\xbf\xbf", ".tis"},
+    {"TermTwice", Index::kSmall, ".tis", 35, "\x01\x04lpha", ".tis"},
     {"TermsOutOfOrder", Index::kSmall, ".tis", 26, "z", ".tis"},
     {"TermFieldTooLarge", Index::kSmall, ".tis", 31, "\x01", ".tis"},
     {"TermFieldNegative", Index::kSmall, ".tis", 31, VInt(-1), ".tis"},

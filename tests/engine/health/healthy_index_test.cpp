@@ -30,7 +30,6 @@ using ::quorelastic::testing::LibraryVerdict;
 using ::quorelastic::testing::RandomIndexShape;
 using ::quorelastic::testing::RandomShape;
 using ::quorelastic::testing::TemporaryFolder;
-using ::quorelastic::testing::VariedIndexShape;
 using ::quorelastic::testing::WriteRandomIndex;
 using ::quorelastic::testing::WriteVariedIndex;
 
