@@ -9,6 +9,8 @@
 #include <cstdlib>
 #include <iostream>
 #include <random>
+#include <set>
+#include <string>
 
 #include "damage/damage.h"
 #include "engine/health/health_shapes.h"
@@ -69,6 +71,22 @@ class DamagedHealthTest : public ::testing::TestWithParam<HealthShape> {
 
 INSTANTIATE_TEST_SUITE_P(Shapes, DamagedHealthTest, ::testing::ValuesIn(HealthShapes()),
                          [](const auto& test) { return test.param.name; });
+
+TEST(HealthShapesTest, HaveFilesOfEveryKind) {
+  std::set<std::string> kinds;
+  for (const HealthShape& shape : HealthShapes()) {
+    const TemporaryFolder folder;
+    ASSERT_NO_FATAL_FAILURE(WriteIndex(folder.path(), shape));
+    for (const std::string& name : ListFolder(folder.path())) {
+      const std::string kind = name.substr(std::min(name.find('.'), name.size()));
+      kinds.insert(kind.starts_with(".s") ? ".s" : kind);
+    }
+  }
+  for (const char* kind : {".cfs", ".cfx", ".fnm", ".tis", ".tii", ".frq", ".prx", ".nrm", ".s", ".fdx",
+                           ".fdt", ".tvx", ".tvd", ".tvf", ".del"}) {
+    EXPECT_EQ(kinds.count(kind), 1U) << "no shape has a " << kind;
+  }
+}
 
 bool HoldsUnsafe(const HealthReport& report) {
   return std::any_of(report.findings.begin(), report.findings.end(), [](const HealthFinding& finding) {

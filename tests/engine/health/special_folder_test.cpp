@@ -11,7 +11,6 @@
 #include "elastic/health/index_check.h"
 #include "support/byte_writer.h"
 #include "support/files.h"
-#include "support/library_index.h"
 #include "support/memory_folder.h"
 #include "support/temporary_folder.h"
 #include "support/varied_index.h"
@@ -22,7 +21,6 @@ namespace vantrel::elastic {
 namespace {
 
 using ::quorelastic::testing::ByteWriter;
-using ::quorelastic::testing::LibraryIndex;
 using ::quorelastic::testing::ListFolder;
 using ::quorelastic::testing::MemoryFile;
 using ::quorelastic::testing::MemoryFolder;
