@@ -18,8 +18,6 @@
 namespace quorelastic::testing {
 namespace {
 
-using ::testing::HasSubstr;
-using ::testing::StartsWith;
 
 constexpr char kIoError[] = "vantrel::elastic::IndexIoError";
 
