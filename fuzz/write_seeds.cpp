@@ -134,7 +134,7 @@ void AddSkipsAndPositions(const Corpus& corpus) {
     postings += ByteWriter().VInt(document % 5 == 0 ? 200 * 2 : 3).bytes();
     if (document % 5 == 0) postings += ByteWriter().VInt(3).bytes();
     for (int left = document % 5 == 0 ? 3 : 1; left > 0; --left)
-      positions += ByteWriter().VInt(left * 90).bytes();
+      positions += ByteWriter().VInt(int64_t{90} * left).bytes();
   }
   for (const int payloads : {0, 1}) {
     corpus.Add("positions", "payloads" + std::to_string(payloads),
