@@ -25,8 +25,6 @@ constexpr int32_t kWithHasPositions = -7;
 constexpr int32_t kWithUserData = -8;
 constexpr int32_t kWithDiagnostics = -9;
 
-// Room for any commit; a hole in a file that is larger could be taken for endless user data.
-constexpr uint64_t kLargestCommit = uint64_t{256} << 20;
 constexpr int32_t kMostSegments = int32_t{1} << 16;
 constexpr int32_t kMostFields = int32_t{1} << 18;
 

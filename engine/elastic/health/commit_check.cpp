@@ -1,5 +1,6 @@
 #include "elastic/health/commit_check.h"
 
+#include <algorithm>
 #include <charconv>
 #include <limits>
 #include <set>
@@ -49,6 +50,14 @@ void RequireCommitNames(const format::Folder& folder) {
   }
   if (has_commit) return;
   Refuse(Grade::kDamaged, folder.path(), 0, "an index", "no segments file");
+}
+
+void RefuseTooLarge(const format::Folder& folder, int64_t hinted) {
+  const auto newest = folder.Open(format::CommitFileName(std::max(hinted, format::ListedGeneration(folder))));
+  if (newest->size() <= format::kLargestCommit) return;
+  Refuse(Grade::kUnsafe, newest->name(), 0,
+         "a commit of up to " + std::to_string(format::kLargestCommit) + " bytes",
+         std::to_string(newest->size()));
 }
 
 // A newer commit that is incomplete is passed over, but not one that the disk cannot read: there is no verdict then.
@@ -103,6 +112,11 @@ Commit FindCommit(const format::Folder& folder) {
   } catch (const IndexIoError& error) {
     if (error.path() == folder.path()) throw;
     format::RethrowOpening(error);
+  } catch (const IndexDamagedError&) {
+    throw;
+  } catch (const IndexError&) {
+    RefuseTooLarge(folder, hinted);
+    throw;
   }
   if (hinted > found.generation && IsCommitLost(folder, hinted)) {
     Refuse(Grade::kDamaged, format::JoinPath(folder.path(), std::string(format::kSegmentsGen)), 4,

@@ -64,7 +64,7 @@ void PostingsCheck::PassPositions() {
   for (const uint32_t frequency : postings_.block_frequencies()) {
     positions_->PassDocument(frequency);
     if (at_first && !positions_->states_length()) {
-      Refuse(Grade::kDamaged, positions_->name(), positions_->offset(),
+      Refuse(Grade::kUnsafe, positions_->name(), positions_->offset(),
              "the length of the payload that a skip entry leads to", "that of the one before");
     }
     at_first = false;

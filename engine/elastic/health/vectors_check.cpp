@@ -71,7 +71,8 @@ void VectorsCheck::CheckTerms(size_t field) {
   const format::TermVectorsReader::Field& place = reader_.fields()[field];
   const format::FieldInfo& info = fields_[place.number];
   if (!info.has_vectors) {
-    Refuse(Grade::kDamaged, reader_.document_list().name(), place.offset,
+    // The list may have slipped: what follows in it would then be read as something else.
+    Refuse(Grade::kUnsafe, reader_.document_list().name(), place.offset,
            "number of a field with term vectors",
            std::to_string(place.number) + ", which is " + format::Quoted(info.name));
   }

@@ -131,6 +131,27 @@ TEST_F(SpecialFolderTest, WithABadCommitTwoGenerationsAheadIsDamaged) {
   ExpectDamaged(format::CommitFileName(generation_ + 2), "wanted");
 }
 
+TEST_F(SpecialFolderTest, WithACommitOfATerabyteIsDamaged) {
+  MemoryFolder memory;
+  Load(memory);
+  memory.files[format::CommitFileName(generation_)].zeros_after = uint64_t{1} << 40;
+  const HealthReport report = health::CheckFolder(memory, {});
+  ASSERT_EQ(report.findings.size(), 1U);
+  EXPECT_THAT(report.findings[0].file, EndsWith(format::CommitFileName(generation_)));
+}
+
+// Holes take no time: what is in them is refused before it is read to its end.
+TEST_F(SpecialFolderTest, WithFilesThatGrewByATerabyteIsDamaged) {
+  for (const std::string& name : ListFolder(path())) {
+    if (name.starts_with("segments")) continue;
+    SCOPED_TRACE(name);
+    MemoryFolder memory;
+    Load(memory);
+    memory.files[name].zeros_after = uint64_t{1} << 40;
+    EXPECT_FALSE(health::CheckFolder(memory, {}).clean());
+  }
+}
+
 TEST_F(SpecialFolderTest, WithAFileThatSeemsToBeACommitIsDamagedAndTheFileNamed) {
   for (const char* name : {"segments.old", "segments_4.bak", "segments_", "segmentsx"}) {
     WriteFile(folder_ / name, ReadFile(CommitPath(generation_)));
