@@ -1,5 +1,6 @@
 #pragma once
 
+#include <algorithm>
 #include <cstddef>
 #include <cstdint>
 #include <cstdio>
@@ -28,12 +29,20 @@ class FuzzInput {
     return low | uint32_t{TakeByte()} << 8;
   }
 
-  // All that is left, as a file.
-  std::shared_ptr<const vantrel::elastic::format::ByteSource> TakeSource() {
-    std::string bytes(reinterpret_cast<const char*>(data_), left_);
-    left_ = 0;
-    return quorelastic::testing::SourceOf(bytes);
+  // So many, or all that are left where they are fewer.
+  std::string TakeBytes(size_t count) {
+    std::string bytes(reinterpret_cast<const char*>(data_), std::min(count, left_));
+    data_ += bytes.size();
+    left_ -= bytes.size();
+    return bytes;
   }
+
+  // The same as a file; without a count, all that is left.
+  std::shared_ptr<const vantrel::elastic::format::ByteSource> TakeSource(size_t count = SIZE_MAX) {
+    return quorelastic::testing::SourceOf(TakeBytes(count));
+  }
+
+  size_t left() const { return left_; }
 
  private:
   const uint8_t* data_;

@@ -3,14 +3,17 @@
 //
 //   write_seeds FOLDER
 
+#include <algorithm>
 #include <filesystem>
 #include <iostream>
 #include <string>
+#include <vector>
 
 #include "support/byte_writer.h"
 #include "support/files.h"
 #include "support/random_index.h"
 #include "support/temporary_folder.h"
+#include "support/varied_index.h"
 
 namespace {
 
@@ -55,6 +58,93 @@ void AddIndex(const Corpus& corpus, const RandomIndexShape& shape, const std::st
     if (file.ends_with(".tii"))
       corpus.Add("term_cursor", name + "-index", ByteWriter(kIndex).Raw(bytes).bytes());
     if (file.ends_with(".frq")) corpus.Add("postings", name, ByteWriter(kPostings).Raw(bytes).bytes());
+  }
+}
+
+ByteWriter Length(const std::string& bytes) {
+  return ByteWriter().Byte(static_cast<int>(bytes.size() & 0xff)).Byte(static_cast<int>(bytes.size() >> 8));
+}
+
+// A folder as one input, begun with the file at each third place in turn: only the beginning is varied.
+void AddFolder(const Corpus& corpus, const std::string& folder, const std::string& name) {
+  std::vector<std::string> files = ListFolder(folder);
+  for (size_t turn = 0; turn < files.size(); turn += 3) {
+    ByteWriter whole;
+    for (const std::string& file : files) {
+      const std::string bytes = ReadFile(folder + "/" + file);
+      whole.Byte(static_cast<int>(file.size())).Raw(file).Raw(Length(bytes).bytes()).Raw(bytes);
+    }
+    corpus.Add("index_health", name + std::to_string(turn), whole.bytes());
+    std::rotate(files.begin(), files.begin() + 3 % static_cast<std::ptrdiff_t>(files.size()), files.end());
+  }
+}
+
+void AddStores(const Corpus& corpus, const std::string& folder, const std::string& name) {
+  const auto read = [&](const char* ending) { return ReadFile(folder + "/_0" + ending); };
+  corpus.Add("stored_fields", name, Length(read(".fdx")).Raw(read(".fdx")).Raw(read(".fdt")).bytes());
+  corpus.Add("term_vectors", name,
+             ByteWriter()
+                 .Byte(20)
+                 .Raw(Length(read(".tvx")).bytes())
+                 .Raw(Length(read(".tvd")).bytes())
+                 .Raw(read(".tvx"))
+                 .Raw(read(".tvd"))
+                 .Raw(read(".tvf"))
+                 .bytes());
+}
+
+void AddWholeIndexes(const Corpus& corpus) {
+  const TemporaryFolder plain;
+  quorelastic::testing::WriteVariedIndex(plain.path(), {.seed = 1,
+                                                        .documents = 3,
+                                                        .documents_per_segment = 9,
+                                                        .compound = false,
+                                                        .compound_store = false,
+                                                        .deletions = 1,
+                                                        .changed_norms = 1,
+                                                        .term_index_interval = 4});
+  AddFolder(corpus, plain.path(), "plain");
+  AddStores(corpus, plain.path(), "plain");
+  const TemporaryFolder compound;
+  quorelastic::testing::WriteVariedIndex(compound.path(),
+                                         {.seed = 2, .documents = 4, .documents_per_segment = 2});
+  AddFolder(corpus, compound.path(), "compound");
+}
+
+void AddSkipsAndPositions(const Corpus& corpus) {
+  // 16 documents, the first 15 distances 2, and payloads of one length.
+  corpus.Add("skip_list", "one-level",
+             ByteWriter().Byte(4).Byte(10).Byte(1).Byte(16).Byte(0).VInt(7).VInt(5).VInt(3).VInt(9).bytes());
+  corpus.Add("skip_list", "two-levels",
+             ByteWriter()
+                 .Byte(4)
+                 .Byte(10)
+                 .Byte(0)
+                 .Byte(16)
+                 .Byte(0)
+                 .VLong(4)
+                 .VInt(15)
+                 .VInt(15)
+                 .VInt(15)
+                 .VLong(9)
+                 .bytes());
+  std::string postings = ByteWriter().VInt(0).VInt(2).bytes();
+  std::string positions = ByteWriter().VInt(1).VInt(2).bytes();
+  for (int document = 1; document < 40; ++document) {
+    postings += ByteWriter().VInt(document % 5 == 0 ? 200 * 2 : 3).bytes();
+    if (document % 5 == 0) postings += ByteWriter().VInt(3).bytes();
+    for (int left = document % 5 == 0 ? 3 : 1; left > 0; --left)
+      positions += ByteWriter().VInt(int64_t{90} * left).bytes();
+  }
+  for (const int payloads : {0, 1}) {
+    corpus.Add("positions", "payloads" + std::to_string(payloads),
+               ByteWriter()
+                   .Byte(payloads)
+                   .Byte(40)
+                   .Raw(Length(postings).bytes())
+                   .Raw(postings)
+                   .Raw(positions)
+                   .bytes());
   }
 }
 
@@ -108,5 +198,7 @@ int main(int argc, char** argv) {
            "plain");
   AddIndex(corpus, {.seed = 2, .documents = 5, .deletions = 3}, "compound");
   AddOlderLayouts(corpus);
+  AddWholeIndexes(corpus);
+  AddSkipsAndPositions(corpus);
   return 0;
 }

@@ -91,15 +91,21 @@ std::string Damage::Describe() const {
 }
 
 Damage RandomDamage(const std::string& folder, std::mt19937& random) {
-  const std::vector<std::string> files = ListFolder(folder);
-  const std::string file = RandomFile(random, files);
+  const std::string file = RandomFile(random, ListFolder(folder));
+  return RandomDamageTo(folder, file, random);
+}
+
+Damage RandomDamageTo(const std::string& folder, const std::string& file, std::mt19937& random) {
   const bool is_commit = file.starts_with("segments_");
   const uint64_t size = std::filesystem::file_size(folder + "/" + file);
   Damage damage{.kind = RandomKind(random, is_commit), .file = file};
   damage.offset = RandomOffset(random, size);
   damage.length = 1 + Below(random, 20);
   damage.value = static_cast<int>(Below(random, 256));
-  if (damage.kind == Kind::kReplace) damage.other_file = files[Below(random, files.size())];
+  if (damage.kind == Kind::kReplace) {
+    const std::vector<std::string> files = ListFolder(folder);
+    damage.other_file = files[Below(random, files.size())];
+  }
   return damage;
 }
 

@@ -34,6 +34,9 @@ struct Damage {
 // A damage at random to one of the files in the folder, as they are now.
 Damage RandomDamage(const std::string& folder, std::mt19937& random);
 
+// A damage at random to one file of the folder.
+Damage RandomDamageTo(const std::string& folder, const std::string& file, std::mt19937& random);
+
 // Applies a damage to a file in a folder and undoes it when it goes.
 class DamagedFile {
  public:

@@ -157,6 +157,25 @@ TEST_P(DamagedIndexTest, TheProgramEndsInOutputOrAnUncaughtException) {
   EXPECT_GT(ended_in_output, 0) << "not even damages to files that are not needed leave anything to see";
 }
 
+TEST_P(DamagedIndexTest, TheProgramsCheckEndsInAVerdict) {
+  constexpr int kEvery = 4;
+  int found = 0;
+  for (int i = 0; i < kCasesPerShape; ++i) {
+    const Damage damage = RandomDamage(path(), random_);
+    if (i % (kEvery * RunsEvery()) != 0) continue;
+    SCOPED_TRACE("case " + std::to_string(i) + ": " + damage.Describe());
+    const DamagedFile damaged(path(), damage);
+    const ToolRun run = RunTool({"-a", "check", "-d", path()});
+    ASSERT_TRUE(WIFEXITED(run.status)) << "signal " << WTERMSIG(run.status) << "\n" << run.errors;
+    EXPECT_EQ(WEXITSTATUS(run.status), 0);
+    EXPECT_EQ(run.output, "");
+    EXPECT_THAT(run.errors, ::testing::AnyOf("clean\n", "NOT clean\n"));
+    if (run.errors == "NOT clean\n") ++found;
+  }
+  EXPECT_GT(found, 0);
+  EXPECT_EQ(RunTool({"-a", "check", "-d", path()}).errors, "clean\n");
+}
+
 bool IsNeeded(const std::string& file, bool has_deletions) {
   if (file.starts_with("segments_") || file.ends_with(".cfs")) return true;
   if (file.ends_with(".fnm") || file.ends_with(".tis") || file.ends_with(".tii")) return true;

@@ -1,6 +1,8 @@
 #include "elastic/format/byte_reader.h"
 
 #include <algorithm>
+#include <bit>
+#include <cstring>
 #include <limits>
 #include <utility>
 
@@ -10,7 +12,7 @@
 namespace vantrel::elastic::format {
 
 ByteReader::ByteReader(std::shared_ptr<const ByteSource> source, size_t buffer_size)
-    : source_(std::move(source)), buffer_size_(buffer_size) {}
+    : source_(std::move(source)), size_(source_->size()), buffer_size_(buffer_size) {}
 
 void ByteReader::Damaged(uint64_t offset, const std::string& problem) const {
   throw IndexDamagedError(name(), offset, problem);
@@ -68,6 +70,12 @@ int64_t ByteReader::ReadLong() {
 }
 
 uint32_t ByteReader::ReadLongVInt() {
+  // Two bytes, both in the buffer: most of those that take more than one.
+  if (filled_ - position_ >= 2 && buffer_[position_ + 1] < 0x80) {
+    const uint32_t value = (buffer_[position_] & 0x7fU) | uint32_t{buffer_[position_ + 1]} << 7;
+    position_ += 2;
+    return value;
+  }
   const uint64_t start = offset();
   uint32_t value = 0;
   for (int shift = 0; shift < 28; shift += 7) {
@@ -110,6 +118,55 @@ void ByteReader::ReadBytes(std::span<uint8_t> out) {
   Refill(out.size());
   std::copy_n(buffer_.begin(), out.size(), out.begin());
   position_ = out.size();
+}
+
+std::span<const uint8_t> ByteReader::Take(uint64_t most) {
+  if (position_ == filled_) Refill(1);
+  const auto length = static_cast<size_t>(std::min<uint64_t>(most, filled_ - position_));
+  const std::span<const uint8_t> taken(buffer_.data() + position_, length);
+  position_ += length;
+  return taken;
+}
+
+// Eight bytes at a time, of which six are counted: so a run of three bytes that announce another one lies within some
+// eight of them, wherever it begins.
+bool ByteReader::PassShortVInts(uint64_t count) {
+  constexpr size_t kLoaded = 8;
+  constexpr size_t kCounted = 6;
+  constexpr uint64_t kHighBits = 0x8080808080808080;
+  constexpr uint64_t kCountedBits = kHighBits >> (8 * (kLoaded - kCounted));
+  static_assert(std::endian::native == std::endian::little, "the first byte is the lowest of the eight");
+  while (count > 0) {
+    if (Window(kLoaded).size() < kLoaded) return PassShortVIntsAtEnd(count);
+    const uint8_t* next = buffer_.data() + position_;
+    const uint8_t* const last = buffer_.data() + filled_ - kLoaded;
+    for (; next <= last; next += kCounted) {
+      uint64_t bytes = 0;
+      std::memcpy(&bytes, next, sizeof bytes);
+      const uint64_t more = bytes & kHighBits;
+      if ((more & more >> 8 & more >> 16) != 0) return false;
+      uint64_t ends = ~bytes & kCountedBits;
+      const uint64_t ended = (ends >> 7) * 0x0101010101010101 >> 56;  // how many bits are set
+      if (ended >= count) {
+        while (--count > 0) ends &= ends - 1;
+        position_ = static_cast<size_t>(next - buffer_.data() + std::countr_zero(ends) / 8 + 1);
+        return true;
+      }
+      count -= ended;
+    }
+    position_ = static_cast<size_t>(next - buffer_.data());
+  }
+  return true;
+}
+
+bool ByteReader::PassShortVIntsAtEnd(uint64_t count) {
+  for (int length = 1; count > 0; ++length) {
+    if (remaining() == 0 || length > 3) return false;
+    if (ReadByte() >= 0x80) continue;
+    --count;
+    length = 0;
+  }
+  return true;
 }
 
 std::string ByteReader::ReadString() {

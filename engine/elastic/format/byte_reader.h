@@ -29,7 +29,7 @@ class ByteReader {
   explicit ByteReader(std::shared_ptr<const ByteSource> source, size_t buffer_size = kDefaultBufferSize);
 
   const std::string& name() const { return source_->name(); }
-  uint64_t size() const { return source_->size(); }
+  uint64_t size() const { return size_; }
   uint64_t offset() const { return buffer_start_ + position_; }
   uint64_t remaining() const { return size() - offset(); }
 
@@ -55,6 +55,22 @@ class ByteReader {
 
   void ReadBytes(std::span<uint8_t> out);
 
+  // Moves past the next bytes, at least one and at most `most` (which is not 0), and hands them out as they lie
+  // in the buffer, valid until the next call. For who goes through many bytes without keeping them.
+  std::span<const uint8_t> Take(uint64_t most);
+
+  // The next bytes as they lie in the buffer, at least `wanted` where the source has so many and the buffer holds
+  // them, without moving; valid until the next call. Then Advance(), by no more than was handed out.
+  std::span<const uint8_t> Window(size_t wanted) {
+    if (filled_ - position_ < wanted && remaining() > filled_ - position_) Refill(1);
+    return {buffer_.data() + position_, filled_ - position_};
+  }
+  void Advance(size_t count) { position_ += count; }
+
+  // Moves past `count` VInts, if each of them takes three bytes at most; false, and somewhere behind, where one is
+  // longer, or may be, or the source ends.
+  bool PassShortVInts(uint64_t count);
+
   // A string; throws also when it is not valid UTF-8, or longer than kLongestText.
   std::string ReadString();
 
@@ -65,8 +81,10 @@ class ByteReader {
   uint32_t ReadLongVInt();
   uint64_t ReadLongVLong();
   void Refill(uint64_t wanted);
+  bool PassShortVIntsAtEnd(uint64_t count);
 
   std::shared_ptr<const ByteSource> source_;
+  uint64_t size_;
   size_t buffer_size_;
   std::vector<uint8_t> buffer_;
   uint64_t buffer_start_ = 0;  // offset in the source of buffer_[0]

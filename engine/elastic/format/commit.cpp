@@ -25,9 +25,8 @@ constexpr int32_t kWithHasPositions = -7;
 constexpr int32_t kWithUserData = -8;
 constexpr int32_t kWithDiagnostics = -9;
 
-// Room for any commit; a hole in a file that is larger could be taken for endless user data.
-constexpr uint64_t kLargestCommit = uint64_t{256} << 20;
 constexpr int32_t kMostSegments = int32_t{1} << 16;
+constexpr int32_t kMostFields = int32_t{1} << 18;
 
 void SkipString(ByteReader& reader) { reader.Skip(reader.ReadVInt()); }
 
@@ -38,11 +37,16 @@ void SkipStringMap(ByteReader& reader) {
   }
 }
 
-void SkipNormGenerations(ByteReader& reader) {
+std::optional<std::vector<int64_t>> ReadNormGenerations(ByteReader& reader) {
   const uint64_t start = reader.offset();
   const int32_t count = reader.ReadInt();
-  if (count < -1) reader.Damaged(start, "count of norm generations is " + std::to_string(count));
-  if (count > 0) reader.Skip(static_cast<uint64_t>(count) * 8);
+  if (count == -1) return std::nullopt;
+  if (count < 0 || count > kMostFields || static_cast<uint64_t>(count) > reader.remaining() / 8) {
+    reader.Damaged(start, "count of norm generations is " + std::to_string(count));
+  }
+  std::vector<int64_t> generations(static_cast<size_t>(count));
+  for (int64_t& generation : generations) generation = reader.ReadLong();
+  return generations;
 }
 
 SegmentInfo::Compound ReadCompound(ByteReader& reader) {
@@ -56,6 +60,13 @@ std::string ReadSegmentName(ByteReader& reader) {
   std::string name = reader.ReadString();
   if (!IsSegmentName(name)) reader.Damaged(start, "segment name is not '_' and a number in base 36");
   return name;
+}
+
+void ReadStore(ByteReader& reader, SegmentInfo& segment) {
+  segment.store_offset = reader.ReadInt();
+  if (segment.store_offset == SegmentInfo::kOwnStore) return;
+  segment.store_segment = ReadSegmentName(reader);
+  segment.store_is_compound = reader.ReadByte() == 1;
 }
 
 SegmentInfo ReadSegment(ByteReader& reader, int32_t format) {
@@ -76,15 +87,12 @@ SegmentInfo ReadSegment(ByteReader& reader, int32_t format) {
     reader.Damaged(generation_start,
                    "generation of deletions is " + std::to_string(segment.deletions_generation));
   }
-  if (format <= kWithSharedStores && reader.ReadInt() != -1) {
-    ReadSegmentName(reader);
-    reader.ReadByte();
-  }
-  if (format <= kWithSingleNorms) reader.ReadByte();
-  SkipNormGenerations(reader);
+  if (format <= kWithSharedStores) ReadStore(reader, segment);
+  if (format <= kWithSingleNorms) segment.has_norms_file = reader.ReadByte() == 1;
+  segment.norm_generations = ReadNormGenerations(reader);
   segment.compound = ReadCompound(reader);
-  if (format <= kWithDeletionCount) reader.ReadInt();
-  if (format <= kWithHasPositions) reader.ReadByte();
+  if (format <= kWithDeletionCount) segment.deleted_count = reader.ReadInt();
+  if (format <= kWithHasPositions) segment.has_positions = reader.ReadByte() == 1;
   if (format <= kWithDiagnostics) SkipStringMap(reader);
   return segment;
 }
@@ -114,7 +122,12 @@ void CheckChecksum(const ByteSource& source, ByteReader& reader) {
   }
 }
 
-// The newest generation in the folder, -1 without any.
+int64_t NewestGeneration(const Folder& folder) {
+  return std::max(ListedGeneration(folder), HintedGeneration(folder));
+}
+
+}  // namespace
+
 int64_t ListedGeneration(const Folder& folder) {
   int64_t newest = -1;
   for (const std::string& name : folder.List()) {
@@ -128,8 +141,6 @@ int64_t ListedGeneration(const Folder& folder) {
   return newest;
 }
 
-// What segments.gen says, -1 where it is missing, torn or unreadable: it is but a hint.
-//   Int -2, Long generation, Long the same generation
 int64_t HintedGeneration(const Folder& folder) {
   try {
     ByteReader reader(folder.Open(std::string(kSegmentsGen)));
@@ -140,12 +151,6 @@ int64_t HintedGeneration(const Folder& folder) {
     return -1;
   }
 }
-
-int64_t NewestGeneration(const Folder& folder) {
-  return std::max(ListedGeneration(folder), HintedGeneration(folder));
-}
-
-}  // namespace
 
 Commit ReadCommit(const std::shared_ptr<const ByteSource>& source, int64_t generation) {
   if (source->size() > kLargestCommit) {
@@ -158,9 +163,11 @@ Commit ReadCommit(const std::shared_ptr<const ByteSource>& source, int64_t gener
   if (format < kWithDiagnostics) {
     reader.Damaged(0, "format is " + std::to_string(format) + ", but -9 is the newest known");
   }
+  commit.format = std::min(format, 0);
+  commit.counter = format;
   if (format < 0) {
     reader.ReadLong();
-    reader.ReadInt();
+    commit.counter = reader.ReadInt();
   }
   const uint64_t count_start = reader.offset();
   const int32_t count = reader.ReadInt();
@@ -170,6 +177,10 @@ Commit ReadCommit(const std::shared_ptr<const ByteSource>& source, int64_t gener
   for (int32_t i = 0; i < count; ++i) commit.segments.push_back(ReadSegment(reader, format));
   if (format < 0) SkipUserData(reader, format);
   if (format <= kWithChecksum) CheckChecksum(*source, reader);
+  // The oldest layout may have its version here.
+  if (format >= 0 && reader.remaining() >= 8) reader.ReadLong();
+  commit.end = reader.offset();
+  commit.size = reader.size();
   return commit;
 }
 

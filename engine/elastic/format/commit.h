@@ -3,6 +3,7 @@
 #include <cstdint>
 #include <functional>
 #include <memory>
+#include <optional>
 #include <string>
 #include <vector>
 
@@ -18,17 +19,42 @@ struct SegmentInfo {
 
   enum class Compound { kNo, kYes, kLookForFile };
 
+  static constexpr int32_t kOwnStore = -1;
+  static constexpr int32_t kNotCounted = -1;
+  static constexpr int64_t kNoOwnNorms = -1;
+  static constexpr int64_t kLookForNorms = 0;
+
   std::string name;            // "_0"
   int32_t document_count = 0;  // deleted ones included; 0 or more
   int64_t deletions_generation = kNoDeletions;
+  int32_t deleted_count = kNotCounted;
   Compound compound = Compound::kLookForFile;
+
+  // Where the stored fields and term vectors begin in a document store that several segments share.
+  int32_t store_offset = kOwnStore;
+  std::string store_segment = {};  // the store's name, that of a segment
+  bool store_is_compound = false;
+
+  // All norms in one file (.nrm), but for those that were changed: by field number, the generation of the file
+  // with a field's own norms (.sN). Absent: the norms of no field were changed; in the older layouts, look.
+  bool has_norms_file = false;
+  std::optional<std::vector<int64_t>> norm_generations = {};
+
+  std::optional<bool> has_positions = {};  // whether any field's postings have some
 };
 
 // A point in the index's life: the segments that make it up.
 struct Commit {
   int64_t generation = 0;
+  int32_t format = 0;   // 0 for the oldest layout
+  int32_t counter = 0;  // the number of the next segment
   std::vector<SegmentInfo> segments;
+  uint64_t end = 0;   // where in the file the layout ends
+  uint64_t size = 0;  // of the file
 };
+
+// Room for any commit, in bytes; a hole in a file that is larger could be taken for endless user data.
+inline constexpr uint64_t kLargestCommit = uint64_t{256} << 20;
 
 // Decodes a file segments_N. Layout, by format number F (the newer the smaller; -9 is written today):
 //
@@ -47,10 +73,20 @@ struct Commit {
 //     F <= -9: Int count of diagnostics, two Strings each
 //   F = -8: Byte has user data, if so one String;  F <= -9: Int count of user data, two Strings each
 //   F <= -5: Long CRC-32 of every byte before it
+//   the oldest layout: Long version, or nothing
 //
 // Bytes after that are ignored. Throws IndexDamagedError, IndexIoError, and IndexError for a file of over
 // 256 MiB, which no commit reaches.
 Commit ReadCommit(const std::shared_ptr<const ByteSource>& source, int64_t generation);
+
+// What segments.gen says of the newest generation, -1 where it is missing, torn or unreadable: it is but a hint.
+//
+//   Int -2, Long generation, Long the same generation
+int64_t HintedGeneration(const Folder& folder);
+
+// The newest generation that the folder lists, -1 without any. Throws IndexIoError, and IndexError for a name that
+// stands for a commit, but holds no generation.
+int64_t ListedGeneration(const Folder& folder);
 
 // Finds the newest commit of the folder that `use` accepts, and hands it over. The newest generation is the
 // larger of what the folder lists and what segments.gen says; the one before it is tried where the newest is

@@ -58,6 +58,15 @@ CompoundFile::CompoundFile(std::shared_ptr<const ByteSource> source) : source_(s
     last = &part->second;
   }
   if (last != nullptr) last->size = reader.size() - last->offset;
+  table_end_ = reader.offset();
+  first_offset_ = first_offset;
+}
+
+std::vector<std::string> CompoundFile::Names() const {
+  std::vector<std::string> names;
+  names.reserve(parts_.size());
+  for (const auto& [name, part] : parts_) names.push_back(name);
+  return names;
 }
 
 std::shared_ptr<const ByteSource> CompoundFile::Open(const std::string& name) const {

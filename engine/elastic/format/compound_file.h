@@ -3,6 +3,7 @@
 #include <map>
 #include <memory>
 #include <string>
+#include <vector>
 
 #include "elastic/format/byte_source.h"
 
@@ -28,12 +29,22 @@ class CompoundFile {
 
   bool Exists(const std::string& name) const { return parts_.contains(name); }
 
+  // The names of the sub-files, sorted.
+  std::vector<std::string> Names() const;
+
+  const ByteSource& source() const { return *source_; }
+  uint64_t table_end() const { return table_end_; }
+  // Where the first sub-file begins; the end of the file where there is none.
+  uint64_t first_offset() const { return first_offset_; }
+
   // A view of a sub-file that shares the ownership of this file. Throws IndexError when there is none.
   std::shared_ptr<const ByteSource> Open(const std::string& name) const;
 
  private:
   std::shared_ptr<const ByteSource> source_;
   std::map<std::string, Part> parts_;
+  uint64_t table_end_ = 0;
+  uint64_t first_offset_ = 0;
 };
 
 }  // namespace vantrel::elastic::format

@@ -26,6 +26,7 @@ Deletions::Deletions(std::shared_ptr<const ByteSource> source, int32_t document_
                                     ", but the segment has " + std::to_string(document_count));
   }
   is_sparse_ ? ReadSparse(reader) : ReadDense(reader);
+  end_ = reader.offset();
 }
 
 void Deletions::ReadDense(ByteReader& reader) {

@@ -25,6 +25,9 @@ class Deletions {
 
   int32_t count() const { return count_; }
 
+  // Where in the file the layout ends; nothing should follow.
+  uint64_t end() const { return end_; }
+
   // `document` must lie in the segment. Throws IndexIoError, and IndexDamagedError where the file has changed
   // since it was first read.
   bool Contains(int32_t document);
@@ -63,6 +66,7 @@ class Deletions {
   int32_t count_ = 0;
   uint64_t byte_count_;
   bool is_sparse_ = false;
+  uint64_t end_ = 0;
   std::vector<BlockStart> block_starts_;
   uint64_t sparse_count_ = 0;
   std::vector<Block> blocks_;

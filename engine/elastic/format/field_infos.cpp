@@ -14,8 +14,26 @@ namespace {
 constexpr auto kFormat = static_cast<uint32_t>(-2);
 constexpr uint32_t kMostFields = uint32_t{1} << 18;
 constexpr uint64_t kShortestField = 2;  // an empty name, the flags
+
+// The flags.
 constexpr uint8_t kIndexed = 0x01;
+constexpr uint8_t kVectors = 0x02;
+constexpr uint8_t kVectorPositions = 0x04;
+constexpr uint8_t kVectorOffsets = 0x08;
+constexpr uint8_t kOmitsNorms = 0x10;
+constexpr uint8_t kPayloads = 0x20;
 constexpr uint8_t kOmitsFrequencies = 0x40;
+
+void SetFlags(FieldInfo& field, uint8_t flags) {
+  field.flags = flags;
+  field.indexed = (flags & kIndexed) != 0;
+  field.omits_frequencies = (flags & kOmitsFrequencies) != 0;
+  field.has_vectors = (flags & kVectors) != 0;
+  field.has_vector_positions = (flags & kVectorPositions) != 0;
+  field.has_vector_offsets = (flags & kVectorOffsets) != 0;
+  field.omits_norms = (flags & kOmitsNorms) != 0;
+  field.has_payloads = (flags & kPayloads) != 0;
+}
 
 enum class Names { kUtf8, kUtf16Units };
 
@@ -50,9 +68,8 @@ std::vector<FieldInfo> ReadAll(ByteReader& reader, Names names) {
     if (!seen.insert(field.name).second) {
       reader.Damaged(start, "field " + std::to_string(fields.size() - 1) + " bears the name of one before");
     }
-    const uint8_t flags = reader.ReadByte();
-    field.indexed = (flags & kIndexed) != 0;
-    field.omits_frequencies = (flags & kOmitsFrequencies) != 0;
+    field.offset = start;
+    SetFlags(field, reader.ReadByte());
   }
   if (reader.remaining() != 0) {
     reader.Damaged(reader.offset(),

@@ -13,6 +13,13 @@ struct FieldInfo {
   std::string name;  // UTF-8, may be empty
   bool indexed = false;
   bool omits_frequencies = false;  // postings hold neither frequencies nor positions
+  bool has_vectors = false;
+  bool has_vector_positions = false;
+  bool has_vector_offsets = false;
+  bool omits_norms = false;
+  bool has_payloads = false;
+  uint64_t offset = 0;  // where in the file the field stands
+  uint8_t flags = 0;    // as they stand there
 };
 
 // The fields of a segment (.fnm), by their number. Layout:

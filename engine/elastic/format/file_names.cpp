@@ -47,4 +47,9 @@ std::string DeletionsFileName(const std::string& segment, int64_t generation) {
   return generation == 0 ? segment + ".del" : segment + "_" + ToBase36(generation) + ".del";
 }
 
+std::string NormsFileName(const std::string& segment, size_t field, int64_t generation) {
+  const std::string extension = ".s" + std::to_string(field);
+  return generation == 0 ? segment + extension : segment + "_" + ToBase36(generation) + extension;
+}
+
 }  // namespace vantrel::elastic::format

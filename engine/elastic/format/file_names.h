@@ -1,5 +1,6 @@
 #pragma once
 
+#include <cstddef>
 #include <cstdint>
 #include <optional>
 #include <string>
@@ -14,6 +15,7 @@ namespace vantrel::elastic::format {
 //   segments.gen      a hint at the newest generation
 //   _S.ext            a file of segment _S, where S is a number in base 36
 //   _S_N.del          the deleted documents of segment _S, generation N
+//   _S_N.sF           the norms of its field number F (in base 10), generation N
 inline constexpr std::string_view kSegments = "segments";
 inline constexpr std::string_view kSegmentsGen = "segments.gen";
 
@@ -27,5 +29,8 @@ bool IsSegmentName(std::string_view name);
 
 // Generation 0 names the file without a generation.
 std::string DeletionsFileName(const std::string& segment, int64_t generation);
+
+// A field's own norms, by its number; generation 0 as above.
+std::string NormsFileName(const std::string& segment, size_t field, int64_t generation);
 
 }  // namespace vantrel::elastic::format

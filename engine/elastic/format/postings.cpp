@@ -5,8 +5,9 @@
 
 namespace vantrel::elastic::format {
 
-PostingsReader::PostingsReader(std::shared_ptr<const ByteSource> source, int32_t document_count)
-    : reader_(std::move(source)), document_count_(static_cast<uint32_t>(document_count)) {}
+PostingsReader::PostingsReader(std::shared_ptr<const ByteSource> source, int32_t document_count,
+                               size_t buffer_size)
+    : reader_(std::move(source), buffer_size), document_count_(static_cast<uint32_t>(document_count)) {}
 
 void PostingsReader::Seek(const TermInfo& term, bool omits_frequencies) {
   reader_.Seek(term.postings_pointer);
@@ -16,23 +17,77 @@ void PostingsReader::Seek(const TermInfo& term, bool omits_frequencies) {
   document_ = 0;
 }
 
-bool PostingsReader::Next() {
-  if (left_ == 0) return false;
-  const uint64_t start = reader_.offset();
-  const uint32_t code = reader_.ReadVInt();
-  const uint32_t distance = omits_frequencies_ ? code : code >> 1;
-  const bool once = omits_frequencies_ || (code & 1) != 0;
-  frequency_ = once ? 1 : reader_.ReadVInt();
+namespace {
+
+constexpr size_t kLongestPosting = 10;  // bytes
+
+// Goes on with a VInt whose first byte announces more; `is_long` where it takes five bytes or more.
+inline const uint8_t* FinishVInt(const uint8_t* next, uint32_t& value, bool& is_long) {
+  value = (value & 0x7f) | static_cast<uint32_t>(*next & 0x7f) << 7;
+  if (*next++ < 0x80) return next;
+  value |= static_cast<uint32_t>(*next & 0x7f) << 14;
+  if (*next++ < 0x80) return next;
+  value |= static_cast<uint32_t>(*next & 0x7f) << 21;
+  if (*next++ >= 0x80) is_long = true;
+  return next;
+}
+
+}  // namespace
+
+// Decodes without looking at each number, and only then whether all were good. False, having done nothing, where they
+// were not, or are such that only Next() can tell.
+template <bool kOmitsFrequencies>
+bool PostingsReader::PassQuickly(int32_t count) {
+  const auto window = reader_.Window(static_cast<size_t>(count) * kLongestPosting);
+  if (window.size() < static_cast<size_t>(count) * kLongestPosting) return false;
+  const uint8_t* next = window.data();
+  uint32_t* const frequencies = block_.data() + block_count_;
+  uint64_t document = static_cast<uint32_t>(document_);
+  bool is_bad = false;
+  for (int32_t i = 0; i < count; ++i) {
+    uint32_t code = *next++;
+    if (code >= 0x80) next = FinishVInt(next, code, is_bad);
+    uint32_t distance = code;
+    uint32_t frequency = 1;
+    if constexpr (!kOmitsFrequencies) {
+      distance = code >> 1;
+      if ((code & 1) == 0) {
+        frequency = *next++;
+        if (frequency >= 0x80) next = FinishVInt(next, frequency, is_bad);
+      }
+    }
+    is_bad = is_bad || distance == 0 || frequency == 0;
+    document += distance;
+    frequencies[i] = frequency;
+  }
+  if (is_bad || document >= document_count_) return false;
+  reader_.Advance(static_cast<size_t>(next - window.data()));
+  document_ = static_cast<int32_t>(document);
+  left_ -= count;
+  for (int32_t i = 0; i < count; ++i) AddToBlock(frequencies[i]);
+  return true;
+}
+
+void PostingsReader::PassBlock(int32_t count) {
+  block_count_ = 0;
+  block_occurrences_ = 0;
+  block_bound_ = 0;
+  // The first one may be document 0, at no distance.
+  if (at_first_ && count > 0 && Next()) {
+    AddToBlock(frequency_);
+    --count;
+  }
+  if (omits_frequencies_ ? PassQuickly<true>(count) : PassQuickly<false>(count)) return;
+  for (; count > 0 && Next(); --count) AddToBlock(frequency_);
+}
+
+void PostingsReader::Refuse(uint32_t distance) const {
   const auto before = static_cast<uint32_t>(document_);
   if ((distance == 0 && !at_first_) || distance >= document_count_ - before) {
-    reader_.Damaged(start, "posting lies " + std::to_string(distance) + " after document " +
-                               std::to_string(before) + " of " + std::to_string(document_count_));
+    reader_.Damaged(start_, "posting lies " + std::to_string(distance) + " after document " +
+                                std::to_string(before) + " of " + std::to_string(document_count_));
   }
-  if (frequency_ == 0) reader_.Damaged(start, "posting has frequency 0");
-  document_ = static_cast<int32_t>(before + distance);
-  at_first_ = false;
-  --left_;
-  return true;
+  reader_.Damaged(start_, "posting has frequency 0");
 }
 
 }  // namespace vantrel::elastic::format

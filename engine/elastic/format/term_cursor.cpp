@@ -42,7 +42,7 @@ void TermCursor::ReadHeader() {
     index_interval_ = reader_.ReadInt();
     skip_interval_ = reader_.ReadInt();
   }
-  if (format_ <= kWithSkipLevels) reader_.ReadInt();
+  if (format_ <= kWithSkipLevels) most_skip_levels_ = reader_.ReadInt();
   if (index_interval_ <= 0 || skip_interval_ <= 0) {
     reader_.Damaged(intervals_start, "index interval " + std::to_string(index_interval_) +
                                          " and skip interval " + std::to_string(skip_interval_) +

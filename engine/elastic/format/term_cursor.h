@@ -34,7 +34,7 @@ struct TermPlace {
 //   Int F                 absent when the first Int is 0 or more: the oldest layout, and that is the count
 //   Long count of terms
 //   Int index interval, Int skip interval    F = -1: in .tis only, and the second means something else
-//   F <= -3: Int most skip levels
+//   F <= -3: Int most skip levels            before: 1
 //   then for each term
 //     VInt prefix shared with the term before, VInt length of what follows, that text
 //       (F = -4: in bytes, UTF-8; before: in UTF-16 code units, see text.h)
@@ -56,6 +56,9 @@ class TermCursor {
   int32_t index_interval() const { return index_interval_; }
   int32_t skip_interval() const { return skip_interval_; }
   bool is_utf8() const { return format_ == kUtf8Format; }  // the layout of today, sorted by bytes
+  int32_t most_skip_levels() const { return most_skip_levels_; }
+  int32_t format() const { return format_; }  // 0 for the oldest layout
+  const std::string& name() const { return reader_.name(); }
 
   // Moves to the next term, at first to the first one; false at the end. At the end it is checked that the
   // file ends there too.
@@ -104,6 +107,7 @@ class TermCursor {
   uint64_t count_ = 0;
   int32_t index_interval_ = 0;
   int32_t skip_interval_ = 0;
+  int32_t most_skip_levels_ = 1;
 
   uint64_t walked_ = 0;
   uint64_t term_offset_ = 0;

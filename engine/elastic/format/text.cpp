@@ -1,6 +1,8 @@
 #include "elastic/format/text.h"
 
+#include <algorithm>
 #include <cstdint>
+#include <cstring>
 
 namespace vantrel::elastic::format {
 namespace {
@@ -26,6 +28,21 @@ bool DecodeMultibyte(const uint8_t*& next, const uint8_t* end, char32_t& code_po
   next += length;
   code_point = value;
   return true;
+}
+
+// How many bytes a sequence has that begins with `lead`, as far as that tells.
+size_t SequenceLength(uint8_t lead) { return lead >= 0xf0 ? 4 : lead >= 0xe0 ? 3 : lead >= 0xc0 ? 2 : 1; }
+
+// Moves past ASCII, eight bytes at a time.
+const uint8_t* SkipAscii(const uint8_t* next, const uint8_t* end) {
+  while (end - next >= 8) {
+    uint64_t eight = 0;
+    std::memcpy(&eight, next, sizeof eight);
+    if ((eight & 0x8080808080808080U) != 0) break;
+    next += 8;
+  }
+  while (next != end && *next < 0x80) ++next;
+  return next;
 }
 
 template <typename Sink>
@@ -79,7 +96,53 @@ void AppendUtf8(char32_t code_point, std::string& out) {
 }
 
 bool IsValidUtf8(std::string_view text) {
-  return ForEachCodePoint(text, [](char32_t) {});
+  const auto* next = reinterpret_cast<const uint8_t*>(text.data());
+  const uint8_t* const end = next + text.size();
+  char32_t ignored = 0;
+  while ((next = SkipAscii(next, end)) != end) {
+    if (!DecodeMultibyte(next, end, ignored)) return false;
+  }
+  return true;
+}
+
+bool IsKeptText(std::string_view text) {
+  const auto* next = reinterpret_cast<const uint8_t*>(text.data());
+  const uint8_t* const end = next + text.size();
+  char32_t code_point = 0;
+  while ((next = SkipAscii(next, end)) != end) {
+    if (!DecodeMultibyte(next, end, code_point)) return false;
+    if (code_point == 0xfffe || code_point == 0xffff || code_point == 0x1ffff) return false;
+  }
+  return true;
+}
+
+bool Utf8Scanner::CompleteHeld(std::span<const uint8_t>& piece) {
+  const size_t length = SequenceLength(held_[0]);
+  while (held_count_ < length && !piece.empty()) {
+    held_[held_count_++] = piece.front();
+    piece = piece.subspan(1);
+  }
+  if (held_count_ < length) return true;
+  const uint8_t* next = held_.data();
+  char32_t ignored = 0;
+  held_count_ = 0;
+  return DecodeMultibyte(next, held_.data() + length, ignored);
+}
+
+bool Utf8Scanner::Take(std::span<const uint8_t> piece) {
+  if (held_count_ > 0 && !CompleteHeld(piece)) return false;
+  const uint8_t* next = piece.data();
+  const uint8_t* const end = next + piece.size();
+  char32_t ignored = 0;
+  while ((next = SkipAscii(next, end)) != end) {
+    if (static_cast<size_t>(end - next) < SequenceLength(*next)) {
+      held_count_ = static_cast<size_t>(end - next);
+      std::copy(next, end, held_.begin());
+      return true;
+    }
+    if (!DecodeMultibyte(next, end, ignored)) return false;
+  }
+  return true;
 }
 
 bool AppendCodePoints(std::string_view text, std::wstring& out) {

@@ -1,6 +1,9 @@
 #pragma once
 
+#include <array>
+#include <cstddef>
 #include <cstdint>
+#include <span>
 #include <string>
 #include <string_view>
 
@@ -25,6 +28,26 @@ void AppendUtf8(char32_t code_point, std::string& out);
 
 // Well-formed UTF-8: shortest forms only, no surrogates, nothing above U+10FFFF.
 bool IsValidUtf8(std::string_view text);
+
+// Well-formed UTF-8 that the index library can keep: it takes U+FFFE and U+FFFF for errors and loses the whole text
+// over them, and U+1FFFF for the text's end.
+bool IsKeptText(std::string_view text);
+
+// IsValidUtf8 for a text that comes in pieces, which may cut a character in two. For one thread at a time.
+class Utf8Scanner {
+ public:
+  // False once the text is ill-formed; what is missing of a last character is for the next piece.
+  bool Take(std::span<const uint8_t> piece);
+
+  // Whether the pieces so far end with a whole character.
+  bool IsComplete() const { return held_count_ == 0; }
+
+ private:
+  bool CompleteHeld(std::span<const uint8_t>& piece);
+
+  std::array<uint8_t, 4> held_{};  // the beginning of a character
+  size_t held_count_ = 0;
+};
 
 // Appends the code points of `text` to `out`; false, with `out` half filled, where it is not well-formed.
 bool AppendCodePoints(std::string_view text, std::wstring& out);

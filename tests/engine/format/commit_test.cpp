@@ -72,6 +72,9 @@ TEST_P(CommitOfAnyFormatTest, YieldsItsSegmentsInOrder) {
       .name = "_10", .documents = 0, .shares_store = true, .norm_generations = 3, .compound = 0};
   const Commit commit = Read(CommitBytes(format, {SegmentBytes{}, plain, rich}));
   EXPECT_EQ(commit.generation, 5);
+  EXPECT_EQ(commit.format, format);
+  EXPECT_EQ(commit.counter, 42);
+  EXPECT_EQ(commit.end, commit.size);
   ASSERT_EQ(commit.segments.size(), 3U);
   EXPECT_EQ(commit.segments[0].name, "_0");
   EXPECT_EQ(commit.segments[0].document_count, 7);
@@ -89,6 +92,13 @@ TEST_P(CommitOfAnyFormatTest, YieldsItsSegmentsInOrder) {
   }
   EXPECT_EQ(commit.segments[0].deletions_generation, SegmentInfo::kNoDeletions);
   EXPECT_EQ(commit.segments[1].deletions_generation, 36);
+  EXPECT_FALSE(commit.segments[0].norm_generations.has_value());
+  EXPECT_EQ(commit.segments[2].norm_generations, (std::vector<int64_t>{0, 1, 2}));
+  EXPECT_EQ(commit.segments[2].has_norms_file, format <= -3);
+  EXPECT_EQ(commit.segments[2].store_offset, format <= -4 ? 100 : SegmentInfo::kOwnStore);
+  EXPECT_EQ(commit.segments[2].store_segment, format <= -4 ? "_a" : "");
+  EXPECT_EQ(commit.segments[2].deleted_count, format <= -6 ? 3 : SegmentInfo::kNotCounted);
+  EXPECT_EQ(commit.segments[2].has_positions.has_value(), format <= -7);
   EXPECT_EQ(commit.segments[0].compound, Compound::kYes);
   EXPECT_EQ(commit.segments[1].compound, Compound::kNo);
   EXPECT_EQ(commit.segments[2].compound, Compound::kLookForFile);
@@ -144,8 +154,10 @@ TEST(CommitTest, RefusesCountsThatCannotBe) {
   ExpectDamage(27, "generation of deletions is -2", [&] { Read(ByteWriter(one).Int(1).Long(-2).bytes()); });
   const ByteWriter norms = ByteWriter(one).Int(1).Long(-1).Int(-1).Byte(1);
   ExpectDamage(40, "count of norm generations is -2", [&] { Read(ByteWriter(norms).Int(-2).bytes()); });
-  ExpectDamage(44, "wanted to skip 17179869176 bytes",
+  ExpectDamage(40, "count of norm generations is 2147483647",
                [&] { Read(ByteWriter(norms).Int(0x7fffffff).bytes()); });
+  ExpectDamage(40, "count of norm generations is 2",
+               [&] { Read(ByteWriter(norms).Int(2).Long(1).Raw("short").bytes()); });
   const ByteWriter strings = ByteWriter(norms).Int(-1).Byte(1).Int(0).Byte(1);
   ExpectDamage(54, "more bytes", [&] { Read(ByteWriter(strings).Int(0x7fffffff).bytes()); });
   ExpectDamage(59, "wanted to skip 4294967295 bytes",

@@ -1,0 +1,99 @@
+#pragma once
+
+#include <exception>
+#include <map>
+#include <memory>
+#include <optional>
+#include <string>
+#include <vector>
+
+#include "elastic/format/byte_source.h"
+#include "elastic/format/commit.h"
+#include "elastic/format/compound_file.h"
+#include "elastic/format/folder.h"
+#include "vantrel/elastic/index_error.h"
+
+namespace vantrel::elastic::format {
+
+// A file of a segment is not there, or may not be opened. what() and path() are those of the failed opening.
+class FileMissingError : public IndexError {
+ public:
+  using IndexError::IndexError;
+};
+
+// Whether the index can be blamed for a failed opening. Anything else (no memory, no more open files, a failing disk)
+// says nothing about it.
+bool IsMissingError(const IndexIoError& error);
+
+// Throws a failed opening on: as FileMissingError where the index can be blamed for it, else as it is.
+[[noreturn]] void RethrowOpening(const IndexIoError& error);
+
+// Every file of a segment, plain, out of a compound file (.cfs), or out of a document store that it shares with
+// others (of its own name, plain or as .cfx). What is there is opened at once and stays open, so that a writer may
+// delete it; what is missing is told when it is asked for.
+//
+//   .fnm .tis .tii .frq .prx .nrm .fN       in the segment's compound file, if it has one
+//   .fdx .fdt .tvx .tvd .tvf                in its document store, its own being where the files above are
+//   .del .sN                                always beside, with their generations in the name
+class WholeSegment {
+ public:
+  // Throws where the system has no room for one more open file, or fails otherwise: whatever is the matter, it is
+  // not the index.
+  WholeSegment(const Folder& folder, SegmentInfo info);
+
+  const SegmentInfo& info() const { return info_; }
+
+  // A file by its extension, such as ".tis". Open() throws FileMissingError, and IndexDamagedError where the
+  // compound file that should hold it is damaged.
+  bool Has(const std::string& extension) const;
+  std::shared_ptr<const ByteSource> Open(const std::string& extension) const;
+
+  // The norms of a field: its own file (.sN), or the common one, or, in the older layouts, one for each field (.fN).
+  std::shared_ptr<const ByteSource> OpenNorms(size_t field) const;
+  bool HasOwnNorms(size_t field) const;
+
+  // Nothing where no documents are deleted.
+  std::shared_ptr<const ByteSource> OpenDeletions() const;
+  bool HasDeletions() const { return has_deletions_; }
+
+  // The segment's compound files, with the segment whose name their sub-files bear. Throws as Open() does where
+  // the commit names one that cannot be used.
+  struct Compound {
+    std::string segment;
+    const CompoundFile* file;
+  };
+  std::vector<Compound> Compounds() const;
+
+  // How many files it holds open.
+  size_t open_files() const { return open_files_; }
+  uint64_t total_size() const { return total_size_; }
+
+ private:
+  // A file or why it is not there.
+  struct Slot {
+    std::shared_ptr<const ByteSource> source;
+    std::exception_ptr failure;
+  };
+  struct CompoundSlot {
+    std::optional<CompoundFile> file;
+    std::exception_ptr failure;
+  };
+
+  Slot OpenPlain(const Folder& folder, const std::string& name);
+  void OpenCompound(const Folder& folder, const std::string& name, CompoundSlot& slot);
+  void OpenParts(const Folder& folder, const std::string& segment, const CompoundSlot* compound,
+                 const std::vector<std::string>& extensions);
+  void OpenOldNorms(const Folder& folder);
+  void OpenOwnNorms(const Folder& folder);
+
+  SegmentInfo info_;
+  std::map<std::string, Slot> slots_;  // by extension
+  std::optional<CompoundSlot> compound_;
+  std::optional<CompoundSlot> store_;
+  bool has_deletions_ = false;
+  size_t open_files_ = 0;
+  uint64_t total_size_ = 0;
+  std::string folder_path_;
+};
+
+}  // namespace vantrel::elastic::format

@@ -1,0 +1,17 @@
+#pragma once
+
+#include <optional>
+
+#include "elastic/format/commit.h"
+#include "elastic/format/folder.h"
+
+namespace vantrel::elastic::health {
+
+// The newest commit that can be read, as the index library would find it. Throws Mismatch, IndexDamagedError and
+// FileMissingError where there is none, or one was lost; IndexIoError where the system fails.
+format::Commit FindCommit(const format::Folder& folder);
+
+// Checks what a commit says in itself, before the files of its segments. Throws Mismatch.
+void CheckCommit(const format::Folder& folder, const format::Commit& commit);
+
+}  // namespace vantrel::elastic::health

@@ -1,0 +1,186 @@
+#include "elastic/health/index_check.h"
+
+#include <algorithm>
+#include <memory>
+#include <mutex>
+#include <set>
+#include <thread>
+#include <tuple>
+#include <utility>
+
+#include "elastic/format/file_names.h"
+#include "elastic/format/quoted.h"
+#include "elastic/format/whole_segment.h"
+#include "elastic/health/commit_check.h"
+#include "elastic/health/metered_folder.h"
+#include "elastic/health/mismatch.h"
+#include "elastic/health/parallel.h"
+#include "elastic/health/segment_check.h"
+#include "vantrel/elastic/index_error.h"
+
+namespace vantrel::elastic::health {
+namespace {
+
+// Segments whose files are opened together, so that a writer cannot take them away: as many as stay below the usual
+// limit of open files.
+constexpr size_t kMostOpenFiles = 512;
+
+// How many newer commits are taken up before the index is given up as one that does not hold still.
+constexpr int kMostCommits = 100;
+
+// Gathers findings from several threads.
+class Findings {
+ public:
+  // Runs a check and keeps what it finds. Exceptions that say nothing about the index pass.
+  template <typename Check>
+  void Run(const std::string& segment, Check check) {
+    try {
+      check();
+    } catch (const Mismatch& mismatch) {
+      Add(segment, mismatch.finding());
+    } catch (const IndexDamagedError& error) {
+      Add(segment,
+          {.file = error.path(),
+           .offset = error.offset(),
+           .expected = "what the format demands",
+           .found = ProblemOf(error, error.path() + ": offset " + std::to_string(error.offset()) + ": "),
+           .grade = Grade::kUnsafe});
+    } catch (const format::FileMissingError& error) {
+      const std::lock_guard lock(mutex_);
+      file_is_missing_ = true;
+      AddLocked(segment, {.file = error.path(),
+                          .expected = "a file that can be opened",
+                          .found = ProblemOf(error, error.path() + ": ")});
+    }
+  }
+
+  // In the order of segments and files, each once.
+  std::vector<HealthFinding> Take() {
+    const auto key = [](const HealthFinding& f) {
+      return std::tie(f.segment, f.file, f.offset, f.expected, f.found);
+    };
+    std::sort(all_.begin(), all_.end(), [&](const auto& a, const auto& b) { return key(a) < key(b); });
+    all_.erase(std::unique(all_.begin(), all_.end()), all_.end());
+    return std::move(all_);
+  }
+
+  bool file_is_missing() const { return file_is_missing_; }
+
+ private:
+  static std::string ProblemOf(const IndexError& error, const std::string& start) {
+    const std::string what = error.what();
+    return what.starts_with(start) ? what.substr(start.size()) : what;
+  }
+
+  void Add(const std::string& segment, HealthFinding finding) {
+    const std::lock_guard lock(mutex_);
+    AddLocked(segment, std::move(finding));
+  }
+
+  void AddLocked(const std::string& segment, HealthFinding finding) {
+    finding.segment = segment;
+    all_.push_back(std::move(finding));
+  }
+
+  std::mutex mutex_;
+  std::vector<HealthFinding> all_;
+  bool file_is_missing_ = false;
+};
+
+unsigned ThreadsFor(const HealthOptions& options) {
+  return options.threads > 0 ? options.threads : std::max(1U, std::thread::hardware_concurrency());
+}
+
+// Checks a commit, some of its segments after the other.
+class CommitRun {
+ public:
+  CommitRun(const format::Folder& folder, const format::Commit& commit, unsigned threads, Meter& meter)
+      : folder_(folder), commit_(commit), threads_(threads), meter_(meter) {}
+
+  void Run() {
+    findings_.Run("", [this] { CheckCommit(folder_, commit_); });
+    meter_.SetSegments(commit_.segments.size());
+    for (size_t next = 0; next < commit_.segments.size();) {
+      std::vector<std::unique_ptr<SegmentCheck>> batch;
+      for (size_t open = 0; next < commit_.segments.size() && open < kMostOpenFiles; ++next) {
+        batch.push_back(std::make_unique<SegmentCheck>(folder_, commit_.segments[next]));
+        open += batch.back()->files().open_files();
+        meter_.AddSegmentOpened();
+      }
+      RunBatch(batch);
+    }
+  }
+
+  Findings& findings() { return findings_; }
+
+ private:
+  void RunBatch(const std::vector<std::unique_ptr<SegmentCheck>>& batch) {
+    std::vector<SegmentCheck::Part> parts;
+    for (const auto& segment : batch) {
+      findings_.Run(segment->files().info().name, [&] { segment->ReadFields(); });
+      std::vector<SegmentCheck::Part> more = segment->Parts();
+      std::move(more.begin(), more.end(), std::back_inserter(parts));
+    }
+    // The longest first, so that none is left over for one thread at the end.
+    std::stable_sort(parts.begin(), parts.end(),
+                     [](const auto& a, const auto& b) { return a.size > b.size; });
+    std::vector<std::function<void()>> tasks;
+    tasks.reserve(parts.size());
+    for (const SegmentCheck::Part& part : parts) {
+      tasks.emplace_back([this, &part] { findings_.Run(part.segment, part.run); });
+    }
+    RunParallel(tasks, threads_);
+  }
+
+  const format::Folder& folder_;
+  const format::Commit& commit_;
+  unsigned threads_;
+  Meter& meter_;
+  Findings findings_;
+};
+
+}  // namespace
+
+HealthReport CheckFolder(const format::Folder& folder, const HealthOptions& options) {
+  Meter meter(options.progress);
+  const MeteredFolder metered(folder, meter);
+  for (int left = kMostCommits;; --left) {
+    HealthReport report;
+    format::Commit commit;
+    Findings finding_it;
+    bool is_found = false;
+    finding_it.Run("", [&] {
+      commit = FindCommit(metered);
+      is_found = true;
+    });
+    report.findings = finding_it.Take();
+    if (!is_found) {
+      report.files = meter.TakeFiles();
+      return report;
+    }
+    report.generation = commit.generation;
+    CommitRun run(metered, commit, ThreadsFor(options), meter);
+    run.Run();
+    report.findings = run.findings().Take();
+    report.files = meter.TakeFiles();
+    meter.Tell();
+    // Not by the names alone: a newer one that is incomplete does not take over.
+    format::Commit newest;
+    if (run.findings().file_is_missing()) finding_it.Run("", [&] { newest = FindCommit(metered); });
+    const bool is_overtaken = newest.generation > commit.generation;
+    if (!is_overtaken) return report;
+    if (left == 0) throw IndexError(folder.path(), "the index changes faster than it can be checked");
+  }
+}
+
+}  // namespace vantrel::elastic::health
+
+namespace vantrel::elastic {
+
+HealthReport CheckIndexHealth(const std::string& path, const HealthOptions& options) {
+  return health::CheckFolder(format::DiskFolder(path), options);
+}
+
+bool IsIndexCorrupted(const std::string& path) { return !CheckIndexHealth(path).clean(); }
+
+}  // namespace vantrel::elastic

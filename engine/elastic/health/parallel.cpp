@@ -1,0 +1,39 @@
+#include "elastic/health/parallel.h"
+
+#include <algorithm>
+#include <atomic>
+#include <exception>
+#include <mutex>
+#include <system_error>
+#include <thread>
+
+namespace vantrel::elastic::health {
+
+void RunParallel(const std::vector<std::function<void()>>& tasks, unsigned threads) {
+  std::atomic<size_t> next = 0;
+  std::mutex failing;
+  std::exception_ptr failure;
+  const auto work = [&] {
+    for (size_t number = next++; number < tasks.size(); number = next++) {
+      try {
+        tasks[number]();
+      } catch (...) {
+        const std::lock_guard lock(failing);
+        if (failure == nullptr) failure = std::current_exception();
+        next = tasks.size();
+      }
+    }
+  };
+  std::vector<std::thread> helpers;
+  const size_t wanted = std::min<size_t>(threads, tasks.size());
+  try {
+    while (helpers.size() + 1 < wanted) helpers.emplace_back(work);
+  } catch (const std::system_error&) {
+    // One thread suffices.
+  }
+  work();
+  for (std::thread& helper : helpers) helper.join();
+  if (failure != nullptr) std::rethrow_exception(failure);
+}
+
+}  // namespace vantrel::elastic::health

@@ -1,0 +1,55 @@
+#pragma once
+
+#include <cstdint>
+#include <memory>
+#include <string>
+#include <vector>
+
+#include "elastic/format/byte_source.h"
+#include "elastic/format/field_infos.h"
+#include "elastic/format/term_cursor.h"
+#include "elastic/health/postings_check.h"
+
+namespace vantrel::elastic::health {
+
+// The files of a segment's terms.
+struct TermSources {
+  std::shared_ptr<const format::ByteSource> dictionary;  // .tis
+  std::shared_ptr<const format::ByteSource> index;       // .tii
+  std::shared_ptr<const format::ByteSource> postings;    // .frq
+  std::shared_ptr<const format::ByteSource> positions;   // .prx; empty where no field has any
+};
+
+// Checks the terms of a segment: the dictionary, the index over it, and the postings of every term, which must lie
+// one behind the other and fill their files. For one thread at a time.
+class TermsCheck {
+ public:
+  // Throws Mismatch, IndexDamagedError, IndexIoError, as does Run().
+  TermsCheck(const TermSources& sources, const std::vector<format::FieldInfo>& fields,
+             int32_t document_count);
+
+  void Run();
+
+ private:
+  void CheckHeaders() const;
+  void CheckTerm();
+  void CheckOrder(const format::FieldInfo& field) const;
+  void CheckIndexEntry();
+  void CheckPlace() const;
+  void CheckEnds() const;
+
+  const std::vector<format::FieldInfo>& fields_;
+  TermSources sources_;
+  format::TermCursor dictionary_;
+  format::TermCursor index_;
+  PostingsCheck postings_;
+  uint64_t number_ = 0;  // of the term at the cursor
+
+  // The term before.
+  bool at_first_ = true;
+  int32_t field_before_ = -1;
+  std::string text_before_;
+  format::TermInfo info_before_;
+};
+
+}  // namespace vantrel::elastic::health

@@ -1,0 +1,88 @@
+#include "elastic/format/skip_list.h"
+
+#include <gtest/gtest.h>
+
+#include "support/byte_writer.h"
+#include "support/expect_damage.h"
+#include "support/memory_folder.h"
+
+namespace vantrel::elastic::format {
+namespace {
+
+using ::quorelastic::testing::ByteWriter;
+using ::quorelastic::testing::ExpectDamage;
+using ::quorelastic::testing::SourceOf;
+
+constexpr int kMostLevels = 10;
+
+SkipListReader ReaderOf(const ByteWriter& bytes, int32_t documents, bool has_payloads, int32_t interval = 4) {
+  SkipListReader reader(SourceOf(bytes.bytes()), interval, kMostLevels);
+  reader.Seek(0, documents, has_payloads);
+  return reader;
+}
+
+TEST(SkipListTest, HasALevelForEachPowerOfTheInterval) {
+  const ByteWriter lengths = ByteWriter().VLong(0).VLong(0).VLong(0);
+  EXPECT_EQ(ReaderOf(lengths, 3, false).levels(), 0);
+  EXPECT_EQ(ReaderOf(lengths, 4, false).levels(), 1);
+  EXPECT_EQ(ReaderOf(lengths, 15, false).levels(), 1);
+  EXPECT_EQ(ReaderOf(lengths, 16, false).levels(), 2);
+  EXPECT_EQ(ReaderOf(lengths, 64, false).levels(), 3);
+  SkipListReader few(SourceOf(lengths.bytes()), 4, 1);
+  few.Seek(0, 64, false);
+  EXPECT_EQ(few.levels(), 1);
+}
+
+TEST(SkipListTest, YieldsTheEntriesOfEachLevel) {
+  const ByteWriter upper = ByteWriter().VInt(30).VInt(40).VInt(500).VLong(11);
+  SkipListReader reader = ReaderOf(ByteWriter()
+                                       .VLong(upper.size())
+                                       .Raw(upper.bytes())
+                                       .VInt(7)
+                                       .VInt(8)
+                                       .VInt(100)
+                                       .VInt(9)
+                                       .VInt(10)
+                                       .VInt(300),
+                                   16, false);
+  const SkipListReader::Entry& first = reader.Next(0);
+  EXPECT_EQ(first.document, 7U);
+  EXPECT_EQ(first.postings_distance, 8U);
+  EXPECT_EQ(first.positions_distance, 100U);
+  EXPECT_EQ(first.end, 3U);
+  EXPECT_FALSE(first.payload_length.has_value());
+  const SkipListReader::Entry& second = reader.Next(0);
+  EXPECT_EQ(second.document, 16U);
+  EXPECT_EQ(second.postings_distance, 18U);
+  EXPECT_EQ(second.positions_distance, 400U);
+  const SkipListReader::Entry& above = reader.Next(1);
+  EXPECT_EQ(above.document, 30U);
+  EXPECT_EQ(above.child, 11U);
+  EXPECT_EQ(reader.offset(1), reader.end(1));
+}
+
+TEST(SkipListTest, KeepsThePayloadsLengthUntilAnotherIsStated) {
+  SkipListReader reader =
+      ReaderOf(ByteWriter().VInt(6).VInt(1).VInt(1).VInt(7).VInt(20).VInt(1).VInt(1).VInt(8).VInt(1).VInt(1),
+               12, true);
+  EXPECT_FALSE(reader.Next(0).payload_length.has_value());
+  EXPECT_EQ(reader.Next(0).payload_length, 20U);
+  const SkipListReader::Entry& third = reader.Next(0);
+  EXPECT_EQ(third.payload_length, 20U);
+  EXPECT_EQ(third.document, 10U);
+}
+
+TEST(SkipListTest, RefusesLevelsAndEntriesThatDoNotFit) {
+  ExpectDamage(0, "takes 100 bytes", [] { ReaderOf(ByteWriter().VLong(100), 16, false); });
+  ExpectDamage(1, "file ends at 1", [] { ReaderOf(ByteWriter().VInt(1), 4, false).Next(0); });
+  ExpectDamage(3, "too few entries", [] {
+    SkipListReader reader = ReaderOf(ByteWriter().VInt(1).VInt(1).VInt(1), 8, false);
+    reader.Next(0);
+    reader.Next(0);
+  });
+  ExpectDamage(1, "reaches past its level's end",
+               [] { ReaderOf(ByteWriter().VLong(2).VInt(1).VInt(1).VInt(1).VLong(1), 16, false).Next(1); });
+}
+
+}  // namespace
+}  // namespace vantrel::elastic::format

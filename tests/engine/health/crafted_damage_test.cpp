@@ -1,0 +1,300 @@
+// One damage for each value that the index library takes on trust: the check must find it, at its place, and where the
+// library could crash on it, say so.
+
+#include <gmock/gmock.h>
+#include <gtest/gtest.h>
+
+#include <memory>
+#include <ostream>
+#include <string>
+
+#include "support/byte_writer.h"
+#include "support/files.h"
+#include "support/library_index.h"
+#include "support/temporary_folder.h"
+#include "vantrel/elastic/index_health.h"
+
+namespace vantrel::elastic {
+namespace {
+
+using ::quorelastic::testing::ByteWriter;
+using ::quorelastic::testing::CopyFolder;
+using ::quorelastic::testing::FindFile;
+using ::quorelastic::testing::LibraryField;
+using ::quorelastic::testing::LibraryIndex;
+using ::quorelastic::testing::ListFolder;
+using ::quorelastic::testing::ReadFile;
+using ::quorelastic::testing::TemporaryFolder;
+using ::quorelastic::testing::WriteFile;
+using Grade = HealthFinding::Grade;
+
+// Three documents of one field, whose files are short enough to be known by heart:
+//
+//   .fnm  VInt -2 (5 bytes), 1 field; at 6 the name "body", at 11 the flags
+//   .tis  24 bytes of header; at 24 "alpha", at 35 "beta", at 45 "gamma"
+//   .tii  24 bytes of header; at 24 the first entry, its field number -1 at 26, its pointer 24 at 34
+//   .frq  at 0 "alpha", twice in each of three documents; at 6 "beta", once in each; at 9 "gamma" in the last
+//   .fdt  4 bytes of header; at 4 the count of fields, then number, flags, length, text
+//   .tvf  4 bytes of header; at 4 the count of terms, flags, then "alpha": prefix 6, suffix 7, text, frequency 13
+void WriteSmall(const std::string& path, bool compound) {
+  LibraryIndex index(path, {.compound = compound});
+  for (const char* text : {"alpha beta alpha", "alpha beta alpha", "alpha beta alpha gamma"}) {
+    index.Add({{.name = "body", .value = text, .vector = LibraryField::Vector::kPositionsAndOffsets}});
+  }
+  index.Commit();
+  index.Delete("body", "gamma");
+}
+
+// 300 documents that hold one word: two levels of skip data stand at 301 in .frq, the upper one in 1 + 6 bytes.
+void WriteSkips(const std::string& path) {
+  LibraryIndex index(path, {.compound = false});
+  for (int number = 0; number < 300; ++number)
+    index.Add({{.name = "body", .value = "often", .stored = false}});
+}
+
+enum class Index { kSmall, kCompound, kSkips };
+
+struct Craft {
+  const char* name;
+  Index index;
+  const char* file;   // how its name ends
+  uint64_t offset;    // where bytes are replaced
+  std::string bytes;  // by these
+  const char* found_in;
+  Grade grade = Grade::kUnsafe;
+};
+
+// What the test runner shows of it.
+void PrintTo(const Craft& craft, std::ostream* out) { *out << craft.name; }
+
+std::string Int(int64_t value) { return ByteWriter().Int(value).bytes(); }
+std::string Long(int64_t value) { return ByteWriter().Long(value).bytes(); }
+std::string VInt(int64_t value) { return ByteWriter().VInt(value).bytes(); }
+std::string Bytes(std::string_view bytes) { return std::string(bytes); }
+
+const Craft kCrafts[] = {
+    // Field names.
+    {"FieldNamesFormat", Index::kSmall, ".fnm", 0, VInt(-3), ".fnm"},
+    {"FieldCountNegative", Index::kSmall, ".fnm", 5, VInt(-1), ".fnm"},
+    {"FieldNameLengthNegative", Index::kSmall, ".fnm", 6, VInt(-1), ".fnm"},
+    {"FieldNameTooLong", Index::kSmall, ".fnm", 6, "\x70", ".fnm"},
+    {"FieldFlagUnknown", Index::kSmall, ".fnm", 11, "\x8f", ".fnm", Grade::kDamaged},
+    {"FieldVectorsWithoutFlag", Index::kSmall, ".fnm", 11, "\x01", ".fnm", Grade::kDamaged},
+    {"FieldVectorPartsWithoutFlag", Index::kSmall, ".fnm", 11, "\x0d", ".fnm", Grade::kDamaged},
+    {"FieldNotIndexed", Index::kSmall, ".fnm", 11, "\x0e", ".tis"},
+    {"FieldOmitsFrequencies", Index::kSmall, ".fnm", 11, "\x4f", ".frq"},
+    {"FieldHasPayloads", Index::kSmall, ".fnm", 11, "\x2f", ".prx"},
+    {"FieldOmitsNorms", Index::kSmall, ".fnm", 11, "\x1f", ".nrm", Grade::kDamaged},
+    // The dictionary.
+    {"DictionaryFormat", Index::kSmall, ".tis", 0, Int(-5), ".tis"},
+    {"DictionaryOfOldText", Index::kSmall, ".tis", 0, Int(-3), ".tii"},
+    {"DictionaryCountHuge", Index::kSmall, ".tis", 4, Long(int64_t{1} << 40), ".tis"},
+    {"DictionaryCountNegative", Index::kSmall, ".tis", 4, Long(-1), ".tis"},
+    {"DictionaryCountTooSmall", Index::kSmall, ".tis", 4, Long(2), ".tis"},
+    {"IndexIntervalZero", Index::kSmall, ".tis", 12, Int(0), ".tis"},
+    {"IndexIntervalOther", Index::kSmall, ".tis", 12, Int(127), ".tii"},
+    {"SkipIntervalZero", Index::kSmall, ".tis", 16, Int(0), ".tis"},
+    {"SkipIntervalOne", Index::kSmall, ".tis", 16, Int(1), ".tis"},
+    {"SkipIntervalOther", Index::kSmall, ".tis", 16, Int(17), ".tii"},
+    {"SkipLevelsNone", Index::kSmall, ".tis", 20, Int(0), ".tis"},
+    {"SkipLevelsNegative", Index::kSmall, ".tis", 20, Int(-1), ".tis"},
+    {"SkipLevelsHuge", Index::kSmall, ".tis", 20, Int(1 << 28), ".tis"},
+    {"TermPrefixOfTheFirst", Index::kSmall, ".tis", 24, "\x01", ".tis"},
+    {"TermPrefixNegative", Index::kSmall, ".tis", 35, VInt(-1), ".tis"},
+    {"TermPrefixHuge", Index::kSmall, ".tis", 35, VInt(1 << 30), ".tis"},
+    {"TermSuffixNegative", Index::kSmall, ".tis", 25, VInt(-5), ".tis"},
+    {"TermSuffixHuge", Index::kSmall, ".tis", 25, VInt(1 << 30), ".tis"},
+    {"TermTextNoUtf8", Index::kSmall, ".tis", 26, "\xff", ".tis"},
+    {"TermTextLost", Index::kSmall, ".tis", 26, "\xef\xbf\xbf", ".tis"},
+    {"TermTwice", Index::kSmall, ".tis", 35, "\x01\x04lpha", ".tis"},
+    {"TermsOutOfOrder", Index::kSmall, ".tis", 26, "z", ".tis"},
+    {"TermFieldTooLarge", Index::kSmall, ".tis", 31, "\x01", ".tis"},
+    {"TermFieldNegative", Index::kSmall, ".tis", 31, VInt(-1), ".tis"},
+    {"DocumentFrequencyNone", Index::kSmall, ".tis", 32, Bytes(std::string_view("\0", 1)), ".tis"},
+    {"DocumentFrequencyTooLarge", Index::kSmall, ".tis", 32, "\x04", ".tis"},
+    {"DocumentFrequencyTooSmall", Index::kSmall, ".tis", 32, "\x02", ".tis"},
+    {"DocumentFrequencyNegative", Index::kSmall, ".tis", 32, VInt(-1), ".tis"},
+    {"PostingsPointerOfTheFirst", Index::kSmall, ".tis", 33, "\x01", ".tis"},
+    {"PostingsPointerOfAnother", Index::kSmall, ".tis", 43, "\x05", ".tis"},
+    {"PositionsPointer", Index::kSmall, ".tis", 44, "\x05", ".tis"},
+    // The index over it.
+    {"TermsIndexCountHuge", Index::kSmall, ".tii", 4, Long(int64_t{1} << 31), ".tii"},
+    {"TermsIndexCountNone", Index::kSmall, ".tii", 4, Long(0), ".tii"},
+    {"TermsIndexFirstHasText", Index::kSmall, ".tii", 25, "\x01", ".tii"},
+    {"TermsIndexPointer", Index::kSmall, ".tii", 34, "\x19", ".tii"},
+    {"TermsIndexPostings", Index::kSmall, ".tii", 32, "\x01", ".tii"},
+    // Documents, positions.
+    {"DocumentTooLarge", Index::kSmall, ".frq", 2, "\x06", ".frq"},
+    {"DocumentTwice", Index::kSmall, ".frq", 2, Bytes(std::string_view("\0", 1)), ".frq"},
+    {"FrequencyNone", Index::kSmall, ".frq", 1, Bytes(std::string_view("\0", 1)), ".frq"},
+    {"FrequencyTooLarge", Index::kSmall, ".frq", 1, "\x7f", ".prx"},
+    {"PositionNegative", Index::kSmall, ".prx", 1, VInt(-7), ".prx"},
+    // Skip data.
+    {"SkipOffset", Index::kSkips, ".tis", 37, VInt(302), ".frq"},
+    {"SkipLevelLength", Index::kSkips, ".frq", 300, "\x7f", ".frq"},
+    {"SkipDocument", Index::kSkips, ".frq", 301, "\x80", ".frq"},
+    {"SkipLowestDocument", Index::kSkips, ".frq", 309, "\x0d", ".frq"},
+    {"SkipPostings", Index::kSkips, ".frq", 310, "\x0e", ".frq"},
+    {"SkipPositions", Index::kSkips, ".frq", 311, "\x0e", ".frq"},
+    // Stored fields.
+    {"StoredFormat", Index::kSmall, ".fdx", 0, Int(3), ".fdx"},
+    {"StoredFormatNegative", Index::kSmall, ".fdx", 0, Int(-1), ".fdx"},
+    {"StoredFormatOfRecords", Index::kSmall, ".fdt", 0, Int(1), ".fdt"},
+    {"RecordPointerOfTheFirst", Index::kSmall, ".fdx", 4, Long(5), ".fdt"},
+    {"RecordPointerNegative", Index::kSmall, ".fdx", 4, Long(-4), ".fdx"},
+    {"RecordPointerHuge", Index::kSmall, ".fdx", 12, Long(int64_t{1} << 40), ".fdx"},
+    {"StoredCountHuge", Index::kSmall, ".fdt", 4, "\x7f", ".fdt"},
+    {"StoredCountNone", Index::kSmall, ".fdt", 4, Bytes(std::string_view("\0", 1)), ".fdt"},
+    {"StoredFieldTooLarge", Index::kSmall, ".fdt", 5, "\x01", ".fdt"},
+    {"StoredFieldNegative", Index::kSmall, ".fdt", 5, VInt(-1), ".fdt"},
+    {"StoredFlags", Index::kSmall, ".fdt", 6, "\x09", ".fdt"},
+    {"StoredCompressed", Index::kSmall, ".fdt", 6, "\x05", ".fdt"},
+    {"StoredLengthNegative", Index::kSmall, ".fdt", 7, VInt(-1), ".fdt"},
+    {"StoredLengthTooLarge", Index::kSmall, ".fdt", 7, "\x7f", ".fdt"},
+    {"StoredTextNoUtf8", Index::kSmall, ".fdt", 8, "\xc0", ".fdt"},
+    // Term vectors.
+    {"VectorFormat", Index::kSmall, ".tvx", 0, Int(5), ".tvx"},
+    {"VectorFormatZero", Index::kSmall, ".tvx", 0, Int(0), ".tvx"},
+    {"VectorFormatOfDocuments", Index::kSmall, ".tvd", 0, Int(3), ".tvd"},
+    {"VectorFormatOfTerms", Index::kSmall, ".tvf", 0, Int(3), ".tvf"},
+    {"VectorListPointer", Index::kSmall, ".tvx", 4, Long(6), ".tvx"},
+    {"VectorListPointerNegative", Index::kSmall, ".tvx", 4, Long(-1), ".tvx"},
+    {"VectorTermsPointer", Index::kSmall, ".tvx", 12, Long(int64_t{1} << 40), ".tvd"},
+    {"VectorFieldCountHuge", Index::kSmall, ".tvd", 4, VInt(1 << 28), ".tvd"},
+    {"VectorFieldCountNone", Index::kSmall, ".tvd", 4, Bytes(std::string_view("\0", 1)), ".tvx"},
+    {"VectorFieldTooLarge", Index::kSmall, ".tvd", 5, "\x01", ".tvd"},
+    {"VectorTermCountNone", Index::kSmall, ".tvf", 4, Bytes(std::string_view("\0", 1)), ".tvf"},
+    {"VectorTermCountHuge", Index::kSmall, ".tvf", 4, VInt(1 << 28), ".tvf"},
+    {"VectorFlags", Index::kSmall, ".tvf", 5, "\x07", ".tvf"},
+    {"VectorPrefixHuge", Index::kSmall, ".tvf", 6, VInt(1 << 30), ".tvf"},
+    {"VectorSuffixNegative", Index::kSmall, ".tvf", 7, VInt(-1), ".tvf"},
+    {"VectorTextNoUtf8", Index::kSmall, ".tvf", 8, "\xfe", ".tvf"},
+    {"VectorTermsOutOfOrder", Index::kSmall, ".tvf", 8, "z", ".tvf"},
+    {"VectorFrequencyNone", Index::kSmall, ".tvf", 13, Bytes(std::string_view("\0", 1)), ".tvf"},
+    {"VectorFrequencyHuge", Index::kSmall, ".tvf", 13, VInt(1 << 30), ".tvf"},
+    {"VectorPositionNegative", Index::kSmall, ".tvf", 15, VInt(-9), ".tvf"},
+    // Deleted documents.
+    {"DeletionsOfFewerDocuments", Index::kSmall, ".del", 0, Int(2), ".del"},
+    {"DeletionsOfMoreDocuments", Index::kSmall, ".del", 0, Int(1 << 30), ".del"},
+    {"DeletionsNegative", Index::kSmall, ".del", 0, Int(-2), ".del"},
+    {"DeletionsSparseNegative", Index::kSmall, ".del", 0, Int(-1), ".del"},
+    {"DeletionsCount", Index::kSmall, ".del", 4, Int(2), ".del"},
+    {"DeletionsBits", Index::kSmall, ".del", 8, "\x06", ".del"},
+    {"DeletionsPastTheEnd", Index::kSmall, ".del", 8, "\x08", ".del", Grade::kDamaged},
+    // Norms.
+    {"NormsHeader", Index::kSmall, ".nrm", 0, "M", ".nrm", Grade::kDamaged},
+    {"NormsHeaderVersion", Index::kSmall, ".nrm", 3, "\xfe", ".nrm", Grade::kDamaged},
+    // Compound files.
+    {"CompoundCountHuge", Index::kCompound, ".cfs", 0, VInt(1 << 30), ".cfs"},
+    {"CompoundCountTooSmall", Index::kCompound, ".cfs", 0, "\x05", ".cfs", Grade::kDamaged},
+    {"CompoundOffsetNegative", Index::kCompound, ".cfs", 1, Long(-1), ".cfs"},
+    {"CompoundOffsetTooSmall", Index::kCompound, ".cfs", 1, Long(1), ".cfs"},
+    {"CompoundNameLengthNegative", Index::kCompound, ".cfs", 9, VInt(-1), ".cfs"},
+    {"CompoundNameUnknown", Index::kCompound, ".cfs", 12, "?", ".cfs", Grade::kDamaged},
+};
+
+class CraftedDamageTest : public ::testing::TestWithParam<Craft> {
+ protected:
+  // Written once: that takes longer than all of the tests.
+  static void SetUpTestSuite() {
+    originals_ = std::make_unique<TemporaryFolder>();
+    WriteSmall(Original(Index::kSmall), false);
+    WriteSmall(Original(Index::kCompound), true);
+    WriteSkips(Original(Index::kSkips));
+  }
+  static void TearDownTestSuite() { originals_.reset(); }
+
+  void SetUp() override {
+    CopyFolder(Original(GetParam().index), path());
+    ASSERT_TRUE(CheckIndexHealth(path()).clean());
+  }
+
+  std::string path() const { return folder_ / "index"; }
+
+ private:
+  static std::string Original(Index index) { return *originals_ / std::to_string(static_cast<int>(index)); }
+
+  static inline std::unique_ptr<TemporaryFolder> originals_;
+  TemporaryFolder folder_;
+};
+
+INSTANTIATE_TEST_SUITE_P(Values, CraftedDamageTest, ::testing::ValuesIn(kCrafts),
+                         [](const auto& test) { return test.param.name; });
+
+TEST_P(CraftedDamageTest, IsFoundInItsFileAndGraded) {
+  const Craft& craft = GetParam();
+  const std::string file = path() + "/" + FindFile(path(), craft.file);
+  std::string bytes = ReadFile(file);
+  ASSERT_LT(craft.offset, bytes.size());
+  const std::string before = bytes;
+  bytes.replace(craft.offset, craft.bytes.size(), craft.bytes);
+  ASSERT_NE(bytes, before);
+  WriteFile(file, bytes);
+  const HealthReport report = CheckIndexHealth(path());
+  std::string seen;
+  bool is_found = false;
+  for (const HealthFinding& finding : report.findings) {
+    seen += finding.file + ", offset " + std::to_string(finding.offset) + ": expected " + finding.expected +
+            ", found " + finding.found + "\n";
+    is_found =
+        is_found || (finding.file.find(craft.found_in) != std::string::npos && finding.grade == craft.grade);
+  }
+  EXPECT_TRUE(is_found) << "not among\n" << seen;
+}
+
+// Commits, whose checksum would tell anything else.
+class CraftedCommitTest : public ::testing::Test {
+ protected:
+  void SetUp() override {
+    WriteSmall(folder_.path(), false);
+    for (const std::string& name : ListFolder(folder_.path())) {
+      if (name.starts_with("segments_")) name_ = folder_ / name;
+    }
+    intact_ = ReadFile(name_);
+    ASSERT_EQ(intact_.substr(20, 3), "\x02_0");
+  }
+
+  HealthReport CheckWith(uint64_t offset, const std::string& bytes) const {
+    constexpr size_t kChecksumLength = 8;
+    std::string damaged = intact_.substr(0, intact_.size() - kChecksumLength);
+    damaged.replace(offset, bytes.size(), bytes);
+    WriteFile(name_, ByteWriter().Raw(damaged).Checksum().bytes());
+    return CheckIndexHealth(folder_.path());
+  }
+
+  TemporaryFolder folder_;
+  std::string name_;
+  std::string intact_;
+};
+
+TEST_F(CraftedCommitTest, IsFoundBelowAChecksumThatIsRight) {
+  EXPECT_TRUE(CheckWith(20, "\x02").clean());
+  EXPECT_FALSE(CheckWith(0, Int(-10)).clean()) << "format";
+  EXPECT_FALSE(CheckWith(12, Int(0)).clean()) << "number of the next segment";
+  EXPECT_FALSE(CheckWith(16, Int(-1)).clean()) << "count of segments";
+  EXPECT_FALSE(CheckWith(16, Int(1 << 30)).clean()) << "count of segments";
+  EXPECT_FALSE(CheckWith(20, VInt(-1)).clean()) << "length of the name";
+  EXPECT_FALSE(CheckWith(21, "..").clean()) << "name";
+  EXPECT_FALSE(CheckWith(23, Int(-1)).clean()) << "documents";
+  EXPECT_FALSE(CheckWith(23, Int(4)).clean()) << "documents";
+  EXPECT_FALSE(CheckWith(27, Long(-2)).clean()) << "generation of deletions";
+  EXPECT_FALSE(CheckWith(27, Long(-1)).clean()) << "deleted documents without a file";
+  EXPECT_FALSE(CheckWith(27, Long(9)).clean()) << "generation of deletions";
+  EXPECT_FALSE(CheckWith(35, Int(-2)).clean()) << "place in a document store";
+  EXPECT_FALSE(CheckWith(35, Int(0)).clean()) << "place in a document store";
+}
+
+TEST_F(CraftedCommitTest, IsFoundByItsChecksumAndItsEnd) {
+  WriteFile(name_, intact_ + "more");
+  ASSERT_EQ(CheckIndexHealth(folder_.path()).findings.size(), 1U);
+  EXPECT_EQ(CheckIndexHealth(folder_.path()).findings[0].offset, intact_.size());
+  for (size_t offset = 0; offset < intact_.size(); ++offset) {
+    std::string damaged = intact_;
+    damaged[offset] = static_cast<char>(damaged[offset] ^ 0x10);
+    WriteFile(name_, damaged);
+    EXPECT_FALSE(CheckIndexHealth(folder_.path()).clean()) << offset;
+  }
+}
+
+}  // namespace
+}  // namespace vantrel::elastic
