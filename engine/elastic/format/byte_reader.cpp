@@ -12,7 +12,10 @@
 namespace vantrel::elastic::format {
 
 ByteReader::ByteReader(std::shared_ptr<const ByteSource> source, size_t buffer_size)
-    : source_(std::move(source)), size_(source_->size()), buffer_size_(buffer_size) {}
+    : source_(std::move(source)),
+      name_(&source_->name()),
+      size_(source_->size()),
+      buffer_size_(buffer_size) {}
 
 void ByteReader::Damaged(uint64_t offset, const std::string& problem) const {
   throw IndexDamagedError(name(), offset, problem);

@@ -28,7 +28,7 @@ class ByteReader {
   // The buffer is allocated by the first read, and never larger than the source.
   explicit ByteReader(std::shared_ptr<const ByteSource> source, size_t buffer_size = kDefaultBufferSize);
 
-  const std::string& name() const { return source_->name(); }
+  const std::string& name() const { return *name_; }
   uint64_t size() const { return size_; }
   uint64_t offset() const { return buffer_start_ + position_; }
   uint64_t remaining() const { return size() - offset(); }
@@ -84,6 +84,7 @@ class ByteReader {
   bool PassShortVIntsAtEnd(uint64_t count);
 
   std::shared_ptr<const ByteSource> source_;
+  const std::string* name_;  // the source's
   uint64_t size_;
   size_t buffer_size_;
   std::vector<uint8_t> buffer_;

@@ -14,7 +14,7 @@ constexpr int32_t kWithUtf8 = 1;
 constexpr int32_t kWithoutCompression = 2;
 
 constexpr size_t kIndexBufferSize = size_t{64} << 10;
-constexpr size_t kRecordsBufferSize = size_t{256} << 10;
+constexpr size_t kRecordsBufferSize = size_t{128} << 10;
 
 }  // namespace
 

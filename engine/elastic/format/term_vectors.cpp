@@ -17,7 +17,7 @@ constexpr int32_t kWithUtf8 = 4;
 
 constexpr size_t kIndexBufferSize = size_t{64} << 10;
 constexpr size_t kListBufferSize = size_t{64} << 10;
-constexpr size_t kTermsBufferSize = size_t{256} << 10;
+constexpr size_t kTermsBufferSize = size_t{128} << 10;
 
 }  // namespace
 
@@ -165,6 +165,12 @@ void TermVectorsReader::ReadUtf16Text(uint64_t start) {
 }
 
 void TermVectorsReader::PassPlaces(uint32_t frequency) {
+  // Distances of three bytes are below 2^21: so few of them neither wrap nor descend.
+  constexpr uint32_t kFew = 1 << 10;
+  const uint64_t numbers = ((flags_ & kPositions) != 0 ? 1U : 0U) + ((flags_ & kOffsets) != 0 ? 2U : 0U);
+  const uint64_t places_start = fields_.offset();
+  if (frequency < kFew && fields_.PassShortVInts(numbers * frequency)) return;
+  fields_.Seek(places_start);
   if ((flags_ & kPositions) != 0) {
     int32_t position = 0;
     int32_t least = -1;

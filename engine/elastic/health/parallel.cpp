@@ -24,15 +24,15 @@ void RunParallel(const std::vector<std::function<void()>>& tasks, unsigned threa
       }
     }
   };
-  std::vector<std::thread> helpers;
+  std::vector<std::thread> started;
   const size_t wanted = std::min<size_t>(threads, tasks.size());
   try {
-    while (helpers.size() + 1 < wanted) helpers.emplace_back(work);
+    while (started.size() + 1 < wanted) started.emplace_back(work);
   } catch (const std::system_error&) {
     // One thread suffices.
   }
   work();
-  for (std::thread& helper : helpers) helper.join();
+  for (std::thread& thread : started) thread.join();
   if (failure != nullptr) std::rethrow_exception(failure);
 }
 

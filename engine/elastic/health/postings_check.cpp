@@ -8,7 +8,7 @@
 namespace vantrel::elastic::health {
 namespace {
 
-constexpr size_t kBufferSize = size_t{256} << 10;
+constexpr size_t kBufferSize = size_t{128} << 10;
 
 // Formats of the dictionary before this one had skip data of another kind, or none.
 constexpr int32_t kWithSkipLists = -2;
