@@ -18,7 +18,6 @@
 namespace quorelastic::testing {
 namespace {
 
-
 constexpr char kIoError[] = "vantrel::elastic::IndexIoError";
 
 auto Clean() { return Ended(0, "", "clean\n"); }
