@@ -17,10 +17,12 @@
 //   plugin        nothing: the word is accepted, no more
 //   vmtouch       brings the indexes into the page cache
 //
-// For example, what a search can still find in a field, and what was indexed of one document:
+// For example, what a search can still find in a field, what was indexed of one document, and whether the index
+// is as it should be:
 //
 //   quorelastic -a term -d /var/lib/quorelastic/mail --info -f subject -m 20
 //   quorelastic -a doc_term -d /var/lib/quorelastic/mail -f subject -n 7
+//   quorelastic -a check -d /var/lib/quorelastic/mail
 //
 // How a run ends:
 //
@@ -40,7 +42,6 @@
 #include <cstdint>
 #include <cstdlib>
 #include <iostream>
-#include <stdexcept>
 #include <string>
 #include <string_view>
 
@@ -55,16 +56,15 @@
 #include "option_set.h"
 #include "suggest/term_suggestions.h"
 #include "vantrel/elastic/index_health.h"
+#include "vantrel/elastic/index_repair.h"
 #include "vantrel/elastic/json_value.h"
 #include "vantrel/elastic/vm_touch.h"
 
 namespace {
 
 using vantrel::elastic::JsonValue;
-constexpr auto kInvalid = vantrel::Error::kInvalidInput;
 
-// Stands where an action's body is still to come.
-[[noreturn]] void NotBuiltYet(const std::string& what) { throw std::logic_error(what + ": not built yet"); }
+constexpr auto kInvalid = vantrel::Error::kInvalidInput;
 
 // The parser returns the letter. There are no short options: a single dash introduces any unambiguous
 // beginning of a long name, so that -s (--string or --size) and -S (neither) are rejected.
@@ -331,7 +331,8 @@ void Repair(const std::string& db_path) {
   static_assert(__LINE__ == 331, "the system log names the line of the check below");
   FailIf(db_path.empty(), kInvalid, "db_path is required.");
 
-  NotBuiltYet("repair");
+  const auto outcome = vantrel::elastic::RepairIndex(db_path);
+  std::cerr << (outcome == vantrel::elastic::RepairOutcome::kClean ? "clean" : "done") << std::endl;
 }
 
 }  // namespace
