@@ -22,7 +22,6 @@ using quorelastic::bench::BackgroundProcess;
 using quorelastic::bench::Compare;
 using quorelastic::bench::Figures;
 using quorelastic::bench::MakeWordnetQueries;
-using quorelastic::bench::Run;
 using quorelastic::bench::RunIntoFile;
 
 namespace fs = std::filesystem;

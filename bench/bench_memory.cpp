@@ -27,7 +27,6 @@ using quorelastic::bench::Comparison;
 using quorelastic::bench::Figures;
 using quorelastic::bench::Run;
 using quorelastic::bench::ScratchFolder;
-using quorelastic::bench::Usage;
 
 constexpr uint64_t kColdBytes = uint64_t{300} << 20;
 constexpr char kGibibyte[] = "1024";
@@ -103,6 +102,7 @@ double FillSeconds(const std::vector<std::string>& command) {
   int ends[2];
   if (pipe2(ends, O_CLOEXEC) != 0) throw std::runtime_error("cannot make a pipe");
   std::vector<char*> arguments;
+  arguments.reserve(command.size() + 1);
   for (const std::string& word : command) arguments.push_back(const_cast<char*>(word.c_str()));
   arguments.push_back(nullptr);
   posix_spawn_file_actions_t actions;

@@ -1,6 +1,7 @@
 // quorelasticd: serves the full-text indexes of one data folder on a Unix domain socket.
 
 #include <spdlog/spdlog.h>
+#include <sys/resource.h>
 #include <sys/stat.h>
 #include <systemd/sd-daemon.h>
 
@@ -20,6 +21,7 @@
 #include "options.h"
 #include "server/listener.h"
 #include "server/server.h"
+#include "shutdown_watch.h"
 #include "vantrel/elastic/library_setup.h"
 #include "vantrel/elastic/search_plugin.h"
 #include "version.h"
@@ -30,6 +32,9 @@ using namespace quorelasticd;
 
 constexpr int kFailure = 1;
 constexpr int kBadCommandLine = 2;
+
+// For what is cut off at the end to come to its own.
+constexpr std::chrono::seconds kGrace{5};
 
 ServerLimits LimitsOf(const Options& options) {
   ServerLimits limits;
@@ -52,6 +57,14 @@ void TellReady(const std::string& socket) {
 
 void TellStopping() { sd_notify(0, "STOPPING=1\nSTATUS=Finishing what is running"); }
 
+// An index takes several descriptors; the usual soft limit is there for programs that cannot count beyond it.
+void RaiseDescriptorLimit() {
+  rlimit limit{};
+  if (getrlimit(RLIMIT_NOFILE, &limit) != 0) return;
+  limit.rlim_cur = limit.rlim_max;
+  setrlimit(RLIMIT_NOFILE, &limit);
+}
+
 int Serve(const Options& options) {
   const DataRoot root(options.data);
   Listener listener(options.socket);
@@ -69,10 +82,15 @@ int Serve(const Options& options) {
                       {plugins, quick_searches, search_threads.get_executor(), SearchTimeLimit(options)});
   CommandService service(daemon);
   Server server(listener.Release(), service, LimitsOf(options), statistics.connections);
+  ShutdownWatch watch(std::chrono::seconds(options.shutdown_timeout) + kGrace);
   TellReady(options.socket);
-  server.Run(TellStopping);
+  server.Run([&] {
+    TellStopping();
+    watch.Start();
+  });
   search_threads.join();
   slow_threads.join();
+  watch.Stop();
   const bool is_committed = registry.CommitAll();
   spdlog::info("ended");
   return is_committed ? 0 : kFailure;
@@ -97,6 +115,7 @@ int main(int argc, char** argv) {
     StartLogging(options->log_level);
     std::signal(SIGPIPE, SIG_IGN);
     umask(S_IWGRP | S_IRWXO);
+    RaiseDescriptorLimit();
     vantrel::elastic::PrepareIndexLibrary();
     return Serve(*options);
   } catch (const std::exception& error) {

@@ -10,7 +10,6 @@
 #include <sstream>
 
 #include "base/text.h"
-#include "version.h"
 
 namespace quorelasticd {
 namespace {
@@ -62,7 +61,7 @@ void CheckRange(const char* name, T value, T least, T most) {
 }
 
 void Check(const Options& options) {
-  constexpr int64_t kDay = 24 * 60 * 60;
+  constexpr int64_t kDay = int64_t{24} * 60 * 60;
   CheckRange<int64_t>("threads", options.threads, 1, 256);
   CheckRange<int64_t>("max-connections", options.max_connections, 1, 100000);
   CheckRange<int64_t>("idle-timeout", options.idle_timeout, 1, kDay);

@@ -5,12 +5,14 @@
 #include <stdexcept>
 #include <string>
 
+#include "version.h"
+
 namespace quorelasticd {
 
 // What the command line settles. Paths are bytes.
 struct Options {
   std::string socket = "/var/run/quorelasticd.sock";
-  std::string data = QUORELASTIC_DATA_ROOT;
+  std::string data = kDefaultData;
   std::string log_level = "info";
   std::string plugins;  // a folder; empty for none
   int64_t threads = 4;

@@ -14,7 +14,7 @@ int main(int argc, char** argv) {
   const size_t size = std::strtoull(argv[1], nullptr, 10) << 20;
   void* const block = std::malloc(size);
   if (block == nullptr) return 1;
-  std::memset(block, '0', size);
+  std::memset(block, 0x30, size);
   asm volatile("" : : "r"(block) : "memory");  // or the compiler leaves out what nobody reads
   std::cerr << "waiting ";
   for (;;) pause();

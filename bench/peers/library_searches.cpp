@@ -52,7 +52,9 @@ int main(int argc, char** argv) {
     }
   };
   std::vector<std::thread> threads;
-  for (int i = 0; i < std::atoi(argv[3]); ++i) threads.emplace_back(search);
+  const size_t count = std::strtoul(argv[3], nullptr, 10);
+  threads.reserve(count);
+  for (size_t i = 0; i < count; ++i) threads.emplace_back(search);
   for (std::thread& thread : threads) thread.join();
   std::cout << bytes << " bytes of stored fields" << std::endl;
   return bytes > 0 ? 0 : 1;

@@ -43,7 +43,9 @@ int main(int argc, char** argv) {
     }
   };
   std::vector<std::thread> clients;
-  for (int i = 0; i < std::atoi(argv[3]); ++i) clients.emplace_back(ask);
+  const size_t count = std::strtoul(argv[3], nullptr, 10);
+  clients.reserve(count);
+  for (size_t i = 0; i < count; ++i) clients.emplace_back(ask);
   for (std::thread& client : clients) client.join();
   std::cout << found << " of " << requests.size() << " answered" << std::endl;
   return found == requests.size() && found > 0 ? 0 : 1;

@@ -1,6 +1,7 @@
 #include <utility>
 #include <vector>
 
+#include "base/limits.h"
 #include "commands/commands.h"
 #include "commands/daemon.h"
 
@@ -46,9 +47,9 @@ Command AnalyzeCommand() {
           Object({
               {"id", true, Text(), "The index's name."},
               {"field", true, Text(), "The field."},
-              {"text", true, Text(), "A value of it."},
+              {"text", true, TextUpTo(kLongestAnalyzedText), "A value of it."},
           }),
-          [](const Daemon& daemon, Json::Value data) -> std::unique_ptr<RunningCommand> {
+          [](const Daemon& daemon, Json::Value&& data) -> std::unique_ptr<RunningCommand> {
             return std::make_unique<Analyze>(daemon, data);
           }};
 }

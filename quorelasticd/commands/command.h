@@ -53,7 +53,7 @@ struct Command {
   Shape data;           // an object; may be missing from a request where none of its members is required
 
   // Begins one. `data` is of the shape above. Throws like Step().
-  std::unique_ptr<RunningCommand> (*begin)(const Daemon& daemon, Json::Value data);
+  std::unique_ptr<RunningCommand> (*begin)(const Daemon& daemon, Json::Value&& data);
 };
 
 }  // namespace quorelasticd

@@ -104,14 +104,14 @@ class Help : public RunningCommand {
 
 Command PluginListCommand() {
   return {"plugin_list", "Describes the search plugins that filters can name.", Object({}),
-          [](const Daemon& daemon, Json::Value) -> std::unique_ptr<RunningCommand> {
+          [](const Daemon& daemon, Json::Value&&) -> std::unique_ptr<RunningCommand> {
             return std::make_unique<PluginList>(daemon);
           }};
 }
 
 Command StatusCommand() {
   return {"status", "Tells how the daemon is doing.", Object({}),
-          [](const Daemon& daemon, Json::Value) -> std::unique_ptr<RunningCommand> {
+          [](const Daemon& daemon, Json::Value&&) -> std::unique_ptr<RunningCommand> {
             return std::make_unique<Status>(daemon);
           }};
 }
@@ -119,7 +119,7 @@ Command StatusCommand() {
 Command HelpCommand() {
   return {"help", "Describes the commands and what they take.",
           Object({{"command", false, Text(), "The only command to describe; all by default."}}),
-          [](const Daemon&, Json::Value data) -> std::unique_ptr<RunningCommand> {
+          [](const Daemon&, Json::Value&& data) -> std::unique_ptr<RunningCommand> {
             return std::make_unique<Help>(data);
           }};
 }

@@ -8,6 +8,7 @@
 #include "commands/commands.h"
 #include "commands/daemon.h"
 #include "commands/document_source.h"
+#include "vantrel/elastic/index_error.h"
 
 namespace quorelasticd {
 namespace {
@@ -124,7 +125,7 @@ class DocumentDelete : public RunningCommand {
   Outcome Step() override {
     for (size_t i = 0; i < kDocumentsPerStep && next_ < ids_.size(); ++i) {
       const std::string id = ids_[next_++].asString();
-      changes_.Apply([&](Index& index) { index.DeleteById(id); });
+      Delete(id);
     }
     if (next_ < ids_.size()) return Nothing();
     commits_ ? changes_.Commit() : changes_.Promise();
@@ -135,6 +136,14 @@ class DocumentDelete : public RunningCommand {
   }
 
  private:
+  void Delete(const std::string& id) {
+    try {
+      changes_.Apply([&](Index& index) { index.DeleteById(id); });
+    } catch (const vantrel::elastic::IndexValueError&) {
+      // No document can have such an id: it is not there, like others that are passed over.
+    }
+  }
+
   std::shared_ptr<OpenIndex> open_;
   Changes changes_;
   bool commits_;
@@ -143,7 +152,7 @@ class DocumentDelete : public RunningCommand {
 };
 
 template <typename T>
-std::unique_ptr<RunningCommand> Begin(const Daemon& daemon, Json::Value data) {
+std::unique_ptr<RunningCommand> Begin(const Daemon& daemon, Json::Value&& data) {
   return std::make_unique<T>(daemon, std::move(data));
 }
 

@@ -141,7 +141,7 @@ class Optimize : public Commit {
 };
 
 template <typename T>
-std::unique_ptr<RunningCommand> Begin(const Daemon& daemon, Json::Value data) {
+std::unique_ptr<RunningCommand> Begin(const Daemon& daemon, Json::Value&& data) {
   return std::make_unique<T>(daemon, data);
 }
 

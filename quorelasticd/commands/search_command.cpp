@@ -125,7 +125,7 @@ Command SearchCommand() {
           {"load_field", false, ArrayOf(Text(), kMostFields),
            "The only stored fields to return; all by default."},
       }),
-      [](const Daemon& daemon, Json::Value data) -> std::unique_ptr<RunningCommand> {
+      [](const Daemon& daemon, Json::Value&& data) -> std::unique_ptr<RunningCommand> {
         return std::make_unique<Search>(daemon, data);
       }};
 }

@@ -153,30 +153,52 @@ std::string DescribeChoices(const std::vector<std::string>& choices, const std::
   return text;
 }
 
+Shape OfKind(Shape::Kind kind) {
+  Shape shape;
+  shape.kind = kind;
+  return shape;
+}
+
 }  // namespace
 
 Shape Any() { return {}; }
 
-Shape Boolean() { return {.kind = Shape::Kind::kBoolean}; }
+Shape Boolean() { return OfKind(Shape::Kind::kBoolean); }
 
 Shape Integer(int64_t least, int64_t most) {
-  return {.kind = Shape::Kind::kInteger, .least = least, .most = most};
+  Shape shape = OfKind(Shape::Kind::kInteger);
+  shape.least = least;
+  shape.most = most;
+  return shape;
 }
 
-Shape Number() { return {.kind = Shape::Kind::kNumber}; }
+Shape Number() { return OfKind(Shape::Kind::kNumber); }
 
 Shape String(int64_t most_bytes) {
-  return {.kind = Shape::Kind::kString, .most = most_bytes, .may_be_empty = false};
+  Shape shape = TextUpTo(most_bytes);
+  shape.may_be_empty = false;
+  return shape;
 }
 
-Shape Text() { return {.kind = Shape::Kind::kString}; }
+Shape Text() { return OfKind(Shape::Kind::kString); }
+
+Shape TextUpTo(int64_t most_bytes) {
+  Shape shape = Text();
+  shape.most = most_bytes;
+  return shape;
+}
 
 Shape Choice(std::vector<std::string> choices) {
-  return {.kind = Shape::Kind::kString, .choices = std::move(choices)};
+  Shape shape = Text();
+  shape.choices = std::move(choices);
+  return shape;
 }
 
 Shape ArrayOf(Shape element, int64_t most) {
-  return {.kind = Shape::Kind::kArray, .most = most, .of = {std::move(element)}};
+  Shape shape = OfKind(Shape::Kind::kArray);
+  shape.most = most;
+  shape.of.push_back(std::move(element));
+  return shape;
 }
 
 Shape NonEmptyArrayOf(Shape element, int64_t most) {
@@ -186,10 +208,16 @@ Shape NonEmptyArrayOf(Shape element, int64_t most) {
 }
 
 Shape Object(std::vector<Member> members) {
-  return {.kind = Shape::Kind::kObject, .members = std::move(members)};
+  Shape shape = OfKind(Shape::Kind::kObject);
+  shape.members = std::move(members);
+  return shape;
 }
 
-Shape Either(std::vector<Shape> shapes) { return {.kind = Shape::Kind::kEither, .of = std::move(shapes)}; }
+Shape Either(std::vector<Shape> shapes) {
+  Shape shape = OfKind(Shape::Kind::kEither);
+  shape.of = std::move(shapes);
+  return shape;
+}
 
 std::string Describe(const Shape& shape) {
   switch (shape.kind) {

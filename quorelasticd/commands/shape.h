@@ -20,8 +20,8 @@ struct Shape {
   int64_t most = std::numeric_limits<int64_t>::max();  // an integer, a string's bytes, an array's elements
   bool may_be_empty = true;                            // a string, an array
   std::vector<std::string> choices = {};               // a string; empty for any
-  std::vector<Shape> of = {};        // an array: its elements, if not any; kEither: what it can be
-  std::vector<Member> members = {};  // an object; no others are taken
+  std::vector<Shape> of = {};   // an array: its elements, if not any; kEither: what it can be
+  std::vector<Member> members;  // an object; no others are taken
 };
 
 struct Member {
@@ -37,6 +37,7 @@ Shape Integer(int64_t least, int64_t most);
 Shape Number();
 Shape String(int64_t most_bytes);  // not empty
 Shape Text();                      // any string
+Shape TextUpTo(int64_t most_bytes);
 Shape Choice(std::vector<std::string> choices);
 Shape ArrayOf(Shape element, int64_t most);
 Shape NonEmptyArrayOf(Shape element, int64_t most);

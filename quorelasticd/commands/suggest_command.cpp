@@ -72,7 +72,7 @@ Command SuggestCommand() {
           {"from", false, Integer(0, kAnyMost), "How many suggestions to pass over; 0 by default."},
           {"size", false, Integer(0, kAnyMost), "How many to return at most; 10 by default."},
       }),
-      [](const Daemon& daemon, Json::Value data) -> std::unique_ptr<RunningCommand> {
+      [](const Daemon& daemon, Json::Value&& data) -> std::unique_ptr<RunningCommand> {
         return std::make_unique<Suggest>(daemon, data);
       }};
 }

@@ -112,7 +112,7 @@ Command TermsCommand() {
                "Whether to leave out the terms that only deleted documents hold; false by default."},
               {"max", false, Integer(0, kMostTerms), "How many terms at most, 1000 by default."},
           }),
-          [](const Daemon& daemon, Json::Value data) -> std::unique_ptr<RunningCommand> {
+          [](const Daemon& daemon, Json::Value&& data) -> std::unique_ptr<RunningCommand> {
             return std::make_unique<Terms>(daemon, data);
           }};
 }

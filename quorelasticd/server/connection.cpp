@@ -51,18 +51,23 @@ void Connection::ReadHeader() {
   if (finishing_ && !HasArrived()) return Close();
   awaiting_request_ = true;
   ArmTimer(timeouts_.idle);
-  asio::async_read(socket_, asio::buffer(header_), [self = shared_from_this()](error_code error, size_t) {
-    if (error) return self->Close();
-    self->awaiting_request_ = false;
-    self->request_length_ = quordaemon::DecodeHeader(self->header_);
-    if (self->request_length_ > quordaemon::kLongestMessage) {
-      // What follows cannot be told apart from the next request any more.
-      return self->RefuseRequest(self->service_.RefuseTooLong());
-    }
-    self->arrived_ = 0;
-    self->request_.clear();
-    self->ReadPayload();
-  });
+  const auto missing = [self = shared_from_this()](error_code error, size_t got) -> size_t {
+    if (!error && got > 0 && got < self->header_.size()) self->ArmTimer(self->timeouts_.stalled);
+    return error ? 0 : self->header_.size() - got;
+  };
+  asio::async_read(socket_, asio::buffer(header_), missing,
+                   [self = shared_from_this()](error_code error, size_t) {
+                     if (error) return self->Close();
+                     self->awaiting_request_ = false;
+                     self->request_length_ = quordaemon::DecodeHeader(self->header_);
+                     if (self->request_length_ > quordaemon::kLongestMessage) {
+                       // What follows cannot be told apart from the next request any more.
+                       return self->RefuseRequest(self->service_.RefuseTooLong());
+                     }
+                     self->arrived_ = 0;
+                     self->request_.clear();
+                     self->ReadPayload();
+                   });
 }
 
 void Connection::ReadPayload() {

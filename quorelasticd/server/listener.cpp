@@ -77,11 +77,15 @@ Listener::Listener(const std::string& path) : sock_(ActivatedSocket()) {
   if (sock_ != -1) return;
   sock_ = Bind(path);
   bound_path_ = path;
+  lstat(path.c_str(), &bound_file_);
 }
 
 Listener::~Listener() {
   if (sock_ != -1) close(sock_);
-  if (!bound_path_.empty()) unlink(bound_path_.c_str());
+  // Another daemon may have taken the place over since this one stopped to listen.
+  struct stat status {};
+  if (bound_path_.empty() || lstat(bound_path_.c_str(), &status) != 0) return;
+  if (status.st_dev == bound_file_.st_dev && status.st_ino == bound_file_.st_ino) unlink(bound_path_.c_str());
 }
 
 int Listener::Release() { return std::exchange(sock_, -1); }

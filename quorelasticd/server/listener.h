@@ -1,5 +1,7 @@
 #pragma once
 
+#include <sys/stat.h>
+
 #include <string>
 
 namespace quorelasticd {
@@ -22,6 +24,7 @@ class Listener {
 
  private:
   std::string bound_path_;  // empty when the service manager owns the file
+  struct stat bound_file_ {};
   int sock_ = -1;
 };
 

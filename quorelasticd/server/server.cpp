@@ -89,14 +89,15 @@ void Server::Accept() {
 
 void Server::Admit(Connection::Socket socket) {
   // The count goes down when the last owner, a pending operation of the connection, lets go.
-  const auto release = [this](Connection* connection) {
+  const bool is_full = connection_count_ >= limits_.connections;
+  if (is_full && refusal_count_ >= kMostRefusals) return;
+  std::atomic<size_t>& count = is_full ? refusal_count_ : connection_count_;
+  const auto release = [this, &count](Connection* connection) {
     delete connection;
-    --connection_count_;
+    --count;
     asio::post(strand_, [this] { CancelDeadlineIfIdle(); });
   };
-  const bool is_full = connection_count_ >= limits_.connections;
-  if (connection_count_ >= limits_.connections + kMostRefusals) return;
-  ++connection_count_;
+  ++count;
   const std::shared_ptr<Connection> connection(new Connection(std::move(socket), service_, limits_.timeouts),
                                                release);
   std::erase_if(connections_, [](const std::weak_ptr<Connection>& gone) { return gone.expired(); });
@@ -131,7 +132,7 @@ void Server::BeginStop() {
 }
 
 void Server::CancelDeadlineIfIdle() {
-  if (stopping_ && connection_count_ == 0) deadline_.cancel();
+  if (stopping_ && connection_count_ == 0 && refusal_count_ == 0) deadline_.cancel();
 }
 
 }  // namespace quorelasticd

@@ -50,7 +50,8 @@ class Server {
 
   ServerLimits limits_;
   Service& service_;
-  std::atomic<size_t>& connection_count_;
+  std::atomic<size_t>& connection_count_;  // of clients served
+  std::atomic<size_t> refusal_count_{0};   // of clients told that there are too many
   boost::asio::io_context io_;
   // The acceptor, its list of connections, the signals and the deadline share one strand.
   boost::asio::strand<boost::asio::io_context::executor_type> strand_;

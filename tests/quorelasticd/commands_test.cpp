@@ -341,5 +341,13 @@ TEST_F(CommandsTest, HelpDescribesEveryCommandThatWorks) {
   EXPECT_EQ(Error(R"({"command":"help","data":{"command":"nope"}})"), "unknown_command");
 }
 
+TEST_F(CommandsTest, AnIdThatNoDocumentCanHaveIsPassedOver) {
+  Ask(R"({"command":"document_bulk","data":{"id":"books","documents":[{"id":"1"},{"id":"2"}]}})");
+  const JsonValue reply = Ask(
+      "{\"command\":\"document_delete\",\"data\":{\"id\":\"books\",\"ids\":[\"1\",\"\xef\xbf\xbf\",\"2\"]}}");
+  EXPECT_TRUE(reply["success"].asBool()) << reply.toString();
+  EXPECT_EQ(CountBooks(client_), 0);
+}
+
 }  // namespace
 }  // namespace quorelastic::testing

@@ -28,7 +28,7 @@ TEST(Options, HaveDefaults) {
   const auto options = Parse({});
   ASSERT_TRUE(options.has_value());
   EXPECT_EQ(options->socket, "/var/run/quorelasticd.sock");
-  EXPECT_EQ(options->data, QUORELASTIC_DATA_ROOT);
+  EXPECT_EQ(options->data, "/var/lib/quorelastic");
   EXPECT_EQ(options->log_level, "info");
 }
 

@@ -180,9 +180,37 @@ TEST_F(SearchCommandTest, QueriesBeyondALimitAreRefusedByItsName) {
   std::string words;
   for (int i = 0; i < 2000; ++i) words.append("w").append(std::to_string(i)).append(" ");
   EXPECT_EQ(limit(words), "query_clauses");
+  EXPECT_EQ(limit("\"a b c d e f g h i j k l m n o p q\"~5"), "near_words");
+  EXPECT_EQ(Search("\"a b c d e f g h i j k l m n o p q\"")["error"], Json::Value());
   std::string indice;
   for (int i = 0; i < 65; ++i) indice.append(i == 0 ? "[\"i" : "\",\"i").append(std::to_string(i));
   EXPECT_EQ(client_.Ask(SearchRequest("old", "", indice + "\"]"))["error"]["limit"], "data.indice");
+}
+
+TEST_F(SearchCommandTest, ScoresBeyondAllMeasureAreStillNumbers) {
+  std::string query = "old";
+  for (int i = 0; i < 60; ++i) query = "(" + query + ")^1000000 sea";
+  const Json::Value reply = Search(query);
+  EXPECT_TRUE(reply["success"].asBool());
+  EXPECT_LE(reply["result"]["max_score"].asDouble(), 3.5e38);
+}
+
+TEST_F(SearchCommandTest, WhatPreProcessorsWouldBlowUpIsRefused) {
+  std::string steps;
+  for (const char* length : {"200", "150", "100", "60", "40", "20", "8", "2"}) {
+    steps += std::string(steps.empty() ? "" : ",") + R"({"name":"ngram","argument":")" + length + "\"}";
+  }
+  ASSERT_EQ(
+      client_.AskForError(
+          R"({"command":"index_create","data":{"id":"grams","settings":{"fields":[{"name":"t","type":"text",)"
+          R"("pre_processors":[)" +
+          steps + "]}]}}}"),
+      "");
+  const std::string word(255, 'x');
+  EXPECT_EQ(client_.AskForError(R"({"command":"analyze","data":{"id":"grams","field":"t","text":")" + word +
+                                "\"}}"),
+            "bad_request");
+  EXPECT_EQ(client_.AskForError(SearchRequest("t:" + word, "", R"(["grams"])")), "limit_exceeded");
 }
 
 TEST_F(SearchCommandTest, AnIndexThatIsSearchedIsNotTakenAway) {
@@ -252,6 +280,19 @@ TEST_F(LoadedPluginTest, SlowSearchesHoldUpNoOtherRequests) {
             "");
   EXPECT_EQ(client.AskForError(R"({"command":"index_delete","data":{"id":"books","confirm":"books"}})"),
             "locked");
+}
+
+TEST_F(LoadedPluginTest, ASearchThatDoesNotEndDoesNotKeepTheDaemonFromEnding) {
+  std::vector<std::string> arguments = Arguments();
+  arguments.insert(arguments.end(), {"--shutdown-timeout", "1"});
+  DaemonProcess daemon(folder_.path(), arguments);
+  DaemonClient client(daemon.socket());
+  MakeBooks(client);
+  DaemonClient slow(daemon.socket());
+  ASSERT_TRUE(slow.Send(PausingSearch(600'000)));
+  EXPECT_EQ(client.AskForError(R"({"command":"status"})"), "");
+  EXPECT_EQ(daemon.Stop(), 1);
+  EXPECT_THAT(daemon.Log(), HasSubstr("does not end in time"));
 }
 
 TEST_F(LoadedPluginTest, AFolderThatIsNotFitKeepsTheDaemonFromStarting) {

@@ -28,6 +28,9 @@ class DocumentBuilder {
   // What Add would index of a value. Throws IndexValueError.
   std::wstring CheckValue(std::string_view field, std::string_view value) const;
 
+  // How many times as much text at most the field's pre-processors make of a value. Throws IndexValueError.
+  uint64_t MostGrowthOf(std::string_view field) const { return Find(field).most_growth; }
+
   // A term to look for in the index. Throws IndexValueError: no such field, no valid UTF-8.
   Lucene::TermPtr BuildTerm(std::string_view field, std::string_view value) const;
 

@@ -13,6 +13,7 @@
 #include "elastic/format/deletions.h"
 #include "elastic/format/file_names.h"
 #include "elastic/format/folder.h"
+#include "elastic/format/quoted.h"
 #include "elastic/format/segment_files.h"
 #include "elastic/index/document_builder.h"
 #include "elastic/index/durable_file.h"
@@ -267,6 +268,11 @@ IndexStatistics Index::Statistics() const { return ReadStatistics(format::DiskFo
 
 std::vector<AnalyzedToken> Index::Analyze(std::string_view field, std::string_view value) const {
   const std::wstring checked = impl_->builder().CheckValue(field, value);
+  constexpr uint64_t kMostShown = uint64_t{4} << 20;
+  if (checked.size() * impl_->builder().MostGrowthOf(field) > kMostShown) {
+    throw IndexValueError(path(), "field " + format::Quoted(field) + ": the value may become more than " +
+                                      std::to_string(kMostShown) + " characters of terms, too many to show");
+  }
   return AnalyzeValue(settings(), field, checked);
 }
 

@@ -48,10 +48,10 @@ class TermPlugin : public BuiltInPlugin {
 
  private:
   Lucene::FilterPtr Make(const SearchPluginContext& context, PluginData& data) const override {
-    std::wstring field = data.TakeField("field", context.settings);
-    std::vector<std::wstring> values = data.TakeTexts("values", context.limits);
+    const std::wstring field = data.TakeField("field", context.settings);
+    const std::vector<std::wstring> values = data.TakeTexts("values", context.limits);
     data.RefuseOthers();
-    return newLucene<TermsFilter>(std::move(field), std::move(values));
+    return newLucene<TermsFilter>(field, values);
   }
 };
 
@@ -62,9 +62,9 @@ class IdsPlugin : public BuiltInPlugin {
 
  private:
   Lucene::FilterPtr Make(const SearchPluginContext& context, PluginData& data) const override {
-    std::vector<std::wstring> values = data.TakeTexts("values", context.limits);
+    const std::vector<std::wstring> values = data.TakeTexts("values", context.limits);
     data.RefuseOthers();
-    return newLucene<TermsFilter>(StringUtils::toUnicode(context.settings.id_field), std::move(values));
+    return newLucene<TermsFilter>(StringUtils::toUnicode(context.settings.id_field), values);
   }
 };
 
@@ -79,7 +79,7 @@ class RangePlugin : public BuiltInPlugin {
 
  private:
   Lucene::FilterPtr Make(const SearchPluginContext& context, PluginData& data) const override {
-    std::wstring field = data.TakeField("field", context.settings);
+    const std::wstring field = data.TakeField("field", context.settings);
     const bool includes_lower = data.TakeBool("include_lower", true);
     const bool includes_upper = data.TakeBool("include_upper", true);
     const bool numeric = data.TakeBool("numeric", false);
@@ -88,12 +88,12 @@ class RangePlugin : public BuiltInPlugin {
       const Range<Number> range{TakeNumber(data, "from"), TakeNumber(data, "to"), includes_lower,
                                 includes_upper};
       data.RefuseOthers();
-      return NewNumberRangeFilter(std::move(field), range);
+      return NewNumberRangeFilter(field, range);
     }
     const Range<std::wstring> range{TakeBound(data, "from"), TakeBound(data, "to"), includes_lower,
                                     includes_upper};
     data.RefuseOthers();
-    return NewTextRangeFilter(std::move(field), range);
+    return NewTextRangeFilter(field, range);
   }
 
   static std::optional<std::wstring> TakeBound(PluginData& data, const char* name) {
@@ -121,12 +121,12 @@ class CategoryPlugin : public BuiltInPlugin {
 
  private:
   Lucene::FilterPtr Make(const SearchPluginContext& context, PluginData& data) const override {
-    std::wstring field = data.TakeField("field", context.settings);
+    const std::wstring field = data.TakeField("field", context.settings);
     const std::string wanted = StringUtils::toUTF8(data.TakeText("category"));
     data.RefuseOthers();
     for (const FileCategory& category : kFileCategories) {
       if (category.name == wanted) {
-        return newLucene<TermsFilter>(std::move(field), Extensions(category.extensions));
+        return newLucene<TermsFilter>(field, Extensions(category.extensions));
       }
     }
     data.Refuse("member \"category\" is no category");

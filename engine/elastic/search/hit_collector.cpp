@@ -4,6 +4,8 @@
 #include <lucene++/Scorer.h>
 
 #include <algorithm>
+#include <cmath>
+#include <limits>
 #include <tuple>
 #include <utility>
 
@@ -12,6 +14,13 @@ namespace {
 
 // How many documents are collected between two looks at the clock.
 constexpr uint64_t kDeadlineInterval = 1024;
+
+// Boosts within boosts can leave the range of a score; neither the order nor JSON could do with what comes of that.
+double FiniteScore(double score) {
+  constexpr double kLargest = std::numeric_limits<float>::max();
+  if (std::isnan(score)) return 0;
+  return std::clamp(score, -kLargest, kLargest);
+}
 
 bool IsBetter(const FoundDocument& a, const FoundDocument& b) {
   if (a.score != b.score) return a.score > b.score;
@@ -31,7 +40,7 @@ std::vector<FoundDocument> HitCollector::TakeBest() {
 void HitCollector::setScorer(const Lucene::ScorerPtr& scorer) { scorer_ = scorer.get(); }
 
 void HitCollector::collect(int32_t document) {
-  const FoundDocument found{scorer_->score(), index_, document_base_ + document};
+  const FoundDocument found{FiniteScore(scorer_->score()), index_, document_base_ + document};
   max_score_ = total_ == 0 ? found.score : std::max(max_score_, found.score);
   if (total_++ % kDeadlineInterval == 0) CheckDeadline();
   if (heap_.size() < most_kept_) {

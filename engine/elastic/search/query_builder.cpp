@@ -57,7 +57,9 @@ class FieldwiseParser : public Lucene::QueryParser {
   QueryPtr getFieldQuery(const String& name, const String& text, int32_t slop) override {
     return ForFields(name, [&](const String& target, const FieldSettings& settings) -> QueryPtr {
       if (!IsAnalyzed(settings)) return Counted(newTermQuery(newLucene<Lucene::Term>(target, text)));
+      CheckGrowth(text, settings);
       const QueryPtr query = QueryParser::getFieldQuery(target, text);
+      if (slop > 0) CheckNearWords(query);
       if (const auto phrase = boost::dynamic_pointer_cast<Lucene::PhraseQuery>(query)) phrase->setSlop(slop);
       if (const auto phrase = boost::dynamic_pointer_cast<Lucene::MultiPhraseQuery>(query))
         phrase->setSlop(slop);
@@ -145,6 +147,27 @@ class FieldwiseParser : public Lucene::QueryParser {
     }
     CountClauses(terms);
     return query;
+  }
+
+  // Before a chain of pre-processors makes more of a text than could be looked for anyway.
+  void CheckGrowth(const String& text, const FieldSettings& settings) const {
+    constexpr uint64_t kMostCharacters = uint64_t{4} << 20;
+    if (text.size() * MostGrowth(settings.pre_processors) <= kMostCharacters) return;
+    throw LimitExceededError("query_clauses", limits_.query_clauses,
+                             "the pre-processors of field " + format::Quoted(settings.name) +
+                                 " may make too many terms of the query");
+  }
+
+  void CheckNearWords(const QueryPtr& query) const {
+    int32_t words = 0;
+    if (const auto phrase = boost::dynamic_pointer_cast<Lucene::PhraseQuery>(query))
+      words = phrase->getTerms().size();
+    if (const auto phrase = boost::dynamic_pointer_cast<Lucene::MultiPhraseQuery>(query)) {
+      words = phrase->getTermArrays().size();
+    }
+    if (static_cast<size_t>(words) <= limits_.near_words) return;
+    throw LimitExceededError("near_words", limits_.near_words,
+                             "a phrase with a distance has " + std::to_string(words) + " words");
   }
 
   void CountClauses(size_t count) {

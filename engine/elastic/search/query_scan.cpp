@@ -26,9 +26,9 @@ namespace {
 using Kind = Lucene::QueryParserConstants::RegularExpressionId;
 using Constants = Lucene::QueryParserConstants;
 
-// Beyond these, scores and distances leave the range of their types.
+// Beyond these, scores leave the range of their type, and near words take too long to find.
 constexpr double kLargestBoost = 1'000'000;
-constexpr double kLargestSlop = 1'000'000;
+constexpr double kLargestSlop = 1000;
 
 struct Token {
   Kind kind = Constants::_EOF;
@@ -176,7 +176,7 @@ class Scan {
         const Token phrase = tokens_.Take();
         CheckEscapes(phrase, std::wstring_view(phrase.image).substr(1, phrase.image.size() - 2));
         CountClause(false);
-        TakeMeasure(kLargestSlop, "a distance is a number up to 1000000");
+        TakeMeasure(kLargestSlop, "a distance is a number up to 1000");
         return TakeBoost();
       }
       case Constants::RANGEIN_START:

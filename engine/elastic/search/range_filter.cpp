@@ -42,21 +42,21 @@ std::optional<Number> ParseNumber(const std::wstring& text) {
   return is_number ? std::optional(number) : std::nullopt;
 }
 
-Lucene::FilterPtr NewTextRangeFilter(std::wstring field, const Range<std::wstring>& range) {
+Lucene::FilterPtr NewTextRangeFilter(const std::wstring& field, const Range<std::wstring>& range) {
   const auto judge = [range](const std::wstring& term) {
     if (IsAbove(range, term)) return Verdict::kEnd;
     return IsBelow(range, term) ? Verdict::kPassOver : Verdict::kTake;
   };
-  return Lucene::newLucene<JudgedTermsFilter>(std::move(field), range.from.value_or(L""), judge);
+  return Lucene::newLucene<JudgedTermsFilter>(field, range.from.value_or(L""), judge);
 }
 
-Lucene::FilterPtr NewNumberRangeFilter(std::wstring field, const Range<Number>& range) {
+Lucene::FilterPtr NewNumberRangeFilter(const std::wstring& field, const Range<Number>& range) {
   const auto judge = [range](const std::wstring& term) {
     const std::optional<Number> number = ParseNumber(term);
     const bool is_inside = number.has_value() && !IsBelow(range, *number) && !IsAbove(range, *number);
     return is_inside ? Verdict::kTake : Verdict::kPassOver;
   };
-  return Lucene::newLucene<JudgedTermsFilter>(std::move(field), std::wstring(), judge);
+  return Lucene::newLucene<JudgedTermsFilter>(field, std::wstring(), judge);
 }
 
 }  // namespace vantrel::elastic

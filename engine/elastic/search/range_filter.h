@@ -22,7 +22,7 @@ struct Range {
 std::optional<Number> ParseNumber(const std::wstring& text);
 
 // Keep the documents with a value of the field in the range.
-Lucene::FilterPtr NewTextRangeFilter(std::wstring field, const Range<std::wstring>& range);
-Lucene::FilterPtr NewNumberRangeFilter(std::wstring field, const Range<Number>& range);
+Lucene::FilterPtr NewTextRangeFilter(const std::wstring& field, const Range<std::wstring>& range);
+Lucene::FilterPtr NewNumberRangeFilter(const std::wstring& field, const Range<Number>& range);
 
 }  // namespace vantrel::elastic

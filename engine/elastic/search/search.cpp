@@ -52,7 +52,7 @@ Lucene::FilterPtr MakeFilter(const SearchRequest& request, const SearchPluginReg
     made.push_back(plugin->MakeFilter(context, filter.data));
     if (!made.back()) throw PluginDataError(filter.plugin, "the plugin made no filter of its data");
   }
-  return made.empty() ? Lucene::FilterPtr() : newLucene<AllFilter>(std::move(made));
+  return made.empty() ? Lucene::FilterPtr() : newLucene<AllFilter>(made);
 }
 
 HitCollector::Deadline DeadlineOf(const SearchRequest& request) {
@@ -173,6 +173,7 @@ SearchResult SearchIndexes(const std::vector<std::shared_ptr<Index>>& indexes, c
                            const SearchPluginRegistry& plugins, const SearchLimits& limits) {
   CheckIndexCount(indexes.size(), limits);
   std::vector<SearchedIndex> searched;
+  searched.reserve(indexes.size());
   for (const std::shared_ptr<Index>& index : indexes) {
     searched.push_back({index->path(), index->settings(), index->NewestSnapshot()});
   }

@@ -22,10 +22,10 @@ const SearchPluginRegistry& SearchPluginRegistry::BuiltIn() {
   return registry;
 }
 
-void SearchPluginRegistry::Add(std::shared_ptr<const SearchPlugin> plugin) {
+void SearchPluginRegistry::Add(const std::shared_ptr<const SearchPlugin>& plugin) {
   const std::string name = plugin->name();
   if (name.empty()) throw PluginLoadError("search plugin \"\"", "a plugin needs a name");
-  if (!plugins_.try_emplace(name, std::move(plugin)).second) {
+  if (!plugins_.try_emplace(name, plugin).second) {
     throw PluginLoadError("search plugin " + format::Quoted(name), "there is one of that name already");
   }
 }

@@ -113,7 +113,7 @@ class VANTREL_ELASTIC_EXPORT Index {
   IndexStatistics Statistics() const;
 
   // What becomes of a value of a field: the terms that are indexed. A keyword is one. Throws IndexValueError for
-  // what Add refuses.
+  // what Add refuses, and where the terms may have more than 4 Mi characters in all.
   std::vector<AnalyzedToken> Analyze(std::string_view field, std::string_view value) const;
 
   // Searches this index alone; see SearchIndexes.

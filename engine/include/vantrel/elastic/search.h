@@ -23,10 +23,11 @@ struct SearchLimits {
   size_t query_clauses = 1024;            // terms looked up, each field of a word without a field counted
   size_t query_expansions = 32;     // of these, the ones that walk a dictionary: prefixes, wildcards, ...
   size_t pattern_characters = 256;  // one prefix, wildcard or fuzzy term
-  size_t window = 10'000;           // from + size
-  size_t filters = 16;              // in one request
-  size_t filter_values = 65'536;    // in one filter
-  size_t indexes = 64;              // searched at once
+  size_t near_words = 16;  // of a phrase with a distance: their places are tried one against all others
+  size_t window = 10'000;  // from + size
+  size_t filters = 16;     // in one request
+  size_t filter_values = 65'536;           // in one filter
+  size_t indexes = 64;                     // searched at once
   size_t result_bytes = size_t{32} << 20;  // stored values of all hits together
 };
 

@@ -68,7 +68,7 @@ class VANTREL_ELASTIC_EXPORT SearchPluginRegistry {
   static const SearchPluginRegistry& BuiltIn();
 
   // Throws PluginLoadError where the plugin has no name, or there is one of its name.
-  void Add(std::shared_ptr<const SearchPlugin> plugin);
+  void Add(const std::shared_ptr<const SearchPlugin>& plugin);
 
   // Null where there is none of that name.
   std::shared_ptr<const SearchPlugin> Find(const std::string& name) const;
