@@ -63,6 +63,7 @@ TEST_F(ConnectionsTest, ManyClientsGetTheirOwnReplies) {
   constexpr int kRounds = 10;
   std::atomic<int> wrong{0};
   std::vector<std::thread> threads;
+  threads.reserve(kClients);
   for (int c = 0; c < kClients; ++c) {
     threads.emplace_back([&, c] {
       DaemonClient client = Connect();
@@ -193,7 +194,7 @@ TEST_F(FewConnectionsTest, OneTooManyIsToldSoAndHungUpOn) {
   DaemonClient first = Connect();
   ASSERT_EQ(first.AskForError(R"({"command":"status"})"), "");
   auto second = std::make_unique<DaemonClient>(daemon_.socket());
-  while (second->AskForError(R"({"command":"status"})") != "") {  // the index's maker is still being seen off
+  while (!second->AskForError(R"({"command":"status"})").empty()) {  // the index's maker is still being seen off
     second = std::make_unique<DaemonClient>(daemon_.socket());
   }
   DaemonClient third = Connect();

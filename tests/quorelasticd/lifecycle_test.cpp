@@ -25,7 +25,6 @@ namespace quorelastic::testing {
 namespace {
 
 namespace fs = std::filesystem;
-using ::testing::AnyOf;
 using ::testing::HasSubstr;
 
 constexpr const char* kCreate =

@@ -103,6 +103,7 @@ TEST_F(RegistryTest, WhatAnotherProcessWritesToIsNotDeleted) {
 
 TEST_F(RegistryTest, ManyThreadsMakeUseAndDeleteAtOnce) {
   std::vector<std::thread> threads;
+  threads.reserve(4);
   for (int i = 0; i < 4; ++i) {
     threads.emplace_back([&] {
       for (int round = 0; round < 20; ++round) {

@@ -24,6 +24,13 @@ using Lucene::newLucene;
 
 constexpr rlim_t kMostMemory = rlim_t{2} << 30;
 
+// A sanitizer takes more address space than that for itself.
+#if defined(__SANITIZE_ADDRESS__) || defined(__SANITIZE_THREAD__)
+constexpr bool kLimitsMemory = false;
+#else
+constexpr bool kLimitsMemory = true;
+#endif
+
 // The checker reads tens of megabytes a second; a slow disk is given one.
 constexpr uint64_t kBytesPerSecond = uint64_t{1} << 20;
 constexpr uint64_t kLeastSeconds = 30;
@@ -38,7 +45,7 @@ unsigned TimeFor(uint64_t bytes) {
   const rlimit none = {0, 0};
   setrlimit(RLIMIT_CORE, &none);
   const rlimit memory = {kMostMemory, kMostMemory};
-  setrlimit(RLIMIT_AS, &memory);
+  if (kLimitsMemory) setrlimit(RLIMIT_AS, &memory);
   // What the C library says of a broken heap is for nobody.
   const int nothing = open("/dev/null", O_WRONLY | O_CLOEXEC);
   dup2(nothing, STDERR_FILENO);

@@ -16,9 +16,7 @@ namespace {
 using ::quorelastic::testing::OwnIndex;
 using ::quorelastic::testing::Request;
 using ::quorelastic::testing::Thrown;
-using ::testing::ElementsAre;
 using ::testing::HasSubstr;
-using ::testing::IsEmpty;
 
 std::string Repeated(const std::string& piece, size_t times) {
   std::string text;

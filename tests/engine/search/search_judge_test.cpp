@@ -21,11 +21,9 @@ namespace {
 using ::Lucene::newLucene;
 using ::Lucene::StringUtils;
 using ::quorelastic::testing::Filter;
-using ::quorelastic::testing::Ids;
 using ::quorelastic::testing::OwnIndex;
 using ::quorelastic::testing::Pieces;
 using ::quorelastic::testing::Request;
-using ::quorelastic::testing::SortedIds;
 
 constexpr int kWords = 12;
 

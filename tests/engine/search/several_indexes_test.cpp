@@ -23,7 +23,6 @@ using ::quorelastic::testing::Pieces;
 using ::quorelastic::testing::Request;
 using ::quorelastic::testing::Thrown;
 using ::testing::ElementsAre;
-using ::testing::HasSubstr;
 using ::testing::IsEmpty;
 using ::testing::SizeIs;
 
@@ -66,6 +65,7 @@ class SplitIndexTest : public ::testing::Test {
   OwnIndex whole_{Fields()};
   std::vector<std::unique_ptr<OwnIndex>> parts_ = [] {
     std::vector<std::unique_ptr<OwnIndex>> parts;
+    parts.reserve(3);
     for (int i = 0; i < 3; ++i) parts.push_back(std::make_unique<OwnIndex>(Fields()));
     return parts;
   }();

@@ -14,7 +14,6 @@ namespace vantrel::elastic {
 namespace {
 
 using ::quorelastic::testing::LibraryFrequencies;
-using ::quorelastic::testing::RandomIndexShape;
 using ::quorelastic::testing::ReadLibraryFrequencies;
 using ::quorelastic::testing::SuggestByBruteForce;
 using ::quorelastic::testing::TemporaryFolder;

@@ -35,6 +35,7 @@ static_assert(sizeof(Suggestion) == sizeof(void*) + sizeof(std::string) + sizeof
 
 std::vector<std::string> Rendered(const std::vector<Suggestion>& suggestions) {
   std::vector<std::string> lines;
+  lines.reserve(suggestions.size());
   for (const Suggestion& suggestion : suggestions) {
     lines.push_back(suggestion.type() + " " + suggestion.payload().toString());
   }
