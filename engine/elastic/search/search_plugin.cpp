@@ -12,7 +12,7 @@ namespace vantrel::elastic {
 SearchPlugin::~SearchPlugin() = default;
 
 SearchPluginRegistry::SearchPluginRegistry() {
-  for (auto& plugin : MakeBuiltInPlugins()) Add(std::move(plugin));
+  for (const auto& plugin : MakeBuiltInPlugins()) Add(plugin);
 }
 
 SearchPluginRegistry::~SearchPluginRegistry() = default;
