@@ -32,6 +32,7 @@ constexpr std::array kTermVectors = {
 template <typename Table>
 Shape ChoiceOf(const Table& table) {
   std::vector<std::string> words;
+  words.reserve(table.size());
   for (const auto& entry : table) words.emplace_back(entry.word);
   return Choice(std::move(words));
 }

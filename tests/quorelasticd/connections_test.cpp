@@ -194,7 +194,8 @@ TEST_F(FewConnectionsTest, OneTooManyIsToldSoAndHungUpOn) {
   DaemonClient first = Connect();
   ASSERT_EQ(first.AskForError(R"({"command":"status"})"), "");
   auto second = std::make_unique<DaemonClient>(daemon_.socket());
-  while (!second->AskForError(R"({"command":"status"})").empty()) {  // the index's maker is still being seen off
+  while (
+      !second->AskForError(R"({"command":"status"})").empty()) {  // the index's maker is still being seen off
     second = std::make_unique<DaemonClient>(daemon_.socket());
   }
   DaemonClient third = Connect();

@@ -18,7 +18,6 @@
 namespace quorelastic::testing {
 namespace {
 
-using ::testing::AnyOf;
 using ::testing::HasSubstr;
 using ::testing::StartsWith;
 
