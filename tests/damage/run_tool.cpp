@@ -9,14 +9,10 @@
 #include <stdexcept>
 #include <system_error>
 
+#include "support/sanitized.h"
+
 namespace quorelastic::testing {
 namespace {
-
-#if defined(__SANITIZE_ADDRESS__) || defined(__SANITIZE_THREAD__)
-constexpr bool kIsSanitized = true;
-#else
-constexpr bool kIsSanitized = false;
-#endif
 
 constexpr rlim_t kMostMemory = rlim_t{1} << 30;
 constexpr unsigned kMostSeconds = 10;

@@ -12,9 +12,9 @@
 
 #include "data_root/file_lock.h"
 #include "quordaemon/wire.h"
-#include "sanitized.h"
 #include "served_index.h"
 #include "support/files.h"
+#include "support/sanitized.h"
 
 namespace quorelastic::testing {
 namespace {

@@ -12,8 +12,8 @@
 #include <vector>
 
 #include "quordaemon/wire.h"
-#include "sanitized.h"
 #include "served_index.h"
+#include "support/sanitized.h"
 
 namespace quorelastic::testing {
 namespace {

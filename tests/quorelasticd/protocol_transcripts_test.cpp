@@ -22,8 +22,8 @@
 #include "errors/error_code.h"
 #include "protocol_document.h"
 #include "quordaemon/wire.h"
-#include "sanitized.h"
 #include "support/files.h"
+#include "support/sanitized.h"
 #include "support/temporary_folder.h"
 
 namespace quorelastic::testing {

@@ -17,7 +17,7 @@
 #include "daemon_process.h"
 #include "quordaemon/wire.h"
 #include "run_size.h"
-#include "sanitized.h"
+#include "support/sanitized.h"
 #include "support/temporary_folder.h"
 
 namespace quorelastic::testing {

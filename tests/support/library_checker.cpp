@@ -14,14 +14,10 @@
 #include <lucene++/CheckIndex.h>
 #include <lucene++/SegmentInfos.h>
 
+#include "support/sanitized.h"
+
 namespace quorelastic::testing {
 namespace {
-
-#if defined(__SANITIZE_ADDRESS__) || defined(__SANITIZE_THREAD__)
-constexpr bool kIsSanitized = true;
-#else
-constexpr bool kIsSanitized = false;
-#endif
 
 constexpr rlim_t kMostMemory = rlim_t{2} << 30;
 constexpr unsigned kMostSeconds = 10;

@@ -11,14 +11,13 @@
 #include <string>
 #include <thread>
 
-#include "quorelasticd/sanitized.h"
+#include "support/sanitized.h"
 #include "support/tool_run.h"
 #include "tool/outcome.h"
 
 namespace quorelastic::testing {
 namespace {
 
-using ::testing::EndsWith;
 using ::testing::MatchesRegex;
 using ::testing::StartsWith;
 

@@ -15,7 +15,6 @@ namespace vantrel::elastic {
 namespace {
 
 using ::quorelastic::testing::LibraryIndex;
-using ::quorelastic::testing::ListFolder;
 using ::quorelastic::testing::ReadFile;
 using ::quorelastic::testing::TemporaryFolder;
 using ::quorelastic::testing::WriteFile;

@@ -110,7 +110,7 @@ TEST(NgramPreProcTest, TakesAscendingLengthsAndNothingElse) {
 
 TEST(NgramPreProcTest, ABadArgumentIsShownInTheError) {
   try {
-    NgramPreProc(nullptr, "x\n");
+    const NgramPreProc refused(nullptr, "x\n");
     ADD_FAILURE() << "taken";
   } catch (const std::invalid_argument& error) {
     EXPECT_THAT(error.what(), ::testing::HasSubstr(R"("x\x0a")"));
