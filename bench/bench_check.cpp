@@ -1,14 +1,11 @@
 // "check" against the index library's own checker on a healthy index, whole processes, as ratios in one run.
 
 #include <cstdint>
-#include <cstdlib>
-#include <exception>
-#include <filesystem>
-#include <iostream>
 #include <string>
 #include <vector>
 
 #include "support/figures.h"
+#include "support/run_benchmark.h"
 #include "support/timed_run.h"
 
 namespace {
@@ -40,18 +37,4 @@ bool Measure(const std::string& folder) {
 
 }  // namespace
 
-int main() {
-  std::string folder = (std::filesystem::temp_directory_path() / "quorelastic-bench-XXXXXX").string();
-  if (mkdtemp(folder.data()) == nullptr) {
-    std::cerr << "cannot create " << folder << std::endl;
-    return 2;
-  }
-  int status = 2;
-  try {
-    status = Measure(folder) ? 0 : 1;
-  } catch (const std::exception& error) {
-    std::cerr << error.what() << std::endl;
-  }
-  std::filesystem::remove_all(folder);
-  return status;
-}
+int main() { return quorelastic::bench::RunBenchmark(Measure); }

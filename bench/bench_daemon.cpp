@@ -1,10 +1,7 @@
 // The daemon and the actions that talk to it against their peers, whole processes, as ratios in one run.
 
-#include <cstdlib>
-#include <exception>
 #include <filesystem>
 #include <fstream>
-#include <iostream>
 #include <stdexcept>
 #include <string>
 #include <vector>
@@ -12,6 +9,7 @@
 #include "quordaemon/domain_sock_connection.h"
 #include "support/background_process.h"
 #include "support/figures.h"
+#include "support/run_benchmark.h"
 #include "support/timed_run.h"
 #include "support/wordnet_queries.h"
 #include "vantrel/elastic/json_value.h"
@@ -165,17 +163,6 @@ class DaemonBench {
 }  // namespace
 
 int main() {
-  std::string folder = (fs::temp_directory_path() / "quorelastic-bench-XXXXXX").string();
-  if (mkdtemp(folder.data()) == nullptr) {
-    std::cerr << "cannot create " << folder << std::endl;
-    return 2;
-  }
-  int status = 2;
-  try {
-    status = DaemonBench(folder).Measure() ? 0 : 1;
-  } catch (const std::exception& error) {
-    std::cerr << error.what() << std::endl;
-  }
-  fs::remove_all(folder);
-  return status;
+  return quorelastic::bench::RunBenchmark(
+      [](const std::string& folder) { return DaemonBench(folder).Measure(); });
 }

@@ -9,7 +9,6 @@
 #include <cerrno>
 #include <chrono>
 #include <csignal>
-#include <exception>
 #include <filesystem>
 #include <functional>
 #include <iostream>
@@ -18,7 +17,7 @@
 #include <vector>
 
 #include "support/figures.h"
-#include "support/scratch_folder.h"
+#include "support/run_benchmark.h"
 #include "support/timed_run.h"
 
 namespace {
@@ -26,7 +25,6 @@ namespace {
 using quorelastic::bench::Comparison;
 using quorelastic::bench::Figures;
 using quorelastic::bench::Run;
-using quorelastic::bench::ScratchFolder;
 
 constexpr uint64_t kColdBytes = uint64_t{300} << 20;
 constexpr char kGibibyte[] = "1024";
@@ -123,9 +121,8 @@ double FillSeconds(const std::vector<std::string>& command) {
   return took.count();
 }
 
-bool Measure() {
-  const ScratchFolder folder;
-  const std::string root = folder.path() + "/root";
+bool Measure(const std::string& folder) {
+  const std::string root = folder + "/root";
   MakeIndexes(root);
 
   Figures figures;
@@ -148,11 +145,4 @@ bool Measure() {
 
 }  // namespace
 
-int main() {
-  try {
-    return Measure() ? 0 : 1;
-  } catch (const std::exception& error) {
-    std::cerr << error.what() << std::endl;
-    return 2;
-  }
-}
+int main() { return quorelastic::bench::RunBenchmark(Measure); }

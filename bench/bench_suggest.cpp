@@ -1,12 +1,10 @@
 // Suggestions against their peers, whole processes, as ratios in one run.
 
-#include <exception>
-#include <iostream>
 #include <string>
 #include <vector>
 
 #include "support/figures.h"
-#include "support/scratch_folder.h"
+#include "support/run_benchmark.h"
 #include "support/timed_run.h"
 
 namespace {
@@ -15,7 +13,6 @@ using quorelastic::bench::Compare;
 using quorelastic::bench::Comparison;
 using quorelastic::bench::Figures;
 using quorelastic::bench::Run;
-using quorelastic::bench::ScratchFolder;
 
 const std::string kTool = QUORELASTIC_TOOL;
 
@@ -23,9 +20,8 @@ std::vector<std::string> Suggest(const std::string& index, const std::string& pr
   return {kTool, "-a", "term_suggest", "-d", index, "-f", "body", "-t", prefix};
 }
 
-bool Measure() {
-  const ScratchFolder folder;
-  const std::string index = folder.path() + "/index";
+bool Measure(const std::string& folder) {
+  const std::string index = folder + "/index";
   Run({QUORELASTIC_MAKE_TERMS, index, "600000"});
 
   Figures figures;
@@ -43,11 +39,4 @@ bool Measure() {
 
 }  // namespace
 
-int main() {
-  try {
-    return Measure() ? 0 : 1;
-  } catch (const std::exception& error) {
-    std::cerr << error.what() << std::endl;
-    return 2;
-  }
-}
+int main() { return quorelastic::bench::RunBenchmark(Measure); }
