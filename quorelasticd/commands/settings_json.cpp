@@ -1,33 +1,20 @@
 #include "commands/settings_json.h"
 
 #include <algorithm>
-#include <array>
 #include <string>
 #include <vector>
 
 #include "base/limits.h"
+#include "vantrel/elastic/setting_words.h"
 
 namespace quorelasticd {
 namespace {
 
 using vantrel::elastic::FieldSettings;
-using vantrel::elastic::FieldType;
 using vantrel::elastic::IndexSettings;
-using vantrel::elastic::TermVector;
-
-template <typename T>
-struct Word {
-  T value;
-  const char* word;
-};
-
-constexpr std::array kTypes = {Word<FieldType>{FieldType::kText, "text"},
-                               Word<FieldType>{FieldType::kKeyword, "keyword"}};
-
-constexpr std::array kTermVectors = {
-    Word<TermVector>{TermVector::kNone, "none"}, Word<TermVector>{TermVector::kTerms, "terms"},
-    Word<TermVector>{TermVector::kPositions, "positions"}, Word<TermVector>{TermVector::kOffsets, "offsets"},
-    Word<TermVector>{TermVector::kPositionsAndOffsets, "positions_offsets"}};
+using vantrel::elastic::kFieldTypeWords;
+using vantrel::elastic::kTermVectorWords;
+using vantrel::elastic::ToWord;
 
 template <typename Table>
 Shape ChoiceOf(const Table& table) {
@@ -43,18 +30,12 @@ auto FromWord(const Table& table, const std::string& word) {
       ->value;
 }
 
-template <typename Table, typename T>
-const char* ToWord(const Table& table, T value) {
-  return std::find_if(table.begin(), table.end(), [&](const auto& entry) { return entry.value == value; })
-      ->word;
-}
-
 FieldSettings ToField(const Json::Value& json) {
   FieldSettings field;
   field.name = json["name"].asString();
-  field.type = FromWord(kTypes, json["type"].asString());
+  field.type = FromWord(kFieldTypeWords, json["type"].asString());
   field.stored = json.get("stored", field.stored).asBool();
-  field.term_vector = FromWord(kTermVectors, json.get("term_vector", "none").asString());
+  field.term_vector = FromWord(kTermVectorWords, json.get("term_vector", "none").asString());
   field.norms = json.get("norms", field.norms).asBool();
   field.frequencies = json.get("frequencies", field.frequencies).asBool();
   for (const Json::Value& step : json["pre_processors"]) {
@@ -72,10 +53,10 @@ Shape SettingsShape() {
   });
   const Shape field = Object({
       {"name", true, String(kLongestFieldName), "The field's name."},
-      {"type", true, ChoiceOf(kTypes),
+      {"type", true, ChoiceOf(kFieldTypeWords),
        "A text is cut into words, lower-cased, each of them a term; a keyword is one term as it is."},
       {"stored", false, Boolean(), "Whether a search can hand back the values; true by default."},
-      {"term_vector", false, ChoiceOf(kTermVectors),
+      {"term_vector", false, ChoiceOf(kTermVectorWords),
        "What is kept about the terms of each single document; none by default."},
       {"norms", false, Boolean(), "Whether short values score higher; true by default."},
       {"frequencies", false, Boolean(),
@@ -105,9 +86,9 @@ Json::Value ToJson(const IndexSettings& settings) {
   for (const FieldSettings& field : settings.fields) {
     Json::Value& object = json["fields"].append(Json::objectValue);
     object["name"] = field.name;
-    object["type"] = ToWord(kTypes, field.type);
+    object["type"] = ToWord(kFieldTypeWords, field.type);
     object["stored"] = field.stored;
-    object["term_vector"] = ToWord(kTermVectors, field.term_vector);
+    object["term_vector"] = ToWord(kTermVectorWords, field.term_vector);
     object["norms"] = field.norms;
     object["frequencies"] = field.frequencies;
     for (const auto& step : field.pre_processors) {

@@ -1,6 +1,5 @@
 #include "elastic/index/settings_file.h"
 
-#include <array>
 #include <cstddef>
 #include <set>
 #include <span>
@@ -16,34 +15,13 @@
 #include "elastic/preproc/pre_proc_chain.h"
 #include "vantrel/elastic/index_error.h"
 #include "vantrel/elastic/json_value.h"
+#include "vantrel/elastic/setting_words.h"
 
 namespace vantrel::elastic {
 namespace {
 
 constexpr int kVersion = 1;
 constexpr uint64_t kLargestFile = uint64_t{16} << 20;
-
-template <typename T>
-struct Word {
-  T value;
-  const char* word;
-};
-
-constexpr std::array kTypes = {Word<FieldType>{FieldType::kText, "text"},
-                               Word<FieldType>{FieldType::kKeyword, "keyword"}};
-
-constexpr std::array kTermVectors = {
-    Word<TermVector>{TermVector::kNone, "none"}, Word<TermVector>{TermVector::kTerms, "terms"},
-    Word<TermVector>{TermVector::kPositions, "positions"}, Word<TermVector>{TermVector::kOffsets, "offsets"},
-    Word<TermVector>{TermVector::kPositionsAndOffsets, "positions_offsets"}};
-
-template <typename Table, typename T>
-const char* ToWord(const Table& table, T value) {
-  for (const auto& entry : table) {
-    if (entry.value == value) return entry.word;
-  }
-  return "";
-}
 
 // One JSON object of the file. Members are taken one by one; what is left over at the end was unknown.
 class SettingsObject {
@@ -112,9 +90,9 @@ FieldSettings ReadField(const std::string& path, const Json::Value& value, size_
   SettingsObject object(path, value, "field " + std::to_string(number));
   FieldSettings field;
   field.name = object.TakeString("name");
-  field.type = object.TakeWord("type", kTypes);
+  field.type = object.TakeWord("type", kFieldTypeWords);
   field.stored = object.TakeBool("stored");
-  field.term_vector = object.TakeWord("term_vector", kTermVectors);
+  field.term_vector = object.TakeWord("term_vector", kTermVectorWords);
   field.norms = object.TakeBool("norms");
   field.frequencies = object.TakeBool("frequencies");
   if (object.Has("pre_processors")) {
@@ -183,9 +161,9 @@ void WriteSettings(const std::string& folder, const IndexSettings& settings) {
   for (const FieldSettings& field : settings.fields) {
     Json::Value& object = root["fields"].append(Json::objectValue);
     object["name"] = field.name;
-    object["type"] = ToWord(kTypes, field.type);
+    object["type"] = ToWord(kFieldTypeWords, field.type);
     object["stored"] = field.stored;
-    object["term_vector"] = ToWord(kTermVectors, field.term_vector);
+    object["term_vector"] = ToWord(kTermVectorWords, field.term_vector);
     object["norms"] = field.norms;
     object["frequencies"] = field.frequencies;
     for (const PreProcSettings& step : field.pre_processors) {
