@@ -66,8 +66,9 @@ std::set<std::string> FindCondemned(const std::string& path) {
       unsafe.insert(finding.segment);
   }
   std::set<std::string> condemned;
+  const uint64_t bytes = unsafe.empty() ? 0 : SizeOf(report);
   for (const std::string& segment : unsafe) {
-    if (!CheckerSurvives(path, segment, SizeOf(report))) condemned.insert(segment);
+    if (!CheckerSurvives(path, segment, bytes)) condemned.insert(segment);
   }
   return condemned;
 }
