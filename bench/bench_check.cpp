@@ -1,6 +1,7 @@
 // "check" against the index library's own checker on a healthy index, whole processes, as ratios in one run.
 
 #include <cstdint>
+#include <filesystem>
 #include <string>
 #include <vector>
 
@@ -17,21 +18,58 @@ using quorelastic::bench::Run;
 
 constexpr int64_t kMebibyte = 1 << 20;
 constexpr int kRuns = 5;
+constexpr int kManifestRuns = 15;  // a small difference of large numbers
+constexpr double kMostMillisecondsPerGigabyte = 100;
+
+std::vector<std::string> OnOne(std::vector<std::string> command) {
+  command.insert(command.begin(), {"/usr/bin/taskset", "--cpu-list", "0"});
+  return command;
+}
+
+std::vector<std::string> Check(const std::string& index) {
+  return {QUORELASTIC_TOOL, "-a", "check", "-d", index};
+}
+
+uint64_t SizeOf(const std::string& folder) {
+  uint64_t size = 0;
+  for (const auto& entry : std::filesystem::directory_iterator(folder)) size += entry.file_size();
+  return size;
+}
+
+void MeasureChecks(Figures& figures, const std::string& index) {
+  const std::vector<std::string> peer = {QUORELASTIC_PEER_LIBRARY_CHECK, index};
+  figures.AddRatio("check of an index of 320 MiB on one processor, against the index library's checker",
+                   Compare(OnOne(Check(index)), peer, kRuns), 0.1);
+  const Comparison all = Compare(Check(index), peer, kRuns);
+  figures.AddRatio("the same on all processors", all, 0.06);
+  figures.AddPeak("peak memory of check", all.ours.peak_bytes, 64 * kMebibyte);
+}
+
+void MeasureManifests(Figures& figures, const std::string& index, const std::string& folder) {
+  const std::string with = folder + "/with";
+  std::filesystem::create_directory(with);
+  for (const auto& entry : std::filesystem::directory_iterator(index)) {
+    std::filesystem::create_hard_link(entry.path(), std::filesystem::path(with) / entry.path().filename());
+  }
+  Run({QUORELASTIC_MAKE_MANIFEST, with});
+  const double milliseconds = kMostMillisecondsPerGigabyte * static_cast<double>(SizeOf(index)) / 1e9;
+  const Comparison check = Compare(OnOne(Check(with)), OnOne(Check(index)), kManifestRuns);
+  figures.AddDifference("check with a manifest on one processor, against without", check, milliseconds);
+  figures.AddPeak("peak memory of check with a manifest", check.ours.peak_bytes, 64 * kMebibyte);
+
+  const std::string loaded = folder + "/loaded";
+  Run({QUORELASTIC_PEER_LIBRARY_LOAD, loaded});
+  figures.AddRatio(
+      "digests of the WordNet index, against writing it",
+      Compare({QUORELASTIC_MAKE_MANIFEST, loaded}, {QUORELASTIC_PEER_LIBRARY_LOAD, loaded}, kRuns), 0.05);
+}
 
 bool Measure(const std::string& folder) {
   const std::string index = folder + "/index";
   Run({QUORELASTIC_MAKE_DOCUMENTS, index, "320"});
-  const std::vector<std::string> check = {QUORELASTIC_TOOL, "-a", "check", "-d", index};
-  std::vector<std::string> on_one = {"/usr/bin/taskset", "--cpu-list", "0"};
-  on_one.insert(on_one.end(), check.begin(), check.end());
-  const std::vector<std::string> peer = {QUORELASTIC_PEER_LIBRARY_CHECK, index};
-
   Figures figures;
-  figures.AddRatio("check of an index of 320 MiB on one processor, against the index library's checker",
-                   Compare(on_one, peer, kRuns), 0.1);
-  const Comparison all = Compare(check, peer, kRuns);
-  figures.AddRatio("the same on all processors", all, 0.06);
-  figures.AddPeak("peak memory of check", all.ours.peak_bytes, 64 * kMebibyte);
+  MeasureChecks(figures, index);
+  MeasureManifests(figures, index, folder);
   return figures.all_met();
 }
 

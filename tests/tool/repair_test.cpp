@@ -13,6 +13,7 @@
 #include "support/library_checker.h"
 #include "tool/inspection.h"
 #include "tool/outcome.h"
+#include "vantrel/elastic/index.h"
 #include "vantrel/elastic/write_lock.h"
 
 namespace quorelastic::testing {
@@ -132,6 +133,51 @@ TEST_F(RepairTest, KeepsASegmentWhoseDamageTheLibraryLivesWith) {
   const auto before = Contents(path());
   EXPECT_THAT(Inspect("repair", path()), Clean());
   EXPECT_EQ(Contents(path()), before);
+}
+
+// Three segments as before, written by the engine, which leaves a manifest.
+class RepairWithManifestTest : public RepairTest {
+ protected:
+  RepairWithManifestTest() {
+    std::filesystem::remove_all(path());
+    const auto index =
+        vantrel::elastic::Index::Create(path(), {.fields = {{.name = "body"}}, .compound_files = false});
+    for (int segment = 0; segment < 3; ++segment) {
+      for (int number = 0; number < 10; ++number) {
+        index->Add({{{"id", std::to_string(segment) + std::to_string(number)}, {"body", "a word"}}});
+      }
+      index->Commit();
+    }
+  }
+
+  void FlipNorm(const std::string& segment) const {
+    std::string norms = ReadFile(File(segment + ".nrm"));
+    norms.back() = static_cast<char>(norms.back() ^ 1);
+    WriteFile(File(segment + ".nrm"), norms);
+  }
+};
+
+TEST_F(RepairWithManifestTest, LeavesAFreshOne) {
+  std::filesystem::remove(File("_1.frq"));
+  EXPECT_THAT(Inspect("repair", path()), Done());
+  ExpectSegments({0, 2});
+  FlipNorm("_2");
+  EXPECT_THAT(Inspect("check", path()), Ended(0, "", "NOT clean\n"));
+}
+
+TEST_F(RepairWithManifestTest, DoesNotBlessWhatHasDecayedInAKeptSegment) {
+  FlipNorm("_2");
+  std::filesystem::remove(File("_1.frq"));
+  EXPECT_THAT(Inspect("repair", path()), Done());
+  EXPECT_EQ(CheckWithLibrary(path()), LibraryVerdict::kClean);
+  EXPECT_THAT(Inspect("check", path()), Ended(0, "", "NOT clean\n"));
+}
+
+TEST_F(RepairWithManifestTest, LeavesNoneWhereTheCommitHadNone) {
+  std::filesystem::remove(File("quorelastic.manifest"));
+  std::filesystem::remove(File("_1.frq"));
+  EXPECT_THAT(Inspect("repair", path()), Done());
+  EXPECT_FALSE(std::filesystem::exists(File("quorelastic.manifest")));
 }
 
 TEST_F(RepairTest, RefusesAnIndexThatIsOpenForWriting) {

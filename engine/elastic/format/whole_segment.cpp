@@ -33,9 +33,10 @@ bool IsMissingError(const IndexIoError& error) {
   return std::find(kErrors.begin(), kErrors.end(), error.error_number()) != kErrors.end();
 }
 
-void RethrowOpening(const IndexIoError& error) {
-  if (IsMissingError(error)) std::rethrow_exception(Missing(error));
-  throw IndexIoError(error);
+void RethrowOpening(const IndexError& error) {
+  const auto* system_error = dynamic_cast<const IndexIoError*>(&error);
+  if (system_error != nullptr && !IsMissingError(*system_error)) throw IndexIoError(*system_error);
+  std::rethrow_exception(Missing(error));
 }
 
 WholeSegment::Slot WholeSegment::OpenPlain(const Folder& folder, const std::string& name) {

@@ -26,7 +26,7 @@ class FileMissingError : public IndexError {
 bool IsMissingError(const IndexIoError& error);
 
 // Throws a failed opening on: as FileMissingError where the index can be blamed for it, else as it is.
-[[noreturn]] void RethrowOpening(const IndexIoError& error);
+[[noreturn]] void RethrowOpening(const IndexError& error);
 
 // Every file of a segment, plain, out of a compound file (.cfs), or out of a document store that it shares with
 // others (of its own name, plain or as .cfx). What is there is opened at once and stays open, so that a writer may

@@ -3,15 +3,17 @@
 #include <algorithm>
 #include <memory>
 #include <mutex>
-#include <set>
+#include <optional>
 #include <thread>
 #include <tuple>
 #include <utility>
 
 #include "elastic/format/file_names.h"
+#include "elastic/format/manifest.h"
 #include "elastic/format/quoted.h"
 #include "elastic/format/whole_segment.h"
 #include "elastic/health/commit_check.h"
+#include "elastic/health/digest_check.h"
 #include "elastic/health/metered_folder.h"
 #include "elastic/health/mismatch.h"
 #include "elastic/health/parallel.h"
@@ -91,11 +93,21 @@ unsigned ThreadsFor(const HealthOptions& options) {
   return options.threads > 0 ? options.threads : std::max(1U, std::thread::hardware_concurrency());
 }
 
+// Which segment a file belongs to, by its name; empty for others.
+std::string SegmentOf(const std::string& name) {
+  return name.starts_with('_') ? name.substr(0, name.find_first_of("._", 1)) : "";
+}
+
 // Checks a commit, some of its segments after the other.
 class CommitRun {
  public:
   CommitRun(const format::Folder& folder, const format::Commit& commit, unsigned threads, Meter& meter)
-      : folder_(folder), commit_(commit), threads_(threads), meter_(meter) {}
+      : commit_(commit),
+        threads_(threads),
+        meter_(meter),
+        manifest_(FindManifest(folder)),
+        metered_(folder, meter),
+        folder_(metered_, manifest_) {}
 
   void Run() {
     findings_.Run("", [this] { CheckCommit(folder_, commit_); });
@@ -108,12 +120,36 @@ class CommitRun {
         meter_.AddSegmentOpened();
       }
       RunBatch(batch);
+      FinishDigests();
     }
+    OpenTheRest();
+    FinishDigests();
   }
 
   Findings& findings() { return findings_; }
+  HealthReport::Manifest manifest_use() const { return manifest_use_; }
 
  private:
+  // Empty where there is none for this commit.
+  format::Manifest FindManifest(const format::Folder& folder) {
+    if (!folder.Exists(format::kManifestName)) return {};
+    manifest_use_ = HealthReport::Manifest::kNotUsed;
+    format::Manifest found;
+    findings_.Run("", [&] {
+      try {
+        std::optional<format::Manifest> read = format::ReadManifest(*folder.Open(format::kManifestName));
+        if (!read.has_value() || !read->BelongsTo(folder, commit_)) return;
+        found = std::move(*read);
+        manifest_use_ = HealthReport::Manifest::kCompared;
+      } catch (const IndexDamagedError&) {
+        throw;
+      } catch (const IndexError& error) {
+        format::RethrowOpening(error);
+      }
+    });
+    return found;
+  }
+
   void RunBatch(const std::vector<std::unique_ptr<SegmentCheck>>& batch) {
     std::vector<SegmentCheck::Part> parts;
     for (const auto& segment : batch) {
@@ -132,11 +168,37 @@ class CommitRun {
     RunParallel(tasks, threads_);
   }
 
-  const format::Folder& folder_;
+  // What no check of a segment has read of the files that are open.
+  void FinishDigests() {
+    std::vector<std::function<void()>> tasks;
+    for (const auto& check : folder_.TakeOpened()) {
+      tasks.emplace_back(
+          [this, check] { findings_.Run(SegmentOf(check->name()), [&] { check->Finish(); }); });
+    }
+    RunParallel(tasks, threads_);
+  }
+
+  // What the manifest names, and no segment may have opened: the commit's own file, and what is missing.
+  void OpenTheRest() {
+    for (const format::Manifest::File& file : manifest_.files) {
+      findings_.Run(SegmentOf(file.name), [&] {
+        try {
+          folder_.Open(file.name);
+        } catch (const IndexError& error) {
+          format::RethrowOpening(error);
+        }
+      });
+    }
+  }
+
   const format::Commit& commit_;
   unsigned threads_;
   Meter& meter_;
   Findings findings_;
+  HealthReport::Manifest manifest_use_ = HealthReport::Manifest::kNone;
+  format::Manifest manifest_;
+  MeteredFolder metered_;
+  DigestCheckedFolder folder_;
 };
 
 }  // namespace
@@ -159,8 +221,9 @@ HealthReport CheckFolder(const format::Folder& folder, const HealthOptions& opti
       return report;
     }
     report.generation = commit.generation;
-    CommitRun run(metered, commit, ThreadsFor(options), meter);
+    CommitRun run(folder, commit, ThreadsFor(options), meter);
     run.Run();
+    report.manifest = run.manifest_use();
     report.findings = run.findings().Take();
     report.files = meter.TakeFiles();
     meter.Tell();

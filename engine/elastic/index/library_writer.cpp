@@ -22,8 +22,9 @@ constexpr double kBufferMegabytes = 64;
 
 LibraryWriter::LibraryWriter(std::string folder, const WriteLock& /*lock*/, const IndexSettings& settings,
                              Start start)
-    : folder_(std::move(folder)) {
+    : folder_(std::move(folder)), manifest_(folder_) {
   Run("cannot open the index for writing", [&] { Open(settings, start); });
+  if (start == Start::kEmptyIndex) manifest_.Update();
 }
 
 LibraryWriter::~LibraryWriter() { RollBack(); }
@@ -61,6 +62,7 @@ void LibraryWriter::Optimize() {
 
 void LibraryWriter::Commit() {
   Run("cannot commit", [&] { writer_->commit(); });
+  manifest_.Update();
 }
 
 void LibraryWriter::Run(const char* purpose, const std::function<void()>& operation) {

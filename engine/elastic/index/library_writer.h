@@ -6,6 +6,7 @@
 #include <string>
 
 #include "elastic/index/disk_directory.h"
+#include "elastic/index/manifest_keeper.h"
 #include "vantrel/elastic/index_settings.h"
 #include "vantrel/elastic/write_lock.h"
 
@@ -18,7 +19,8 @@ class LibraryWriter {
  public:
   enum class Start { kEmptyIndex, kExistingIndex };
 
-  // `lock` stands on `folder` as long as the writer lives. With kEmptyIndex, an empty commit is made at once.
+  // `lock` stands on `folder` as long as the writer lives. With kEmptyIndex, an empty commit is made at once. Every
+  // commit is given a manifest, if the system lets it have one.
   // Throws IndexError.
   LibraryWriter(std::string folder, const WriteLock& lock, const IndexSettings& settings, Start start);
   LibraryWriter(const LibraryWriter&) = delete;
@@ -40,6 +42,7 @@ class LibraryWriter {
   std::string folder_;
   boost::shared_ptr<DiskDirectory> directory_;
   Lucene::IndexWriterPtr writer_;
+  ManifestKeeper manifest_;
 };
 
 }  // namespace vantrel::elastic

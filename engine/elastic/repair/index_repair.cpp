@@ -13,6 +13,7 @@
 #include "elastic/format/commit.h"
 #include "elastic/format/folder.h"
 #include "elastic/index/index_text.h"
+#include "elastic/index/manifest_keeper.h"
 #include "elastic/repair/checked_directory.h"
 #include "elastic/repair/checker_trial.h"
 #include "elastic/search/library_failure.h"
@@ -116,7 +117,9 @@ RepairOutcome RepairIndex(const std::string& path) {
   // With the lock: what was seen without may have been of a writer at work.
   Checker checker(path);
   if (checker.is_clean()) return RepairOutcome::kClean;
+  ManifestKeeper manifest(path);
   checker.Fix();
+  if (manifest.has_manifest()) manifest.Update();
   return RepairOutcome::kRepaired;
 }
 

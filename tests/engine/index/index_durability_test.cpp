@@ -121,7 +121,7 @@ TEST_F(IndexDurabilityTest, EveryFileOfAnIndexIsDurableAsSoonAsItIsCommitted) {
   EXPECT_THAT(ListFolder(made), Contains(EndsWith(".del")));
   for (const std::string& name : ListFolder(made)) {
     if (name == "segments.gen" || name == "quorelastic.lock") continue;
-    const std::string event = name == "quorelastic.json" ? name + ".new" : name;
+    const std::string event = name.starts_with("quorelastic.") ? name + ".new" : name;
     EXPECT_THAT(journal, Contains("sync " + made + "/" + event));
   }
 }
@@ -158,6 +158,15 @@ TEST_F(IndexDurabilityTest, ACommitWithAFileThatCannotBeSyncedFailsAndKeepsTheOn
   EXPECT_THROW(index().Commit(), IndexIoError);
   ExpectOnlyTheOldCommit();
   ExpectAFreshStart();
+}
+
+TEST_F(IndexDurabilityTest, ACommitWhoseManifestCannotBeSyncedStands) {
+  index().Add(MakeDocument("new", "text"));
+  failing_sync = path() + "/quorelastic.manifest.new";
+  index().Commit();
+  EXPECT_EQ(failing_sync, "");
+  EXPECT_THAT(Terms(path(), "id"), ElementsAre("new", "old"));
+  EXPECT_THAT(ListFolder(path()), Not(Contains(EndsWith(".new"))));
 }
 
 TEST_F(IndexDurabilityTest, SettingsThatCannotBeSyncedLeaveNoIndex) {

@@ -46,16 +46,24 @@ struct HealthOptions {
 };
 
 struct HealthReport {
+  // What every commit of an Index leaves beside its files: their sizes and digests.
+  enum class Manifest {
+    kNone,     // there is none
+    kNotUsed,  // it is of another commit or version, or damaged, which is a finding
+    kCompared  // every byte of every file was compared with it
+  };
+
   int64_t generation = -1;         // of the commit that was checked; -1 where none could be read
   std::vector<std::string> files;  // that it is made of, and that were there: their paths
   std::vector<HealthFinding> findings;
+  Manifest manifest = Manifest::kNone;
 
   bool clean() const { return findings.empty(); }
 };
 
 // Reads every byte of the newest commit of the index in a folder and checks it: that all counts, pointers, orders,
 // texts and checksums are in themselves and among each other as the format demands. What no structure tells, such
-// as a norm or a letter that became another, cannot be seen.
+// as a norm or a letter that became another, is seen where the commit has a manifest, and cannot be seen else.
 //
 // Nothing is created, locked or changed, and a writer may go on beside it: what is not part of the commit is
 // ignored, and where the files of a commit are gone because there is a newer one, that one is checked instead. Takes

@@ -12,7 +12,9 @@ enum class RepairOutcome {
 };
 
 // Has the index library's checker look at the newest commit of the index in a folder, and drop the segments that it
-// finds bad: all of their documents are lost. The old commit and the files of those segments stay behind.
+// finds bad: all of their documents are lost. The old commit and the files of those segments stay behind. Where the
+// commit had a manifest, the new one has, with the digests that are known: what had decayed in a segment that the
+// checker keeps is found by a check as before.
 //
 // The checker crashes on some damages. Segments that CheckIndexHealth calls unsafe are therefore tried first, each by
 // the checker in a child process with limits on memory and time. One that the child does not survive counts as bad;

@@ -1,0 +1,49 @@
+#pragma once
+
+#include <cstddef>
+#include <cstdint>
+#include <memory>
+#include <span>
+#include <string>
+#include <vector>
+
+#include "elastic/format/byte_source.h"
+
+struct XXH3_state_s;
+
+namespace vantrel::elastic::format {
+
+// A file is digested in blocks of this size, the last one being what is left: so a difference is known by its place,
+// and parts of a file can be digested apart. A file without bytes has no block.
+inline constexpr uint64_t kDigestBlock = uint64_t{1} << 20;
+
+constexpr uint64_t CountDigestBlocks(uint64_t file_size) {
+  return file_size / kDigestBlock + (file_size % kDigestBlock == 0 ? 0 : 1);
+}
+
+// The digest of one block that comes in pieces: XXH3 of 64 bits, without a seed. It tells decay, not malice. For one
+// thread at a time.
+class BlockDigest {
+ public:
+  // Throws std::bad_alloc.
+  BlockDigest();
+
+  void Add(std::span<const uint8_t> piece);
+
+  // Of all pieces so far.
+  uint64_t value() const;
+
+  static uint64_t Of(std::span<const uint8_t> block);
+
+ private:
+  std::unique_ptr<XXH3_state_s, void (*)(XXH3_state_s*)> state_;
+};
+
+// A digest in hexadecimal digits, always as many.
+inline constexpr size_t kDigestDigits = 16;
+std::string DigestText(uint64_t digest);
+
+// The digests of a whole file. Throws what reading throws.
+std::vector<uint64_t> DigestBlocks(const ByteSource& file);
+
+}  // namespace vantrel::elastic::format

@@ -1,0 +1,177 @@
+#include "elastic/format/manifest.h"
+
+#include <algorithm>
+#include <charconv>
+#include <set>
+#include <span>
+#include <utility>
+
+#include "elastic/format/block_digest.h"
+#include "elastic/format/file_names.h"
+#include "elastic/format/whole_segment.h"
+#include "vantrel/elastic/index_error.h"
+
+namespace vantrel::elastic::format {
+namespace {
+
+// Room for the digests of some ten terabytes.
+constexpr uint64_t kLargestManifest = uint64_t{256} << 20;
+
+constexpr std::string_view kTitle = "quorelastic manifest ";
+constexpr std::string_view kVersion = "1";
+
+std::string LastLine(std::string_view before) {
+  const auto* bytes = reinterpret_cast<const uint8_t*>(before.data());
+  return "digest " + DigestText(BlockDigest::Of(std::span(bytes, before.size()))) + "\n";
+}
+
+// Takes the text of a manifest apart, from its start on.
+class Lines {
+ public:
+  Lines(const std::string& path, std::string_view text) : path_(path), text_(text) {}
+
+  bool at_end() const { return at_ == text_.size(); }
+
+  void Expect(std::string_view word) {
+    if (!text_.substr(at_).starts_with(word)) Refuse("\"" + std::string(word) + "\" is missing");
+    at_ += word.size();
+  }
+  bool Passes(char separator) {
+    if (at_ == text_.size() || text_[at_] != separator) return false;
+    ++at_;
+    return true;
+  }
+  std::string_view Word() {
+    const size_t end = std::min(text_.find_first_of(" \n", at_), text_.size());
+    if (end == at_) Refuse("a word is missing");
+    return text_.substr(std::exchange(at_, end), end - at_);
+  }
+  template <typename Number>
+  Number TakeNumber(int base = 10) {
+    const size_t start = at_;
+    const std::string_view word = Word();
+    Number number = 0;
+    const auto [end, error] = std::from_chars(word.data(), word.data() + word.size(), number, base);
+    if (error == std::errc() && end == word.data() + word.size() &&
+        (base == 10 || word.size() == kDigestDigits)) {
+      return number;
+    }
+    at_ = start;
+    Refuse("no number where one must be");
+  }
+  [[noreturn]] void Refuse(const std::string& problem) const { throw IndexDamagedError(path_, at_, problem); }
+
+ private:
+  const std::string& path_;
+  std::string_view text_;
+  size_t at_ = 0;
+};
+
+Manifest::File ReadFileLine(Lines& lines) {
+  Manifest::File file;
+  lines.Expect("file ");
+  file.name = lines.Word();
+  lines.Expect(" ");
+  file.size = lines.TakeNumber<uint64_t>();
+  while (lines.Passes(' ')) file.digests.push_back(lines.TakeNumber<uint64_t>(16));
+  if (file.digests.size() != CountDigestBlocks(file.size)) lines.Refuse("digests and size do not agree");
+  lines.Expect("\n");
+  return file;
+}
+
+std::string ReadText(const ByteSource& source) {
+  if (source.size() > kLargestManifest) {
+    throw IndexError(source.name(),
+                     "of " + std::to_string(source.size()) + " bytes, too large for a manifest");
+  }
+  std::string text(source.size(), '\0');
+  source.ReadAt(0, std::span(reinterpret_cast<uint8_t*>(text.data()), text.size()));
+  return text;
+}
+
+// Opens files for somebody else and takes down their names.
+class RecordingFolder : public Folder {
+ public:
+  explicit RecordingFolder(const Folder& folder) : folder_(folder) {}
+
+  const std::string& path() const override { return folder_.path(); }
+  std::vector<std::string> List() const override { return folder_.List(); }
+  bool Exists(const std::string& name) const override { return folder_.Exists(name); }
+  std::shared_ptr<const ByteSource> Open(const std::string& name) const override {
+    auto source = folder_.Open(name);
+    names_.insert(name);
+    return source;
+  }
+
+  const std::set<std::string>& names() const { return names_; }
+
+ private:
+  const Folder& folder_;
+  mutable std::set<std::string> names_;
+};
+
+}  // namespace
+
+const Manifest::File* Manifest::Find(std::string_view name) const {
+  const auto found =
+      std::lower_bound(files.begin(), files.end(), name,
+                       [](const File& file, std::string_view wanted) { return file.name < wanted; });
+  return found != files.end() && found->name == name ? &*found : nullptr;
+}
+
+bool Manifest::BelongsTo(const Folder& folder, const Commit& commit) const {
+  if (generation != commit.generation) return false;
+  const File* file = Find(CommitFileName(generation));
+  return file != nullptr && *file == DigestFile(folder, file->name);
+}
+
+std::string WriteManifest(const Manifest& manifest) {
+  std::string text(kTitle);
+  text.append(kVersion).append("\ncommit ").append(std::to_string(manifest.generation)).append("\n");
+  for (const Manifest::File& file : manifest.files) {
+    text.append("file ").append(file.name).append(" ").append(std::to_string(file.size));
+    for (const uint64_t digest : file.digests) text.append(" ").append(DigestText(digest));
+    text.append("\n");
+  }
+  return text.append(LastLine(text));
+}
+
+std::optional<Manifest> ReadManifest(const ByteSource& source) {
+  const std::string text = ReadText(source);
+  const size_t last_line = text.size() - std::min(text.size(), LastLine("").size());
+  const std::string_view body = std::string_view(text).substr(0, last_line);
+  if (!text.starts_with(kTitle) || text.substr(last_line) != LastLine(body)) {
+    throw IndexDamagedError(source.name(), last_line,
+                            "the manifest is not what was written: its digest differs");
+  }
+  Lines lines(source.name(), body);
+  lines.Expect(kTitle);
+  if (lines.Word() != kVersion) return std::nullopt;
+  Manifest manifest;
+  lines.Expect("\ncommit ");
+  manifest.generation = lines.TakeNumber<int64_t>();
+  lines.Expect("\n");
+  while (!lines.at_end()) {
+    manifest.files.push_back(ReadFileLine(lines));
+    const size_t count = manifest.files.size();
+    if (count > 1 && manifest.files[count - 2].name >= manifest.files[count - 1].name) {
+      lines.Refuse("files out of order");
+    }
+  }
+  return manifest;
+}
+
+Manifest::File DigestFile(const Folder& folder, const std::string& name) {
+  const auto source = folder.Open(name);
+  return {.name = name, .size = source->size(), .digests = DigestBlocks(*source)};
+}
+
+std::vector<std::string> FilesOf(const Folder& folder, const Commit& commit) {
+  const RecordingFolder recording(folder);
+  for (const SegmentInfo& segment : commit.segments) WholeSegment(recording, segment);
+  std::set<std::string> names = recording.names();
+  names.insert(CommitFileName(commit.generation));
+  return {names.begin(), names.end()};
+}
+
+}  // namespace vantrel::elastic::format

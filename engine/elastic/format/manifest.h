@@ -1,0 +1,65 @@
+#pragma once
+
+#include <cstdint>
+#include <memory>
+#include <optional>
+#include <string>
+#include <string_view>
+#include <vector>
+
+#include "elastic/format/byte_source.h"
+#include "elastic/format/commit.h"
+#include "elastic/format/folder.h"
+
+namespace vantrel::elastic::format {
+
+// What the files of a commit are to hold. No structure tells that a norm or a letter became another; this does.
+//
+// It stands beside the index as text, a line ending with a line feed each:
+//
+//   quorelastic manifest 1                the version of the layout
+//   commit GENERATION                     in base 10
+//   file NAME SIZE DIGEST DIGEST ...      for each file of the commit: its bytes in base 10, and for each of its
+//                                         blocks (block_digest.h) 16 hexadecimal digits; sorted by NAME
+//   digest DIGEST                         of all bytes before this line, as one block; so in every version
+//
+// The file of the commit itself is among them: a manifest belongs to a commit only if that digest is its own.
+struct Manifest {
+  struct File {
+    std::string name;
+    uint64_t size = 0;
+    std::vector<uint64_t> digests = {};
+
+    bool operator==(const File&) const = default;
+  };
+
+  int64_t generation = 0;
+  std::vector<File> files;  // sorted by name
+
+  // Nothing where the commit has no such file.
+  const File* Find(std::string_view name) const;
+
+  // Whether this is the manifest of that very commit, whose file is in the folder. Throws IndexError where the file
+  // cannot be read.
+  bool BelongsTo(const Folder& folder, const Commit& commit) const;
+
+  bool operator==(const Manifest&) const = default;
+};
+
+// A name that no file of the index library bears.
+inline constexpr const char* kManifestName = "quorelastic.manifest";
+
+std::string WriteManifest(const Manifest& manifest);
+
+// Decodes a manifest; nothing where it is whole, but of another version. Throws IndexDamagedError, IndexIoError, and
+// IndexError for a file larger than any manifest.
+std::optional<Manifest> ReadManifest(const ByteSource& source);
+
+// A file's size and digests. Throws IndexError where it cannot be read.
+Manifest::File DigestFile(const Folder& folder, const std::string& name);
+
+// The names of the files that make up a commit, those of its segments and its own, as far as they are in the folder;
+// sorted. Throws IndexIoError where the system fails.
+std::vector<std::string> FilesOf(const Folder& folder, const Commit& commit);
+
+}  // namespace vantrel::elastic::format

@@ -1,0 +1,136 @@
+#include "elastic/health/digest_check.h"
+
+#include <algorithm>
+#include <limits>
+#include <utility>
+
+#include "elastic/health/mismatch.h"
+
+namespace vantrel::elastic::health {
+namespace {
+
+using format::BlockDigest;
+using format::kDigestBlock;
+
+constexpr uint32_t kUnderWay = std::numeric_limits<uint32_t>::max();
+
+// Small enough to stay in the processor's cache between being read and being digested.
+constexpr size_t kPiece = size_t{256} << 10;
+
+// Hands what is read on to the check.
+class CheckedSource : public format::ByteSource {
+ public:
+  CheckedSource(std::shared_ptr<const format::ByteSource> source, std::shared_ptr<FileDigestCheck> check)
+      : source_(std::move(source)), check_(std::move(check)) {}
+
+  const std::string& name() const override { return source_->name(); }
+  uint64_t size() const override { return source_->size(); }
+  void ReadAt(uint64_t offset, std::span<uint8_t> out) const override {
+    source_->ReadAt(offset, out);
+    check_->Take(offset, out);
+  }
+
+ private:
+  std::shared_ptr<const format::ByteSource> source_;
+  std::shared_ptr<FileDigestCheck> check_;
+};
+
+}  // namespace
+
+FileDigestCheck::FileDigestCheck(std::shared_ptr<const format::ByteSource> source,
+                                 const format::Manifest::File& expected)
+    : source_(std::move(source)), expected_(expected), done_(expected.digests.size()) {}
+
+uint64_t FileDigestCheck::LengthOf(uint64_t block) const {
+  return std::min(kDigestBlock, expected_.size - block * kDigestBlock);
+}
+
+void FileDigestCheck::Take(uint64_t offset, std::span<const uint8_t> bytes) {
+  if (source_->size() != expected_.size) return;
+  while (!bytes.empty()) {
+    const uint64_t block = offset / kDigestBlock;
+    const uint64_t from = offset % kDigestBlock;
+    const auto piece = bytes.first(std::min<uint64_t>(bytes.size(), kDigestBlock - from));
+    const uint64_t to = from + piece.size();
+    if (auto [digest, done] = Claim(block, from, to); digest != nullptr) {
+      digest->Add(piece.subspan(done - from));
+      Return(block, to, std::move(digest));
+    }
+    offset += piece.size();
+    bytes = bytes.subspan(piece.size());
+  }
+}
+
+// The digest of a block, if that can go on somewhere from `from` up to `to`, and up to where it is done.
+std::pair<FileDigestCheck::DigestPtr, uint64_t> FileDigestCheck::Claim(uint64_t block, uint64_t from,
+                                                                       uint64_t to) {
+  const std::lock_guard lock(mutex_);
+  const uint64_t done = done_[block];
+  if (done < from || done >= to) return {nullptr, 0};
+  DigestPtr digest = done == 0 ? std::make_unique<BlockDigest>() : std::move(begun_.extract(block).mapped());
+  done_[block] = kUnderWay;
+  return {std::move(digest), done};
+}
+
+void FileDigestCheck::Return(uint64_t block, uint64_t to, DigestPtr digest) {
+  const std::lock_guard lock(mutex_);
+  done_[block] = static_cast<uint32_t>(to);
+  if (to < LengthOf(block)) {
+    begun_[block] = std::move(digest);
+    return;
+  }
+  const uint64_t found = digest->value();
+  if (found == expected_.digests[block]) return;
+  if (differing_++ > 0 && first_differing_ < block) return;
+  first_differing_ = block;
+  found_ = found;
+}
+
+void FileDigestCheck::FinishBlock(uint64_t block, std::vector<uint8_t>& buffer) {
+  const uint64_t length = LengthOf(block);
+  for (uint64_t at = done_[block]; at < length;) {
+    const std::span<uint8_t> piece(buffer.data(), std::min<uint64_t>(buffer.size(), length - at));
+    const uint64_t offset = block * kDigestBlock + at;
+    source_->ReadAt(offset, piece);
+    Take(offset, piece);
+    at += piece.size();
+  }
+}
+
+void FileDigestCheck::Finish() {
+  const std::string& file = source_->name();
+  RequireEqual(Grade::kDamaged, file, 0, "the size in the manifest,", expected_.size, source_->size());
+  std::vector<uint8_t> buffer(std::min<uint64_t>(kPiece, expected_.size));
+  for (uint64_t block = 0; block < done_.size(); ++block) FinishBlock(block, buffer);
+  if (differing_ == 0) return;
+  std::string found = "digest " + format::DigestText(found_);
+  if (differing_ > 1)
+    found.append(", and ").append(std::to_string(differing_ - 1)).append(" more that differ");
+  Refuse(Grade::kDamaged, file, first_differing_ * kDigestBlock,
+         "a block of " + std::to_string(LengthOf(first_differing_)) +
+             " bytes with the digest in the manifest, " +
+             format::DigestText(expected_.digests[first_differing_]),
+         found);
+}
+
+std::shared_ptr<const format::ByteSource> DigestCheckedFolder::Open(const std::string& name) const {
+  auto source = folder_.Open(name);
+  const format::Manifest::File* expected = manifest_.Find(name);
+  if (expected == nullptr) return source;
+  const std::lock_guard lock(mutex_);
+  const auto [entry, is_new] = checks_.try_emplace(name);
+  if (is_new) entry->second = std::make_shared<FileDigestCheck>(source, *expected);
+  if (entry->second == nullptr) return source;
+  return std::make_shared<CheckedSource>(std::move(source), entry->second);
+}
+
+std::vector<std::shared_ptr<FileDigestCheck>> DigestCheckedFolder::TakeOpened() const {
+  const std::lock_guard lock(mutex_);
+  std::vector<std::shared_ptr<FileDigestCheck>> opened;
+  for (auto& [name, check] : checks_) {
+    if (check != nullptr) opened.push_back(std::exchange(check, nullptr));
+  }
+  return opened;
+}
+
+}  // namespace vantrel::elastic::health

@@ -1,0 +1,32 @@
+#pragma once
+
+#include <optional>
+#include <string>
+
+#include "elastic/format/manifest.h"
+
+namespace vantrel::elastic {
+
+// Keeps the manifest beside an index in step with its commits. For who holds the index's write lock, and one thread
+// at a time.
+class ManifestKeeper {
+ public:
+  // Takes over the manifest of the newest commit, if there is one: files that it names are not digested again, as
+  // the files of an index are written once. So what decays in them meanwhile stays known.
+  explicit ManifestKeeper(std::string folder);
+
+  // Whether the newest commit had a manifest when this was made, or was given one since.
+  bool has_manifest() const { return manifest_.has_value(); }
+
+  // Gives the newest commit a manifest. Where the system does not let it, the commit stands without one, and a check
+  // sees less; what manifest is left then belongs to an earlier commit.
+  void Update();
+
+ private:
+  void Write();
+
+  std::string folder_;
+  std::optional<format::Manifest> manifest_;
+};
+
+}  // namespace vantrel::elastic
