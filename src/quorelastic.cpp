@@ -331,8 +331,8 @@ void Repair(const std::string& db_path) {
   static_assert(__LINE__ == 331, "the system log names the line of the check below");
   FailIf(db_path.empty(), kInvalid, "db_path is required.");
 
-  const auto outcome = vantrel::elastic::RepairIndex(db_path);
-  std::cerr << (outcome == vantrel::elastic::RepairOutcome::kClean ? "clean" : "done") << std::endl;
+  const bool was_clean = vantrel::elastic::RepairIndex(db_path).is_clean;
+  std::cerr << (was_clean ? "clean" : "done") << std::endl;
 }
 
 }  // namespace

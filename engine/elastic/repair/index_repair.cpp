@@ -4,11 +4,16 @@
 
 // Not without the library's main header.
 #include <lucene++/CheckIndex.h>
+#include <lucene++/SegmentInfo.h>
+#include <lucene++/SegmentInfos.h>
 
 #include <sys/stat.h>
 
+#include <algorithm>
 #include <optional>
 #include <set>
+#include <string>
+#include <utility>
 
 #include "elastic/format/commit.h"
 #include "elastic/format/folder.h"
@@ -25,6 +30,9 @@
 namespace vantrel::elastic {
 namespace {
 
+// How often a plan starts anew because there is a newer commit.
+constexpr int kMostTries = 10;
+
 void CheckPath(const std::string& path) {
   std::wstring wide;
   if (const char* problem = ToIndexText(path, wide)) {
@@ -33,8 +41,11 @@ void CheckPath(const std::string& path) {
 }
 
 // Throws where there is no commit to start from.
-void CheckCommit(const std::string& path) {
-  format::UseNewestCommit(format::DiskFolder(path), [](const format::Commit&) {});
+format::Commit ReadNewestCommit(const std::string& path) {
+  format::Commit newest;
+  format::UseNewestCommit(format::DiskFolder(path),
+                          [&](format::Commit commit) { newest = std::move(commit); });
+  return newest;
 }
 
 // The lock, where it can be had without leaving a file: on an index that needs no repair, nothing is changed.
@@ -78,7 +89,10 @@ std::set<std::string> FindCondemned(const std::string& path) {
 class Checker {
  public:
   explicit Checker(const std::string& path)
-      : path_(path), directory_(Lucene::newLucene<CheckedDirectory>(path, FindCondemned(path))) {
+      : path_(path),
+        commit_(ReadNewestCommit(path)),
+        condemned_(FindCondemned(path)),
+        directory_(Lucene::newLucene<CheckedDirectory>(path, condemned_)) {
     RunReading(path_, directory_, "cannot check the index", [&] {
       checker_ = Lucene::newLucene<Lucene::CheckIndex>(directory_);
       status_ = checker_->checkIndex();
@@ -89,7 +103,24 @@ class Checker {
     }
   }
 
-  bool is_clean() const { return status_->clean; }
+  // Of the commit as it was before anything was looked at.
+  RepairReport Report() const {
+    RepairReport report;
+    report.generation = commit_.generation;
+    report.is_clean = status_->clean;
+    if (report.is_clean) return report;
+    std::set<std::string> kept;
+    for (int32_t number = 0; number < status_->newSegments->size(); ++number) {
+      kept.insert(Lucene::StringUtils::toUTF8(status_->newSegments->info(number)->name));
+    }
+    for (const format::SegmentInfo& segment : commit_.segments) {
+      if (kept.contains(segment.name)) continue;
+      report.losses.push_back({.segment = segment.name,
+                               .documents = CountLive(segment),
+                               .is_condemned = condemned_.contains(segment.name)});
+    }
+    return report;
+  }
 
   void Fix() {
     RunReading(path_, directory_, "cannot repair the index", [&] { checker_->fixIndex(status_); });
@@ -97,7 +128,14 @@ class Checker {
   }
 
  private:
+  // As far as the commit tells.
+  static uint64_t CountLive(const format::SegmentInfo& segment) {
+    return static_cast<uint64_t>(std::max(segment.document_count - std::max(segment.deleted_count, 0), 0));
+  }
+
   std::string path_;
+  format::Commit commit_;
+  std::set<std::string> condemned_;
   boost::shared_ptr<CheckedDirectory> directory_;
   Lucene::CheckIndexPtr checker_;
   Lucene::IndexStatusPtr status_;
@@ -105,22 +143,35 @@ class Checker {
 
 }  // namespace
 
-RepairOutcome RepairIndex(const std::string& path) {
+RepairReport RepairIndex(const std::string& path) {
   PrepareIndexLibrary();
   CheckPath(path);
-  CheckCommit(path);
+  ReadNewestCommit(path);
   std::optional<WriteLock> lock = TakeLockThatIsThere(path);
   if (!lock.has_value()) {
-    if (Checker(path).is_clean()) return RepairOutcome::kClean;
+    const RepairReport report = Checker(path).Report();
+    if (report.is_clean) return report;
     lock.emplace(path);
   }
   // With the lock: what was seen without may have been of a writer at work.
   Checker checker(path);
-  if (checker.is_clean()) return RepairOutcome::kClean;
+  RepairReport report = checker.Report();
+  if (report.is_clean) return report;
   ManifestKeeper manifest(path);
   checker.Fix();
   if (manifest.has_manifest()) manifest.Update();
-  return RepairOutcome::kRepaired;
+  return report;
+}
+
+RepairReport PlanRepair(const std::string& path) {
+  PrepareIndexLibrary();
+  CheckPath(path);
+  for (int tries = 0; tries < kMostTries; ++tries) {
+    RepairReport report = Checker(path).Report();
+    // A writer takes away the files of the commit before.
+    if (report.is_clean || ReadNewestCommit(path).generation == report.generation) return report;
+  }
+  throw IndexError(path, "the index changes faster than it can be looked at");
 }
 
 }  // namespace vantrel::elastic

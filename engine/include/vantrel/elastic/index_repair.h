@@ -1,14 +1,26 @@
 #pragma once
 
+#include <cstdint>
 #include <string>
+#include <vector>
 
 #include "vantrel/elastic/export.h"
 
 namespace vantrel::elastic {
 
-enum class RepairOutcome {
-  kClean,    // the index library's checker found nothing wrong, and nothing was done
-  kRepaired  // there is a new commit without the segments that cannot be read
+// What a repair has dropped, or would.
+struct RepairReport {
+  struct Loss {
+    std::string segment;        // such as "_3"
+    uint64_t documents = 0;     // in it that were not deleted
+    bool is_condemned = false;  // the checker did not survive looking at it
+
+    bool operator==(const Loss&) const = default;
+  };
+
+  int64_t generation = -1;   // of the commit that was looked at
+  bool is_clean = true;      // the index library's checker found nothing wrong
+  std::vector<Loss> losses;  // in the order of the commit
 };
 
 // Has the index library's checker look at the newest commit of the index in a folder, and drop the segments that it
@@ -23,6 +35,10 @@ enum class RepairOutcome {
 // Takes the index's write lock before it changes anything. To be called where the process has no other thread: it
 // forks. Throws IndexLockedError where somebody has the index open for writing; IndexError and its kinds where there is
 // no commit that can be read, or the system fails. Then nothing was changed.
-VANTREL_ELASTIC_EXPORT RepairOutcome RepairIndex(const std::string& path);
+VANTREL_ELASTIC_EXPORT RepairReport RepairIndex(const std::string& path);
+
+// What RepairIndex would drop. Nothing is created, locked or changed, and a writer may go on beside it. Forks and throws
+// as RepairIndex does; IndexError also where the index changes faster than it can be looked at.
+VANTREL_ELASTIC_EXPORT RepairReport PlanRepair(const std::string& path);
 
 }  // namespace vantrel::elastic
