@@ -13,10 +13,12 @@
 #include <optional>
 #include <string>
 
+#include "base/limits.h"
 #include "commands/command_service.h"
 #include "commands/daemon.h"
 #include "data_root/data_root.h"
 #include "data_root/index_registry.h"
+#include "health/repair_worker.h"
 #include "logging.h"
 #include "options.h"
 #include "server/listener.h"
@@ -78,8 +80,10 @@ int Serve(const Options& options) {
   boost::asio::thread_pool slow_threads(threads);
   IndexRegistry registry(root, slow_threads.get_executor());
   Statistics statistics;
+  Turns health_turns(kMostHealthRuns);
   const Daemon daemon(registry, statistics,
-                      {plugins, quick_searches, search_threads.get_executor(), SearchTimeLimit(options)});
+                      {plugins, quick_searches, search_threads.get_executor(), SearchTimeLimit(options)},
+                      health_turns);
   CommandService service(daemon);
   Server server(listener.Release(), service, LimitsOf(options), statistics.connections);
   ShutdownWatch watch(std::chrono::seconds(options.shutdown_timeout) + kGrace);
@@ -99,6 +103,7 @@ int Serve(const Options& options) {
 }  // namespace
 
 int main(int argc, char** argv) {
+  if (const std::optional<int> status = RunAsRepairWorker(argc, argv)) return *status;
   std::optional<Options> options;
   try {
     std::string text;

@@ -19,6 +19,7 @@ inline constexpr int64_t kLongestDocumentId = 65536;    // bytes
 inline constexpr int64_t kLongestFileName = 4096;       // bytes
 inline constexpr int64_t kLongestAnalyzedText = 65536;  // bytes
 inline constexpr int64_t kMostTerms = 1000000000;       // of one terms
+inline constexpr int64_t kMostHealthRuns = 2;           // checks and repairs at a time
 inline constexpr size_t kLongestImportLine = quordaemon::kLongestMessage;
 
 inline constexpr size_t kFailuresReported = 10;  // of one document_bulk; the rest is only counted

@@ -11,7 +11,7 @@ const std::vector<Command>& CommandTable() {
       IndexCreateCommand(),    IndexListCommand(), IndexDeleteCommand(), DocumentBulkCommand(),
       DocumentDeleteCommand(), CommitCommand(),    OptimizeCommand(),    SearchCommand(),
       SuggestCommand(),        AnalyzeCommand(),   TermsCommand(),       PluginListCommand(),
-      StatusCommand(),         HelpCommand(),
+      StatusCommand(),         CheckCommand(),     RepairCommand(),      HelpCommand(),
   };
   return table;
 }

@@ -18,6 +18,8 @@ Command AnalyzeCommand();
 Command TermsCommand();
 Command PluginListCommand();
 Command StatusCommand();
+Command CheckCommand();
+Command RepairCommand();
 Command HelpCommand();
 
 }  // namespace quorelasticd

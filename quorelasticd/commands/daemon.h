@@ -36,17 +36,22 @@ struct Searching {
 class Daemon {
  public:
   // What is referred to must outlive it.
-  Daemon(IndexRegistry& registry, Statistics& statistics, Searching searching)
-      : registry_(registry), statistics_(statistics), searching_(std::move(searching)) {}
+  Daemon(IndexRegistry& registry, Statistics& statistics, Searching searching, Turns& health_turns)
+      : registry_(registry),
+        statistics_(statistics),
+        searching_(std::move(searching)),
+        health_turns_(health_turns) {}
 
   IndexRegistry& registry() const { return registry_; }
   Statistics& statistics() const { return statistics_; }
   const Searching& searching() const { return searching_; }
+  Turns& health_turns() const { return health_turns_; }  // for checks and repairs
 
  private:
   IndexRegistry& registry_;
   Statistics& statistics_;
   Searching searching_;
+  Turns& health_turns_;
 };
 
 }  // namespace quorelasticd

@@ -27,8 +27,9 @@ RequestError NotFound(const std::string& name) {
 class IndexRegistry::Reservation {
  public:
   // The registry's mutex is held.
-  Reservation(IndexRegistry& registry, const std::string& name) : registry_(registry), name_(name) {
-    registry_.reserved_.insert(name_);
+  Reservation(IndexRegistry& registry, const std::string& name, Reason reason)
+      : registry_(registry), name_(name) {
+    registry_.reserved_.emplace(name_, reason);
   }
   Reservation(const Reservation&) = delete;
   Reservation& operator=(const Reservation&) = delete;
@@ -48,8 +49,7 @@ IndexRegistry::IndexRegistry(const DataRoot& root, boost::asio::any_io_executor 
 std::shared_ptr<OpenIndex> IndexRegistry::Use(const std::string& name) {
   const std::lock_guard lock(mutex_);
   if (const auto found = open_.find(name); found != open_.end()) return found->second;
-  // A name that none can bear is no path either.
-  if (!IsIndexName(name) || reserved_.contains(name) || !root_.HasIndex(name)) throw NotFound(name);
+  RequireUnreserved(name);
   auto index = vantrel::elastic::Index::Open(root_.IndexPath(name));
   const auto open =
       std::make_shared<OpenIndex>(name, std::move(index), boost::asio::make_strand(slow_executor_));
@@ -69,7 +69,7 @@ vantrel::elastic::IndexSettings IndexRegistry::Create(const std::string& name,
     if (root_.ListIndexes().size() + reserved_.size() >= kMostIndexes) {
       throw LimitExceeded("stored_indexes", kMostIndexes, "in the data folder");
     }
-    reservation = std::make_unique<Reservation>(*this, name);
+    reservation = std::make_unique<Reservation>(*this, name, Reason::kComingOrGoing);
   }
   const auto created = vantrel::elastic::Index::Create(root_.HiddenPath(name), settings)->settings();
   root_.ShowIndex(name);
@@ -77,21 +77,59 @@ vantrel::elastic::IndexSettings IndexRegistry::Create(const std::string& name,
   return created;
 }
 
+void IndexRegistry::RequireUnreserved(const std::string& name) const {
+  const auto reserved = reserved_.find(name);
+  if (reserved != reserved_.end() && reserved->second == Reason::kRepair) {
+    throw RequestError(ErrorCode::kLocked, "index " + Quoted(name) + " is being repaired");
+  }
+  // A name that none can bear is no path either.
+  if (!IsIndexName(name) || reserved != reserved_.end() || !root_.HasIndex(name)) throw NotFound(name);
+}
+
+// The index, where it is open, which is then no longer.
+std::shared_ptr<OpenIndex> IndexRegistry::TakeUnused(const std::string& name) {
+  const auto found = open_.find(name);
+  if (found == open_.end()) return nullptr;
+  if (found->second.use_count() > 1) {
+    throw RequestError(ErrorCode::kLocked, "index " + Quoted(name) + " is in use by requests still running");
+  }
+  std::shared_ptr<OpenIndex> taken = std::move(found->second);
+  open_.erase(found);
+  return taken;
+}
+
+std::string IndexRegistry::PathOf(const std::string& name) const {
+  if (!IsIndexName(name) || !root_.HasIndex(name)) throw NotFound(name);
+  return root_.IndexPath(name);
+}
+
+std::shared_ptr<void> IndexRegistry::Close(const std::string& name) {
+  std::shared_ptr<Reservation> reservation;
+  std::shared_ptr<OpenIndex> closing;
+  {
+    const std::lock_guard lock(mutex_);
+    RequireUnreserved(name);
+    closing = TakeUnused(name);
+    reservation = std::make_shared<Reservation>(*this, name, Reason::kRepair);
+  }
+  if (closing != nullptr) {
+    try {
+      Changes(closing).Commit();
+    } catch (...) {
+      spdlog::warn("index {}: cannot commit before its repair: {}", name, ToRequestError().reason());
+    }
+  }
+  return reservation;
+}
+
 void IndexRegistry::Delete(const std::string& name) {
   std::unique_ptr<Reservation> reservation;
   std::shared_ptr<OpenIndex> closing;
   {
     const std::lock_guard lock(mutex_);
-    if (!IsIndexName(name) || reserved_.contains(name) || !root_.HasIndex(name)) throw NotFound(name);
-    if (const auto found = open_.find(name); found != open_.end()) {
-      if (found->second.use_count() > 1) {
-        throw RequestError(ErrorCode::kLocked,
-                           "index " + Quoted(name) + " is in use by requests still running");
-      }
-      closing = std::move(found->second);
-      open_.erase(found);
-    }
-    reservation = std::make_unique<Reservation>(*this, name);
+    RequireUnreserved(name);
+    closing = TakeUnused(name);
+    reservation = std::make_unique<Reservation>(*this, name, Reason::kComingOrGoing);
   }
   closing.reset();  // which lets go of its write lock
   const vantrel::elastic::WriteLock nobody_else_writes(root_.IndexPath(name));

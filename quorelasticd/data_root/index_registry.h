@@ -4,7 +4,6 @@
 #include <map>
 #include <memory>
 #include <mutex>
-#include <set>
 #include <string>
 
 #include "data_root/data_root.h"
@@ -33,6 +32,14 @@ class IndexRegistry {
   vantrel::elastic::IndexSettings Create(const std::string& name,
                                          const vantrel::elastic::IndexSettings& settings);
 
+  // Where an index is, which may be in any state. It may be deleted any time.
+  std::string PathOf(const std::string& name) const;
+
+  // Commits an index, closes it, and keeps everybody from it as long as the result is held: they are told that it is
+  // being repaired. Where it is so damaged that it cannot commit, what was not committed is lost. Refused (locked)
+  // while anybody uses it.
+  std::shared_ptr<void> Close(const std::string& name);
+
   // Removes an index and all its files. Refused (locked) while anybody uses it, or writes to it.
   void Delete(const std::string& name);
 
@@ -42,14 +49,20 @@ class IndexRegistry {
   bool CommitAll();
 
  private:
-  // Keeps a name from everybody else while its index is made or removed.
+  enum class Reason { kComingOrGoing, kRepair };
+
+  // Keeps a name from everybody else.
   class Reservation;
+
+  // For what follows, the mutex is held.
+  void RequireUnreserved(const std::string& name) const;
+  std::shared_ptr<OpenIndex> TakeUnused(const std::string& name);
 
   const DataRoot& root_;
   boost::asio::any_io_executor slow_executor_;
   mutable std::mutex mutex_;
   std::map<std::string, std::shared_ptr<OpenIndex>> open_;
-  std::set<std::string> reserved_;
+  std::map<std::string, Reason> reserved_;
 };
 
 }  // namespace quorelasticd

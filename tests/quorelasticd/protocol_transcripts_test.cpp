@@ -120,6 +120,8 @@ class ProtocolTranscripts : public ::testing::Test {
     ASSERT_TRUE(client_->Send(request + "]"));
   }
 
+  std::string CompoundFile() const { return Path(FindFile(Path(""), ".cfs")); }
+
   // What lines that begin with # do.
   void Act(const std::string& what) {
     const std::map<std::string, std::function<void()>> actions = {
@@ -138,6 +140,20 @@ class ProtocolTranscripts : public ::testing::Test {
            }
            Start();
          }},
+        {"on the disk, a stored title of the index books becomes Nblomov",
+         [this] {
+           whole_file_ = ReadFile(CompoundFile());
+           std::string changed = whole_file_;
+           changed.at(changed.find("Oblomov")) = 'N';
+           WriteFile(CompoundFile(), changed);
+         }},
+        {"it is Oblomov again", [this] { WriteFile(CompoundFile(), whole_file_); }},
+        {"a file of the index books is cut off",
+         [this] {
+           whole_file_ = ReadFile(CompoundFile());
+           WriteFile(CompoundFile(), whole_file_.substr(0, whole_file_.size() / 2));
+         }},
+        {"that file is made whole again", [this] { WriteFile(CompoundFile(), whole_file_); }},
         {"the settings of the index notes are removed",
          [this] { fs::remove(daemon_->data() + "/notes/quorelastic.json"); }},
         {"the daemon is started with the plugin pause and a search timeout of 50 milliseconds",
@@ -195,6 +211,7 @@ class ProtocolTranscripts : public ::testing::Test {
   std::unique_ptr<DaemonProcess> daemon_;
   std::unique_ptr<DaemonClient> client_;
   std::optional<quorelasticd::FileLock> other_process_;
+  std::string whole_file_;  // before it was damaged
   bool is_ending_next_ = false;
   bool is_answered_ = true;
   std::set<std::string> codes_seen_;
