@@ -9,6 +9,7 @@
 #include "elastic/format/field_infos.h"
 #include "elastic/format/segment_files.h"
 #include "elastic/format/term_cursor.h"
+#include "elastic/suggest/deadline.h"
 #include "elastic/suggest/dictionary_part.h"
 #include "elastic/suggest/term_order.h"
 #include "elastic/terms/term_walk.h"
@@ -17,7 +18,8 @@ namespace vantrel::elastic {
 
 // The terms of one field of a segment that begin with certain bytes, in the dictionary's order. It begins near the
 // first of them, by the index over the dictionary, and ends near the last: what it takes does not hang on the other
-// terms. For one thread at a time. Everything may throw IndexError.
+// terms. For one thread at a time. Everything may throw IndexError and
+// SearchTimeoutError.
 //
 // It reads whole blocks of the dictionary, a block being what lies between two entries of the index, to the end of the
 // one that holds the last term. Every term and every entry that it passes must come after the one before it, and the
@@ -29,7 +31,8 @@ namespace vantrel::elastic {
 // - it moves the postings of all entries behind it alike; they are only read where documents are deleted.
 class PrefixWalk {
  public:
-  PrefixWalk(format::SegmentFiles files, const std::string& field, std::string prefix);
+  // The deadline must outlive it, and is looked at for each term and each posting that is read.
+  PrefixWalk(format::SegmentFiles files, const std::string& field, std::string prefix, Deadline& deadline);
   PrefixWalk(const PrefixWalk&) = delete;
   PrefixWalk& operator=(const PrefixWalk&) = delete;
 
@@ -59,6 +62,7 @@ class PrefixWalk {
   LiveTermFilter& live_filter();
 
   format::SegmentFiles files_;
+  Deadline& deadline_;
   std::vector<format::FieldInfo> fields_;
   TermOrder order_;
   AscendingTerms passed_;
