@@ -2,6 +2,7 @@
 find_package(PkgConfig REQUIRED)
 pkg_check_modules(LUCENE REQUIRED IMPORTED_TARGET GLOBAL liblucene++)
 pkg_check_modules(JSONCPP REQUIRED IMPORTED_TARGET GLOBAL jsoncpp)
+pkg_check_modules(ICU REQUIRED IMPORTED_TARGET GLOBAL icu-uc)
 find_package(ZLIB REQUIRED)
 find_package(Boost 1.74 REQUIRED COMPONENTS filesystem system thread)
 find_package(Threads REQUIRED)

@@ -84,6 +84,14 @@ TEST_F(PreProcessedIndexTest, PatternsAndRangesOverALoweredKeywordAreLoweredToo)
   EXPECT_THAT(Find("f:[B TO C]"), ElementsAre("1"));
 }
 
+TEST_F(PreProcessedIndexTest, LettersThatUnicodeGotLaterAreFoundInAnyCaseByWordsAndPatterns) {
+  Make(Field(FieldType::kKeyword, kLower), {"\xe1\xb2\x90\xe1\xb2\x91", "\xf0\x9e\xa4\x80\xf0\x9e\xa4\x81"});
+  EXPECT_THAT(Find("f:\xe1\xb2\x90\xe1\xb2\x91"), ElementsAre("0"));
+  EXPECT_THAT(Find("f:\xe1\x83\x90\xe1\x83\x91"), ElementsAre("0"));
+  EXPECT_THAT(Find("f:\xe1\xb2\x90*"), ElementsAre("0"));
+  EXPECT_THAT(Find("f:\xf0\x9e\xa4\x80*"), ElementsAre("1"));
+}
+
 TEST_F(PreProcessedIndexTest, GramsOfAKeywordFindAnyPartOfIt) {
   Make(Field(FieldType::kKeyword, kLowerBigrams), {"Quorelastic", "elation", "tic elas"});
   EXPECT_THAT(Find("f:ELAS"), ElementsAre("0", "2"));
