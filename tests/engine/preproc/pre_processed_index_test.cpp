@@ -258,6 +258,20 @@ TEST_F(PreProcessedIndexTest, ChainsThatCannotBeBuiltAreRefusedBeforeAnythingIsM
   EXPECT_THAT(ListFolder(folder_.path()), IsEmpty());
 }
 
+TEST_F(PreProcessedIndexTest, GramsInAFieldWithoutFrequenciesAreRefused) {
+  for (const auto& steps : {kBigrams, kLowerBigrams}) {
+    FieldSettings field = Field(FieldType::kText, steps);
+    field.frequencies = false;
+    ExpectIndexError("field \"f\": \"ngram\" needs frequencies: a word is found as a phrase of its grams",
+                     [&] { Index::Create(folder_ / "index", {.fields = {field}}); });
+  }
+  EXPECT_THAT(ListFolder(folder_.path()), IsEmpty());
+  FieldSettings lower = Field(FieldType::kText, kLower);
+  lower.frequencies = false;
+  Make(lower, {"Alpha"});
+  EXPECT_THAT(Find("f:ALPHA"), ElementsAre("0")) << "other steps need none";
+}
+
 TEST_F(PreProcessedIndexTest, TheIdIsTakenAsItIs) {
   FieldSettings id = Field(FieldType::kKeyword, kLower);
   id.name = "id";
