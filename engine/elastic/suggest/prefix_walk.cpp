@@ -13,6 +13,9 @@ PrefixWalk::PrefixWalk(format::SegmentFiles files, const std::string& field, std
       passed_(order_),
       cursor_(OpenCursor(files_.terms, format::TermCursor::File::kDictionary)) {
   if (order_.has_field()) SeekByIndex();
+  // Others want descriptors, too.
+  files_.field_infos.reset();
+  files_.terms_index.reset();
 }
 
 format::TermCursor PrefixWalk::OpenCursor(const std::shared_ptr<const format::ByteSource>& source,

@@ -29,6 +29,7 @@ namespace vantrel::elastic {
 // - it makes an entry of the index, further ahead, share more of its text with the one before it, and that leaves
 //   all entries in order, or
 // - it moves the postings of all entries behind it alike; they are only read where documents are deleted.
+// Of the segment's files it holds the dictionary open and, where documents are deleted, what tells of them.
 class PrefixWalk {
  public:
   // The deadline must outlive it, and is looked at for each term and each posting that is read.
