@@ -360,6 +360,11 @@ TEST_F(SearchCommandTest, QueriesGoThroughTheSamePreProcessorsAsValues) {
                 R"({"command":"index_create","data":{"id":"x","settings":{"fields":[
                   {"name":"name","type":"text","pre_processors":[{"name":"ngram","argument":"0"}]}]}}})"),
             "bad_request");
+  const Json::Value reply = client_.Ask(
+      R"({"command":"index_create","data":{"id":"x","settings":{"fields":[{"name":"name","type":"text",
+          "frequencies":false,"pre_processors":[{"name":"ngram","argument":"2"}]}]}}})");
+  EXPECT_EQ(reply["error"]["code"].asString(), "bad_request");
+  EXPECT_THAT(reply["error"]["reason"].asString(), HasSubstr("\"ngram\" needs frequencies"));
 }
 
 TEST_F(SearchCommandTest, ADocumentStaysWhenItsReplacementIsRefused) {

@@ -18,12 +18,16 @@ struct ControlGroupLayout {
   const char* mount;
   const char* limit_file;
   const char* usage_file;
-  const char* cache_statistic;  // in memory.stat: the part of the usage that is page cache
+  // In memory.stat: the part of the usage that is page cache, and the part of that which is shared memory or files
+  // of a memory file system. No disk holds these: the kernel cannot throw them out.
+  const char* cache_statistic;
+  const char* shared_statistic;
 };
 
 constexpr ControlGroupLayout kLayouts[] = {
-    {"::", "/sys/fs/cgroup", "/memory.max", "/memory.current", "file"},
-    {":memory:", "/sys/fs/cgroup/memory", "/memory.limit_in_bytes", "/memory.usage_in_bytes", "total_cache"}};
+    {"::", "/sys/fs/cgroup", "/memory.max", "/memory.current", "file", "shmem"},
+    {":memory:", "/sys/fs/cgroup/memory", "/memory.limit_in_bytes", "/memory.usage_in_bytes", "total_cache",
+     "total_shmem"}};
 
 std::optional<uint64_t> ParseNumber(std::string_view text) {
   text.remove_prefix(std::min(text.find_first_not_of(" \t"), text.size()));
@@ -56,7 +60,9 @@ uint64_t AvailableInGroup(const std::string& folder, const ControlGroupLayout& l
   const auto usage = ReadNumber(folder + layout.usage_file);
   if (!limit.has_value() || !usage.has_value()) return kUnlimited;
   const uint64_t cache = ReadStatistic(folder + "/memory.stat", layout.cache_statistic).value_or(0);
-  const uint64_t in_use = *usage - std::min(cache, *usage);
+  const uint64_t shared = ReadStatistic(folder + "/memory.stat", layout.shared_statistic).value_or(0);
+  const uint64_t can_go = cache - std::min(shared, cache);
+  const uint64_t in_use = *usage - std::min(can_go, *usage);
   return *limit - std::min(in_use, *limit);
 }
 
@@ -71,6 +77,7 @@ uint64_t AvailableInGroups(const std::string& mount, std::string group, const Co
   }
 }
 
+// The kernel's estimate leaves out shared memory by itself.
 uint64_t AvailableOnMachine(const std::string& system_root) {
   constexpr uint64_t kKibibyte = 1024;
   const auto available = ReadStatistic(system_root + "/proc/meminfo", "MemAvailable:");

@@ -98,6 +98,7 @@ void TermCursor::Resume(const TermPlace& place, uint64_t walked) {
 void TermCursor::ReadUtf8Text() {
   const uint32_t prefix = reader_.ReadVInt();
   const uint32_t suffix = reader_.ReadVInt();
+  shared_length_ = prefix;
   if (prefix > text_.size()) {
     Damaged("term shares " + std::to_string(prefix) + " bytes with one of " + std::to_string(text_.size()));
   }
@@ -110,6 +111,7 @@ void TermCursor::ReadUtf8Text() {
 void TermCursor::ReadUtf16Text() {
   const uint32_t prefix = reader_.ReadVInt();
   const uint32_t suffix = reader_.ReadVInt();
+  shared_length_ = prefix;
   if (prefix > units_.size()) {
     Damaged("term shares " + std::to_string(prefix) + " characters with one of " +
             std::to_string(units_.size()));

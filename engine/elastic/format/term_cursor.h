@@ -72,6 +72,8 @@ class TermCursor {
     return text_;
   }
   const TermInfo& info() const { return info_; }
+  // How much of its text it takes from the term before, in bytes or, in the older layouts, UTF-16 units.
+  uint32_t shared_length() const { return shared_length_; }
   uint64_t dictionary_pointer() const { return dictionary_pointer_; }  // in .tii only
 
   // Copies the place that the entry at the cursor tells; in .tii only.
@@ -112,6 +114,7 @@ class TermCursor {
   uint64_t walked_ = 0;
   uint64_t term_offset_ = 0;
   int32_t field_ = -1;
+  uint32_t shared_length_ = 0;
   mutable std::string text_;
   std::u16string units_;  // the text of the older layouts, which is converted only when it is asked for
   mutable bool text_is_stale_ = false;

@@ -131,6 +131,11 @@ void CheckPreProcessors(const std::string& folder, const FieldSettings& field) {
   } catch (const std::invalid_argument& error) {
     throw IndexValueError(folder, "field " + format::Quoted(field.name) + ": " + error.what());
   }
+  if (!field.frequencies && MakesPhrases(field.pre_processors)) {
+    throw IndexValueError(folder,
+                          "field " + format::Quoted(field.name) +
+                              ": \"ngram\" needs frequencies: a word is found as a phrase of its grams");
+  }
 }
 
 }  // namespace

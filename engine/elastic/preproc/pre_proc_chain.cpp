@@ -28,6 +28,11 @@ struct NamedFactory {
 constexpr std::array kFactories = {NamedFactory{kToLower, PreProcFactoryT<ToLowerPreProc>},
                                    NamedFactory{kNgram, PreProcFactoryT<NgramPreProc>}};
 
+bool HasStep(const std::vector<PreProcSettings>& settings, const char* name) {
+  return std::any_of(settings.begin(), settings.end(),
+                     [&](const PreProcSettings& step) { return step.name == name; });
+}
+
 }  // namespace
 
 std::shared_ptr<const FieldPreProc> BuildPreProcChain(const std::vector<PreProcSettings>& settings) {
@@ -47,10 +52,9 @@ std::shared_ptr<const FieldPreProc> BuildPreProcChain(const std::vector<PreProcS
   return chain;
 }
 
-bool LowersCase(const std::vector<PreProcSettings>& settings) {
-  return std::any_of(settings.begin(), settings.end(),
-                     [](const PreProcSettings& step) { return step.name == kToLower; });
-}
+bool LowersCase(const std::vector<PreProcSettings>& settings) { return HasStep(settings, kToLower); }
+
+bool MakesPhrases(const std::vector<PreProcSettings>& settings) { return HasStep(settings, kNgram); }
 
 uint64_t MostGrowth(const std::vector<PreProcSettings>& settings) {
   uint64_t growth = 1;

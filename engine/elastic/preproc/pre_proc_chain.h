@@ -16,6 +16,9 @@ std::shared_ptr<const FieldPreProc> BuildPreProcChain(const std::vector<PreProcS
 // Whether no capital gets past a chain that can be built.
 bool LowersCase(const std::vector<PreProcSettings>& settings);
 
+// Whether what a chain that can be built makes of one word may be several terms, which are found as a phrase.
+bool MakesPhrases(const std::vector<PreProcSettings>& settings);
+
 // How many times as much text at most comes out of a chain that can be built as goes in; stops at 2^32.
 uint64_t MostGrowth(const std::vector<PreProcSettings>& settings);
 

@@ -1,34 +1,12 @@
 #include "vantrel/elastic/to_lower_pre_proc.h"
 
-#include <lucene++/LuceneHeaders.h>
-
-// Not without the index library's main header.
-#include <lucene++/CharFolder.h>
-
 #include <stdexcept>
-#include <string_view>
 
 #include "elastic/format/quoted.h"
-#include "elastic/format/text.h"
+#include "elastic/preproc/lower_case.h"
 
 namespace vantrel::elastic {
 namespace {
-
-std::string ToLower(std::string_view text) {
-  std::string lower;
-  lower.reserve(text.size());
-  while (!text.empty()) {
-    char32_t code_point = 0;
-    if (format::TakeCodePoint(text, code_point)) {
-      const wchar_t folded = Lucene::CharFolder::toLower(static_cast<wchar_t>(code_point));
-      format::AppendUtf8(static_cast<char32_t>(folded), lower);
-    } else {
-      lower.push_back(text.front());
-      text.remove_prefix(1);
-    }
-  }
-  return lower;
-}
 
 class LowerTokens : public FieldTokens {
  public:
@@ -36,7 +14,7 @@ class LowerTokens : public FieldTokens {
 
   bool Next(FieldToken& token) override {
     if (!wrapped_->Next(token)) return false;
-    token.text = ToLower(token.text);
+    token.text = LowerCase(token.text);
     return true;
   }
 

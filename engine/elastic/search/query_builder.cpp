@@ -13,6 +13,7 @@
 #include "elastic/format/text.h"
 #include "elastic/index/field_analyzer.h"
 #include "elastic/index/index_text.h"
+#include "elastic/preproc/lower_case.h"
 #include "elastic/preproc/pre_proc_chain.h"
 #include "elastic/search/pattern_query.h"
 #include "elastic/search/query_scan.h"
@@ -187,8 +188,12 @@ class FieldwiseParser : public Lucene::QueryParser {
 
   // Lower-cased as the analysis of the field's values does.
   static String Folded(String text, const FieldSettings& settings) {
-    const bool folds = settings.type == FieldType::kText || LowersCase(settings.pre_processors);
-    if (folds) Lucene::CharFolder::toLower(text.begin(), text.end());
+    if (settings.type == FieldType::kText) Lucene::CharFolder::toLower(text.begin(), text.end());
+    if (LowersCase(settings.pre_processors)) {
+      for (wchar_t& character : text) {
+        character = static_cast<wchar_t>(LowerCase(static_cast<char32_t>(character)));
+      }
+    }
     return text;
   }
 

@@ -1,77 +1,82 @@
 #include "elastic/suggest/prefix_walk.h"
 
-#include <algorithm>
 #include <utility>
 
 namespace vantrel::elastic {
 
-PrefixWalk::PrefixWalk(format::SegmentFiles files, const std::string& field, std::string prefix)
+PrefixWalk::PrefixWalk(format::SegmentFiles files, const std::string& field, std::string prefix,
+                       Deadline& deadline)
     : files_(std::move(files)),
-      prefix_(std::move(prefix)),
+      deadline_(deadline),
       fields_(format::ReadFieldInfos(files_.field_infos)),
-      sides_(SidesOf(field)),
-      cursor_(OpenCursor()) {
-  if (std::find(sides_.begin(), sides_.end(), Side::kHere) == sides_.end()) {
-    at_end_ = true;
-  } else {
-    SeekByIndex();
-  }
+      order_(fields_, field, std::move(prefix)),
+      passed_(order_),
+      cursor_(OpenCursor(files_.terms, format::TermCursor::File::kDictionary)) {
+  if (order_.has_field()) SeekByIndex();
+  // Others want descriptors, too.
+  files_.field_infos.reset();
+  files_.terms_index.reset();
 }
 
-std::vector<PrefixWalk::Side> PrefixWalk::SidesOf(const std::string& field) const {
-  std::vector<Side> sides;
-  sides.reserve(fields_.size());
-  for (const format::FieldInfo& info : fields_) {
-    const int order = info.name.compare(field);
-    sides.push_back(order < 0 ? Side::kBefore : order == 0 ? Side::kHere : Side::kBehind);
-  }
-  return sides;
+format::TermCursor PrefixWalk::OpenCursor(const std::shared_ptr<const format::ByteSource>& source,
+                                          format::TermCursor::File file) const {
+  return format::TermCursor(source, file, static_cast<uint32_t>(fields_.size()), files_.info.document_count);
 }
 
-format::TermCursor PrefixWalk::OpenCursor() const {
-  return format::TermCursor(files_.terms, format::TermCursor::File::kDictionary,
-                            static_cast<uint32_t>(fields_.size()), files_.info.document_count);
-}
-
-// Dictionaries are sorted by the fields' names, then by text. UTF-8 sorts by its bytes as by its code points.
-bool PrefixWalk::IsBefore(const format::TermCursor& cursor) const {
-  if (cursor.field() < 0) return true;  // the first entry of an index
-  const Side side = sides_[static_cast<size_t>(cursor.field())];
-  return side == Side::kHere ? cursor.text() < prefix_ : side == Side::kBefore;
-}
-
-// Entry k of the index tells where term k times the interval begins, and what stands before it.
 void PrefixWalk::SeekByIndex() {
-  format::TermCursor index(files_.terms_index, format::TermCursor::File::kIndex,
-                           static_cast<uint32_t>(fields_.size()), files_.info.document_count);
-  format::TermPlace place;
-  uint64_t entries = 0;
-  while (index.Next() && IsBefore(index)) {
-    index.CopyPlace(place);
-    ++entries;
+  format::TermCursor index = OpenCursor(files_.terms_index, format::TermCursor::File::kIndex);
+  for (DictionaryPart& part : FindDictionaryParts(cursor_, index, order_)) {
+    while (Advance()) {
+    }
+    Begin(std::move(part));
   }
-  if (entries > 0) cursor_.Resume(place, (entries - 1) * static_cast<uint64_t>(cursor_.index_interval()));
+}
+
+void PrefixWalk::Begin(DictionaryPart part) {
+  part_ = std::move(part);
+  if (part_.begin_number > 0) {
+    cursor_.Resume(part_.begin, part_.begin_number);
+    passed_.StartBehind(part_.begin, part_.begin_text);
+  }
+  number_ = part_.begin_number;
+  entries_ = {};
+  at_end_ = false;
 }
 
 bool PrefixWalk::Next() {
-  while (!at_end_ && cursor_.Next()) {
-    if (sides_[static_cast<size_t>(cursor_.field())] == Side::kHere && text().starts_with(prefix_)) {
-      CheckOrder();
-      return true;
-    }
-    at_end_ = !IsBefore(cursor_);
+  while (Advance()) {
+    if (order_.SideOf(cursor_) == TermOrder::Side::kHere) return true;
   }
-  at_end_ = true;
   return false;
 }
 
-// Terms of several segments are merged by their order. The older layouts are sorted by something else where their
-// texts go beyond 16 bits.
-void PrefixWalk::CheckOrder() {
-  if (!cursor_.is_utf8()) return;
-  if (has_previous_ && text() <= previous_) Damaged("term does not come after the one before it");
-  previous_ = text();
-  has_previous_ = true;
+// To the next term of the part, and behind its last one to the place that the index tells.
+bool PrefixWalk::Advance() {
+  if (at_end_) return false;
+  deadline_.Check();
+  const bool has_next = cursor_.Next();
+  if (has_next) CheckEntry();
+  if (!has_next || number_ == part_.end_number) {
+    at_end_ = true;
+    CheckEntries();
+    return false;
+  }
+  passed_.Check(cursor_);
+  ++number_;
+  return true;
+}
+
+// Before the term at the cursor an entry of the index may stand.
+void PrefixWalk::CheckEntry() {
+  if (number_ % static_cast<uint64_t>(cursor_.index_interval()) != 0) return;
+  if (number_ == part_.begin_number && number_ != 0) return;
+  entries_.Add(passed_.text(), passed_.field(), passed_.info(), HasSkipOffset(cursor_), cursor_.offset());
+}
+
+void PrefixWalk::CheckEntries() const {
+  if (entries_ != part_.entries) {
+    cursor_.Damaged("terms up to here are not those that the index over the dictionary repeats");
+  }
 }
 
 LiveTermFilter& PrefixWalk::live_filter() {
@@ -85,8 +90,8 @@ bool PrefixWalk::IsLiveAtFirstSight() {
 
 bool PrefixWalk::IsLive() {
   return files_.deletions == nullptr ||
-         live_filter().IsLive(cursor_.info(),
-                              fields_[static_cast<size_t>(cursor_.field())].omits_frequencies);
+         live_filter().IsLive(cursor_.info(), fields_[static_cast<size_t>(cursor_.field())].omits_frequencies,
+                              [this] { deadline_.Check(); });
 }
 
 }  // namespace vantrel::elastic

@@ -9,38 +9,21 @@
 #include "elastic/format/segment_files.h"
 #include "elastic/format/text.h"
 #include "elastic/suggest/best_terms.h"
+#include "elastic/suggest/deadline.h"
 #include "elastic/suggest/merged_prefix_walk.h"
 #include "elastic/suggest/prefix_walk.h"
-#include "vantrel/elastic/search_error.h"
 
 namespace vantrel::elastic {
 namespace {
 
-// Looks at the clock now and then.
-class Deadline {
- public:
-  explicit Deadline(std::chrono::milliseconds time_limit)
-      : is_set_(time_limit.count() > 0), end_(std::chrono::steady_clock::now() + time_limit) {}
-
-  void Check() {
-    constexpr uint32_t kEvery = 1024;
-    if (is_set_ && ++checks_ % kEvery == 0 && std::chrono::steady_clock::now() > end_) {
-      throw SearchTimeoutError();
-    }
-  }
-
- private:
-  bool is_set_;
-  std::chrono::steady_clock::time_point end_;
-  uint32_t checks_ = 0;
-};
-
-MergedPrefixWalk OpenWalk(const std::vector<std::string>& folders, const SuggestRequest& request) {
+MergedPrefixWalk OpenWalk(const std::vector<std::string>& folders, const SuggestRequest& request,
+                          Deadline& deadline) {
   std::vector<std::unique_ptr<PrefixWalk>> walks;
   for (const std::string& path : folders) {
     const format::DiskFolder folder(path);
     for (format::SegmentFiles& files : format::OpenNewestSegments(folder, format::Need::kAll)) {
-      walks.push_back(std::make_unique<PrefixWalk>(std::move(files), request.field, request.prefix));
+      walks.push_back(
+          std::make_unique<PrefixWalk>(std::move(files), request.field, request.prefix, deadline));
     }
   }
   return MergedPrefixWalk(std::move(walks));
@@ -60,9 +43,8 @@ std::vector<SuggestedTerm> SuggestTerms(const std::vector<std::string>& folders,
   Deadline deadline(request.time_limit);
   const uint64_t wanted = Wanted(request);
   BestTerms best(wanted);
-  MergedPrefixWalk walk = OpenWalk(folders, request);
+  MergedPrefixWalk walk = OpenWalk(folders, request, deadline);
   while (wanted > 0 && walk.Next()) {
-    deadline.Check();
     const uint64_t frequency = walk.document_frequency();
     // In this order: most terms are not among the best, and whether one is live may take long to tell.
     if (!best.WouldTake(walk.text(), frequency) || !walk.IsLive()) continue;

@@ -2,14 +2,21 @@
 
 #include <algorithm>
 #include <cstddef>
+#include <cstdint>
 #include <iterator>
 
 namespace vantrel::elastic {
 namespace {
 
+// Whole numbers of any type; whatever else a back-end puts there counts as nothing.
+uint64_t FrequencyOf(const Suggestion& suggestion) {
+  const Json::Value& frequency = suggestion.payload()["doc_freq"];
+  return frequency.isUInt64() ? frequency.asUInt64() : 0;
+}
+
 bool ComesFirst(const Suggestion& left, const Suggestion& right) {
-  const Json::Value& left_frequency = left.payload()["doc_freq"];
-  const Json::Value& right_frequency = right.payload()["doc_freq"];
+  const uint64_t left_frequency = FrequencyOf(left);
+  const uint64_t right_frequency = FrequencyOf(right);
   if (left_frequency != right_frequency) return left_frequency > right_frequency;
   return left.payload()["term"] < right.payload()["term"];
 }

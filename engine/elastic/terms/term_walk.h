@@ -2,6 +2,7 @@
 
 #include <lucene++/Lucene.h>
 
+#include <functional>
 #include <memory>
 #include <optional>
 #include <string>
@@ -25,7 +26,9 @@ class LiveTermFilter {
     return term.document_frequency > deletions_.count();
   }
 
-  bool IsLive(const format::TermInfo& term, bool omits_frequencies);
+  // `on_posting` is called for each posting that is read, if there is one; it may throw to end this.
+  bool IsLive(const format::TermInfo& term, bool omits_frequencies,
+              const std::function<void()>& on_posting = nullptr);
 
  private:
   format::Deletions deletions_;

@@ -35,6 +35,22 @@ TEST_F(AvailableMemoryTest, IsWhatTheKernelEstimates) {
   EXPECT_EQ(Available(), 4 * kMebibyte);
 }
 
+TEST_F(AvailableMemoryTest, LeavesSharedMemoryToTheKernelsEstimate) {
+  Write("proc/meminfo", "MemAvailable:    4096 kB\nCached: 9000 kB\nShmem:   1024 kB\n");
+  EXPECT_EQ(Available(), 4 * kMebibyte) << "the estimate has left it out already";
+}
+
+TEST_F(AvailableMemoryTest, SharedMemoryOfAControlGroupCannotGo) {
+  Write("proc/self/cgroup", "0::/box\n");
+  Write("sys/fs/cgroup/box/memory.max", std::to_string(100 * kMebibyte) + "\n");
+  Write("sys/fs/cgroup/box/memory.current", std::to_string(70 * kMebibyte) + "\n");
+  const std::string cache = "anon 1\nfile " + std::to_string(40 * kMebibyte) + "\n";
+  Write("sys/fs/cgroup/box/memory.stat", cache + "shmem " + std::to_string(25 * kMebibyte) + "\n");
+  EXPECT_EQ(Available(), 45 * kMebibyte) << "of 70 in use, 15 are page cache of files";
+  Write("sys/fs/cgroup/box/memory.stat", cache + "shmem " + std::to_string(41 * kMebibyte) + "\n");
+  EXPECT_EQ(Available(), 30 * kMebibyte) << "the numbers need not be of one moment";
+}
+
 TEST_F(AvailableMemoryTest, IsUnlimitedWhereTheKernelDoesNotTell) {
   EXPECT_EQ(Available(), kUnlimited);
   Write("proc/meminfo", "MemTotal:       24683852 kB\nMemAvailable: lots\n");
@@ -65,9 +81,10 @@ TEST_F(AvailableMemoryTest, TheOlderLayoutOfGroupsIsKnown) {
   Write("proc/self/cgroup", "9:name=systemd:/\n4:memory:/box\n0::/\n");
   Write("sys/fs/cgroup/memory/box/memory.limit_in_bytes", std::to_string(50 * kMebibyte) + "\n");
   Write("sys/fs/cgroup/memory/box/memory.usage_in_bytes", std::to_string(20 * kMebibyte) + "\n");
-  Write("sys/fs/cgroup/memory/box/memory.stat",
-        "cache 1\ntotal_cache " + std::to_string(5 * kMebibyte) + "\n");
-  EXPECT_EQ(Available(), 35 * kMebibyte);
+  Write("sys/fs/cgroup/memory/box/memory.stat", "cache 1\nshmem 7\ntotal_cache " +
+                                                    std::to_string(5 * kMebibyte) + "\ntotal_shmem " +
+                                                    std::to_string(2 * kMebibyte) + "\n");
+  EXPECT_EQ(Available(), 33 * kMebibyte);
 }
 
 TEST_F(AvailableMemoryTest, AGroupThatIsFullLeavesNothing) {

@@ -2,7 +2,10 @@
 
 #include <gmock/gmock.h>
 #include <gtest/gtest.h>
+#include <unicode/uchar.h>
+#include <unicode/unistr.h>
 
+#include <clocale>
 #include <stdexcept>
 #include <type_traits>
 #include <vector>
@@ -21,6 +24,13 @@ static_assert(std::is_abstract_v<FieldPreProc>);
 static_assert(sizeof(FieldPreProc) == sizeof(void*) + sizeof(std::shared_ptr<FieldPreProc>));
 static_assert(sizeof(ToLowerPreProc) == sizeof(FieldPreProc) + sizeof(std::string));
 static_assert(sizeof(NgramPreProc) == sizeof(FieldPreProc) + sizeof(std::string));
+
+std::string Utf8(std::u32string_view code_points) {
+  std::string text;
+  for (const char32_t code_point : code_points)
+    icu::UnicodeString(static_cast<UChar32>(code_point)).toUTF8String(text);
+  return text;
+}
 
 std::vector<FieldToken> Tokens(const FieldPreProc& chain, const std::string& text) {
   const std::unique_ptr<FieldTokens> tokens = chain.Process(text);
@@ -48,6 +58,41 @@ TEST(ToLowerPreProcTest, LowersLettersOfAnyScriptAndNothingElse) {
               ElementsAre("\xc3\xa4rger \xcf\x83\xce\xb1 \xd0\xb6\xd1\x8f"));
   EXPECT_THAT(Texts(lower, "\xe4\xb8\xad \xf0\x9f\x98\x80 \xf0\x9d\x94\xb8"),
               ElementsAre("\xe4\xb8\xad \xf0\x9f\x98\x80 \xf0\x9d\x94\xb8"));
+}
+
+TEST(ToLowerPreProcTest, KnowsTheLettersOfTodaysUnicode) {
+  const ToLowerPreProc lower(nullptr, "");
+  // Georgian, Cherokee, Latin, Osage, Adlam.
+  EXPECT_THAT(Texts(lower, Utf8(U"\u1c90 \u13a0 \u13f0 \ua796 \ua7ae \U000104b0 \U0001e900")),
+              ElementsAre(Utf8(U"\u10d0 \uab70 \u13f8 \ua797 \u026a \U000104d8 \U0001e922")));
+}
+
+TEST(ToLowerPreProcTest, MapsOneCharacterToOneWhateverTheLocale) {
+  const ToLowerPreProc lower(nullptr, "");
+  const std::string text = Utf8(U"I \u0130 \u1e9e \u03a3\u03a3 \u01c4 \u212a");
+  const std::string expected = Utf8(U"i i \u00df \u03c3\u03c3 \u01c6 k");
+  EXPECT_THAT(Texts(lower, text), ElementsAre(expected));
+  for (const char* locale : {"C", "C.UTF-8", "tr_TR.UTF-8"}) {
+    setlocale(LC_ALL, locale);
+    EXPECT_THAT(Texts(lower, text), ElementsAre(expected)) << locale;
+  }
+  setlocale(LC_ALL, "C");
+}
+
+// All of them, against what the library that knows Unicode says.
+TEST(ToLowerPreProcTest, AgreesWithUnicodeOnEveryCharacter) {
+  const ToLowerPreProc lower(nullptr, "");
+  int changed = 0;
+  for (char32_t code_point = 0; code_point <= 0x10ffff; ++code_point) {
+    if (code_point >= 0xd800 && code_point < 0xe000) continue;
+    const auto expected = static_cast<char32_t>(u_tolower(static_cast<UChar32>(code_point)));
+    const std::u32string character = {code_point};
+    const std::u32string lowered = {expected};
+    ASSERT_EQ(Texts(lower, Utf8(character)), std::vector<std::string>{Utf8(lowered)})
+        << std::hex << static_cast<uint32_t>(code_point);
+    if (expected != code_point) ++changed;
+  }
+  EXPECT_GT(changed, 1400);
 }
 
 TEST(ToLowerPreProcTest, AnEmptyTextIsOneEmptyToken) {

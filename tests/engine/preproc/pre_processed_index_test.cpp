@@ -84,6 +84,14 @@ TEST_F(PreProcessedIndexTest, PatternsAndRangesOverALoweredKeywordAreLoweredToo)
   EXPECT_THAT(Find("f:[B TO C]"), ElementsAre("1"));
 }
 
+TEST_F(PreProcessedIndexTest, LettersThatUnicodeGotLaterAreFoundInAnyCaseByWordsAndPatterns) {
+  Make(Field(FieldType::kKeyword, kLower), {"\xe1\xb2\x90\xe1\xb2\x91", "\xf0\x9e\xa4\x80\xf0\x9e\xa4\x81"});
+  EXPECT_THAT(Find("f:\xe1\xb2\x90\xe1\xb2\x91"), ElementsAre("0"));
+  EXPECT_THAT(Find("f:\xe1\x83\x90\xe1\x83\x91"), ElementsAre("0"));
+  EXPECT_THAT(Find("f:\xe1\xb2\x90*"), ElementsAre("0"));
+  EXPECT_THAT(Find("f:\xf0\x9e\xa4\x80*"), ElementsAre("1"));
+}
+
 TEST_F(PreProcessedIndexTest, GramsOfAKeywordFindAnyPartOfIt) {
   Make(Field(FieldType::kKeyword, kLowerBigrams), {"Quorelastic", "elation", "tic elas"});
   EXPECT_THAT(Find("f:ELAS"), ElementsAre("0", "2"));
@@ -248,6 +256,20 @@ TEST_F(PreProcessedIndexTest, ChainsThatCannotBeBuiltAreRefusedBeforeAnythingIsM
   EXPECT_EQ(refusal(std::vector<PreProcSettings>(9, {"tolower", ""})),
             start + "9 pre-processors are more than 8");
   EXPECT_THAT(ListFolder(folder_.path()), IsEmpty());
+}
+
+TEST_F(PreProcessedIndexTest, GramsInAFieldWithoutFrequenciesAreRefused) {
+  for (const auto& steps : {kBigrams, kLowerBigrams}) {
+    FieldSettings field = Field(FieldType::kText, steps);
+    field.frequencies = false;
+    ExpectIndexError("field \"f\": \"ngram\" needs frequencies: a word is found as a phrase of its grams",
+                     [&] { Index::Create(folder_ / "index", {.fields = {field}}); });
+  }
+  EXPECT_THAT(ListFolder(folder_.path()), IsEmpty());
+  FieldSettings lower = Field(FieldType::kText, kLower);
+  lower.frequencies = false;
+  Make(lower, {"Alpha"});
+  EXPECT_THAT(Find("f:ALPHA"), ElementsAre("0")) << "other steps need none";
 }
 
 TEST_F(PreProcessedIndexTest, TheIdIsTakenAsItIs) {

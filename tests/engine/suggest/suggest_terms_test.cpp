@@ -5,10 +5,12 @@
 #include <lucene++/LuceneHeaders.h>
 
 #include <atomic>
+#include <chrono>
 #include <filesystem>
 #include <limits>
 #include <thread>
 
+#include "support/byte_writer.h"
 #include "support/expect_damage.h"
 #include "support/files.h"
 #include "support/library_index.h"
@@ -18,6 +20,7 @@
 namespace vantrel::elastic {
 namespace {
 
+using ::quorelastic::testing::ByteWriter;
 using ::quorelastic::testing::ExpectIndexError;
 using ::quorelastic::testing::LibraryIndex;
 using ::quorelastic::testing::ListFolder;
@@ -187,7 +190,8 @@ TEST_F(SuggestTermsTest, ReadsTheDictionaryOnlyWhereTheTermsAre) {
   const size_t size = bytes.size();
   const Terms wanted = {{"t15000", 1}, {"t15001", 1}};
   ASSERT_EQ(Suggest("t1500", 0, 2), wanted);
-  std::fill(bytes.begin() + 100, bytes.begin() + static_cast<ptrdiff_t>(size * 2 / 5), '\xff');
+  // The first blocks are read to see where the terms' first letters come from.
+  std::fill(bytes.begin() + 1000, bytes.begin() + static_cast<ptrdiff_t>(size * 2 / 5), '\xff');
   std::fill(bytes.begin() + static_cast<ptrdiff_t>(size * 3 / 5), bytes.end(), '\xff');
   WriteFile(file, bytes);
   EXPECT_EQ(Suggest("t1500", 0, 2), wanted);
@@ -245,6 +249,44 @@ TEST_F(SuggestTermsTest, GivesUpAfterItsTimeLimit) {
   SuggestRequest patient = hasty;
   patient.time_limit = std::chrono::hours(1);
   EXPECT_THAT(SuggestTerms({folder_.path()}, patient), SizeIs(10));
+}
+
+// One term in so many documents, all of them deleted.
+void WriteDeletedTerm(const TemporaryFolder& folder, int32_t documents) {
+  ByteWriter terms = ByteWriter().Int(-4).Long(1).Int(128).Int(0x7fffffff).Int(10);
+  WriteFile(folder / "_0.tis", terms.VInt(0).String("t").VInt(0).VInt(documents).VLong(0).VLong(0).bytes());
+  ByteWriter index = ByteWriter().Int(-4).Long(1).Int(128).Int(0x7fffffff).Int(10);
+  WriteFile(folder / "_0.tii", index.VInt(0).String("").VInt(-1).VInt(0).VLong(0).VLong(0).VLong(24).bytes());
+  std::string postings(static_cast<size_t>(documents), '\x03');  // the next document, once
+  postings.front() = '\x01';                                     // the first one
+  WriteFile(folder / "_0.frq", postings);
+  std::string deleted(static_cast<size_t>(documents / 8 + 1), '\xff');
+  deleted.back() = 0;
+  WriteFile(folder / "_0_1.del", ByteWriter().Int(documents).Int(documents).Raw(deleted).bytes());
+  WriteFile(folder / "_0.fnm", ByteWriter().VInt(-2).VInt(1).String("body").Byte(1).bytes());
+  WriteFile(folder / "segments_1", ByteWriter()
+                                       .Int(-2)
+                                       .Long(1)
+                                       .Int(1)
+                                       .Int(1)
+                                       .String("_0")
+                                       .Int(documents)
+                                       .Long(1)
+                                       .Int(-1)
+                                       .Byte(0xff)
+                                       .bytes());
+}
+
+TEST_F(SuggestTermsTest, GivesUpAlsoWhileItLooksForALiveDocument) {
+  WriteDeletedTerm(folder_, 8'000'000);
+  EXPECT_THAT(Suggest("t"), IsEmpty());
+  const auto start = std::chrono::steady_clock::now();
+  Suggest("t");
+  const auto whole = std::chrono::steady_clock::now() - start;
+  ASSERT_GT(whole, std::chrono::milliseconds(10)) << "too quick to be stopped";
+  EXPECT_THROW(SuggestTerms({folder_.path()},
+                            {.field = "body", .prefix = "t", .time_limit = std::chrono::milliseconds(5)}),
+               SearchTimeoutError);
 }
 
 TEST_F(SuggestTermsTest, SeesAnIndexAsOfOneCommitBesideABusyWriter) {

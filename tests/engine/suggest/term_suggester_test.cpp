@@ -4,6 +4,7 @@
 #include <gtest/gtest.h>
 
 #include <limits>
+#include <stdexcept>
 #include <type_traits>
 
 #include "support/expect_damage.h"
@@ -33,6 +34,9 @@ static_assert(sizeof(TermSuggester) ==
 static_assert(sizeof(PrefixTermSuggester) == sizeof(void*) + 8 + sizeof(std::vector<std::shared_ptr<Index>>));
 static_assert(sizeof(Suggestion) == sizeof(void*) + sizeof(std::string) + sizeof(Json::Value));
 
+static_assert(std::is_nothrow_move_constructible_v<Suggestion> &&
+              std::is_nothrow_move_assignable_v<Suggestion>);
+
 std::vector<std::string> Rendered(const std::vector<Suggestion>& suggestions) {
   std::vector<std::string> lines;
   lines.reserve(suggestions.size());
@@ -60,7 +64,7 @@ class FakeBackEnd : public TermSuggesterImpl {
   mutable uint64_t asked_for_ = 0;
 };
 
-Suggestion MakeSuggestion(const std::string& type, int frequency, const std::string& term) {
+Suggestion MakeSuggestion(const std::string& type, const Json::Value& frequency, const std::string& term) {
   JsonValue payload;
   payload["doc_freq"] = frequency;
   payload["term"] = term;
@@ -137,6 +141,58 @@ TEST_F(TermSuggesterTest, SeveralBackEndsArePutInOneOrder) {
   EXPECT_THAT(Rendered(suggester.GetSuggest("f", "t", 1, 2)),
               ElementsAre(R"(one {"doc_freq":9,"term":"z"})", R"(two {"doc_freq":2,"term":"a"})"));
   EXPECT_EQ(one->asked_for(), 3U) << "what is skipped has to be known";
+}
+
+TEST_F(TermSuggesterTest, ComparesFrequenciesAsNumbersOfAnyType) {
+  constexpr auto kMost = std::numeric_limits<uint64_t>::max();
+  TermSuggester suggester;
+  suggester.AddBackEnd(std::make_shared<FakeBackEnd>(std::vector<Suggestion>{
+      MakeSuggestion("signed", Json::Int64{300}, "c"), MakeSuggestion("small", 2, "e"),
+      MakeSuggestion("negative", -1, "f"), MakeSuggestion("text", "1000", "g")}));
+  suggester.AddBackEnd(std::make_shared<FakeBackEnd>(std::vector<Suggestion>{
+      MakeSuggestion("unsigned", Json::UInt64{kMost}, "z"),
+      MakeSuggestion("unsigned", Json::UInt64{300}, "b"), MakeSuggestion("unsigned", 299U, "a"),
+      MakeSuggestion("unsigned", Json::UInt64{2}, "d")}));
+  std::vector<std::string> terms;
+  for (const Suggestion& suggestion : suggester.GetSuggest("f", "t", 0, 100)) {
+    terms.push_back(suggestion.payload()["term"].asString());
+  }
+  EXPECT_THAT(terms, ElementsAre("z", "b", "c", "a", "d", "e", "f", "g"));
+}
+
+TEST_F(TermSuggesterTest, SuggestionsMoveWithoutACopy) {
+  const std::string term(1000, 't');
+  Suggestion first = MakeSuggestion(std::string(100, 'x'), 1, term);
+  const char* const type = first.type().data();
+  Suggestion second = std::move(first);
+  EXPECT_EQ(second.type().data(), type) << "the text was copied";
+  EXPECT_EQ(second.payload()["term"].asString(), term);
+  Suggestion third = MakeSuggestion("y", 2, "u");
+  third = std::move(second);
+  EXPECT_EQ(third.type().data(), type);
+  const Suggestion copy = third;
+  EXPECT_EQ(Rendered({copy}), Rendered({third}));
+}
+
+TEST_F(TermSuggesterTest, WhatABackEndThrowsPassesOn) {
+  struct Failing : TermSuggesterImpl {
+    std::vector<Suggestion> Suggest(const std::string&, const std::string&, uint64_t) const override {
+      throw std::domain_error("no suggestions today");
+    }
+  };
+  TermSuggester suggester;
+  suggester.AddBackEnd(std::make_shared<Failing>());
+  EXPECT_THROW(suggester.GetSuggest("f", "t", 0, 10), std::domain_error);
+}
+
+TEST_F(TermSuggesterTest, AnIndexIsOpenedWhenItIsAskedNotWhenItIsNamed) {
+  const auto missing = IndexContainer::Instance()->IndexGet(folder_ / "missing");
+  ASSERT_NE(missing, nullptr);
+  TermSuggester suggester;
+  suggester.AddBackEnd(
+      std::make_shared<PrefixTermSuggester>(std::vector<std::shared_ptr<Index>>{missing}, 10));
+  ExpectIndexError(folder_ / "missing: cannot open index folder",
+                   [&] { suggester.GetSuggest("f", "t", 0, 10); });
 }
 
 TEST_F(TermSuggesterTest, SharesItsBackEnds) {

@@ -17,7 +17,8 @@ enum class TermVector { kNone, kTerms, kPositions, kOffsets, kPositionsAndOffset
 //
 //   name       argument
 //   "tolower"  none: letters become lower-case
-//   "ngram"    lengths, such as "2" or "2,3": every run of so many characters is a term
+//   "ngram"    lengths, such as "2" or "2,3": every run of so many characters is a term, and a word is found as a
+//              phrase of them, so that the field needs its frequencies
 struct PreProcSettings {
   std::string name;
   std::string argument;

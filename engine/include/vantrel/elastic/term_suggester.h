@@ -20,12 +20,15 @@ class VANTREL_ELASTIC_EXPORT Suggestion {
   Suggestion(std::string type, JsonValue payload) : type_(std::move(type)), payload_(std::move(payload)) {}
   Suggestion(const Suggestion&) = default;
   Suggestion& operator=(const Suggestion&) = default;
+  Suggestion(Suggestion&&) noexcept = default;
+  Suggestion& operator=(Suggestion&&) noexcept = default;
   virtual ~Suggestion() = default;
 
   // Who suggests it, such as "prefix".
   const std::string& type() const { return type_; }
 
-  // What is suggested, an object; a "prefix" is {"doc_freq": documents that hold the term, "term": the term}.
+  // What is suggested, an object. Its member "doc_freq" is what suggestions are sorted by; where it is no whole
+  // number of 0 or more, it counts as 0. A "prefix" is {"doc_freq": documents that hold the term, "term": the term}.
   const JsonValue& payload() const { return payload_; }
 
  private:

@@ -9,7 +9,11 @@
 
 namespace vantrel::elastic {
 
-// Makes letters lower-case by Unicode, each for itself and whatever the locale: what the words of texts are made.
+// Makes letters lower-case by Unicode, code point by code point and whatever the locale: each becomes the one that
+// Unicode gives as its simple mapping, so that a text keeps its length. "I" with a dot above becomes a plain "i".
+//
+// What was indexed stays as the Unicode of that day had it: a newer one may know of lower case where there was none,
+// and then a query no longer meets what was indexed before, until that is indexed anew.
 class VANTREL_ELASTIC_EXPORT ToLowerPreProc : public FieldPreProc {
  public:
   // The argument is to be empty; else std::invalid_argument is thrown.

@@ -1,0 +1,65 @@
+#include "elastic/suggest/prefix_walk.h"
+
+#include <gtest/gtest.h>
+
+#include <filesystem>
+#include <map>
+#include <memory>
+
+#include "elastic/format/folder.h"
+#include "support/library_index.h"
+#include "support/temporary_folder.h"
+
+namespace vantrel::elastic {
+namespace {
+
+using ::quorelastic::testing::LibraryIndex;
+using ::quorelastic::testing::TemporaryFolder;
+
+// How many files of a folder this process has open, by their endings.
+std::map<std::string, int> CountOpenFiles(const std::string& folder) {
+  std::map<std::string, int> counts;
+  for (const auto& entry : std::filesystem::directory_iterator("/proc/self/fd")) {
+    std::error_code error;
+    const std::filesystem::path file = std::filesystem::read_symlink(entry.path(), error);
+    if (!error && file.parent_path() == folder) ++counts[file.extension().string()];
+  }
+  return counts;
+}
+
+TEST(PrefixWalkTest, HoldsOnlyTheFilesOpenThatItStillReads) {
+  constexpr int kSegments = 4;
+  const TemporaryFolder folder;
+  {
+    LibraryIndex index(folder.path(), {.compound = false});
+    for (int i = 0; i < kSegments; ++i) {
+      index.Add({{.name = "body", .value = "tea team"},
+                 {.name = "id", .value = std::to_string(i), .keyword = true}});
+      index.Add({{.name = "body", .value = "tea"}});
+      index.Commit();
+    }
+    index.Delete("id", "0");
+    index.Commit();
+  }
+  Deadline deadline(std::chrono::milliseconds(0));
+  std::vector<std::unique_ptr<PrefixWalk>> walks;
+  for (auto& files : format::OpenNewestSegments(format::DiskFolder(folder.path()), format::Need::kAll)) {
+    walks.push_back(std::make_unique<PrefixWalk>(std::move(files), "body", "te", deadline));
+  }
+  ASSERT_EQ(walks.size(), static_cast<size_t>(kSegments));
+  const std::map<std::string, int> expected = {{".tis", kSegments}, {".frq", 1}, {".del", 1}};
+  EXPECT_EQ(CountOpenFiles(folder.path()), expected);
+  for (const auto& walk : walks) {
+    EXPECT_TRUE(walk->Next());
+    EXPECT_EQ(walk->text(), "tea");
+    EXPECT_TRUE(walk->IsLive());
+    EXPECT_TRUE(walk->Next());
+    EXPECT_FALSE(walk->Next());
+    EXPECT_FALSE(walk->Next());
+  }
+  walks.clear();
+  EXPECT_TRUE(CountOpenFiles(folder.path()).empty());
+}
+
+}  // namespace
+}  // namespace vantrel::elastic
