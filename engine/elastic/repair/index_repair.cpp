@@ -12,7 +12,6 @@
 
 #include "elastic/format/commit.h"
 #include "elastic/format/folder.h"
-#include "elastic/index/index_text.h"
 #include "elastic/repair/checked_directory.h"
 #include "elastic/repair/checker_trial.h"
 #include "elastic/search/library_failure.h"
@@ -23,13 +22,6 @@
 
 namespace vantrel::elastic {
 namespace {
-
-void CheckPath(const std::string& path) {
-  std::wstring wide;
-  if (const char* problem = ToIndexText(path, wide)) {
-    throw IndexValueError(path, std::string("the path ") + problem);
-  }
-}
 
 // Throws where there is no commit to start from.
 void CheckCommit(const std::string& path) {
@@ -106,7 +98,6 @@ class Checker {
 
 RepairOutcome RepairIndex(const std::string& path) {
   PrepareIndexLibrary();
-  CheckPath(path);
   CheckCommit(path);
   std::optional<WriteLock> lock = TakeLockThatIsThere(path);
   if (!lock.has_value()) {
