@@ -1,4 +1,5 @@
-// "check" against the index library's own checker on a healthy index, whole processes, as ratios in one run.
+// "check" against the index library's own checker on a healthy index, and the lookups that are checked beforehand
+// against the library's without; whole processes, as ratios in one run.
 
 #include <cstdint>
 #include <filesystem>
@@ -19,6 +20,7 @@ using quorelastic::bench::Run;
 constexpr int64_t kMebibyte = 1 << 20;
 constexpr int kRuns = 5;
 constexpr int kManifestRuns = 15;  // a small difference of large numbers
+constexpr int kLookups = 101;
 constexpr double kMostMillisecondsPerGigabyte = 100;
 
 std::vector<std::string> OnOne(std::vector<std::string> command) {
@@ -64,12 +66,32 @@ void MeasureManifests(Figures& figures, const std::string& index, const std::str
       Compare({QUORELASTIC_MAKE_MANIFEST, loaded}, {QUORELASTIC_PEER_LIBRARY_LOAD, loaded}, kRuns), 0.05);
 }
 
+// The most frequent word is in nearly every document, and each lookup goes to the middle of the index.
+void MeasureLookups(const std::string& index, Figures& figures) {
+  constexpr char kDocument[] = "100000";
+  constexpr char kOften[] = "63z";
+  const auto tool = [&](const std::string& action, const std::string& field, const std::string& term) {
+    return std::vector<std::string>{QUORELASTIC_TOOL, "-a", action, "-d", index, "-n",
+                                    kDocument,        "-f", field,  "-t", term};
+  };
+  const auto peer = [&](const std::string& field) {
+    return std::vector<std::string>{QUORELASTIC_PEER_LIBRARY_LOOKUP, index, kDocument, field};
+  };
+  std::vector<std::string> positions = peer("body");
+  positions.emplace_back(kOften);
+  figures.AddRatio("position of a frequent word in the same index, against the index library without a check",
+                   Compare(tool("position", "body", kOften), positions, kLookups), 1.1);
+  figures.AddRatio("doc_term in the same index, against the index library without a check",
+                   Compare(tool("doc_term", "title", ""), peer("title"), kLookups), 1.1);
+}
+
 bool Measure(const std::string& folder) {
   const std::string index = folder + "/index";
   Run({QUORELASTIC_MAKE_DOCUMENTS, index, "320"});
   Figures figures;
   MeasureChecks(figures, index);
   MeasureManifests(figures, index, folder);
+  MeasureLookups(index, figures);
   return figures.all_met();
 }
 

@@ -75,6 +75,18 @@ void AddFolder(const Corpus& corpus, const std::string& folder, const std::strin
       whole.Byte(static_cast<int>(file.size())).Raw(file).Raw(Length(bytes).bytes()).Raw(bytes);
     }
     corpus.Add("index_health", name + std::to_string(turn), whole.bytes());
+    for (const int document : {0, 2}) {
+      corpus.Add("lookup", name + std::to_string(turn) + "-" + std::to_string(document),
+                 ByteWriter()
+                     .Byte(4)
+                     .Raw("body")
+                     .Byte(1)
+                     .Raw("x")
+                     .Byte(document)
+                     .Byte(0)
+                     .Raw(whole.bytes())
+                     .bytes());
+    }
     std::rotate(files.begin(), files.begin() + 3 % static_cast<std::ptrdiff_t>(files.size()), files.end());
   }
 }

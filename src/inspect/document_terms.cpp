@@ -7,27 +7,19 @@
 #include <iostream>
 
 #include "error/report_lucene_errors.h"
-#include "inspect/index_reader.h"
+#include "vantrel/elastic/checked_reader.h"
 
 namespace {
 
 using Lucene::StringUtils;
 
-// The index library reads outside its tables for a negative document number and for any document of an index
-// without segments: neither has a vector.
-Lucene::TermFreqVectorPtr FindTermVector(const Lucene::IndexReaderPtr& reader, int32_t document,
-                                         const std::string& field) {
-  if (document < 0 || reader->maxDoc() == 0) return {};
-  return reader->getTermFreqVector(document, StringUtils::toUnicode(field));
-}
-
 void PrintTerms(const std::string& index_path, const std::string& field, int32_t document) {
-  const Lucene::IndexReaderPtr reader = OpenIndexReader(index_path);
-  if (!reader) {
+  const vantrel::elastic::CheckedReader reader(index_path);
+  if (!reader.reader()) {
     std::cout << "No reader!!" << std::endl;
     return;
   }
-  const Lucene::TermFreqVectorPtr vector = FindTermVector(reader, document, field);
+  const Lucene::TermFreqVectorPtr vector = reader.TermVector(document, StringUtils::toUnicode(field));
   if (!vector) {
     std::cout << "Failed to get term vector" << std::endl;
     return;

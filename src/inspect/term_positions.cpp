@@ -8,28 +8,30 @@
 #include <iostream>
 
 #include "error/report_lucene_errors.h"
-#include "inspect/index_reader.h"
+#include "vantrel/elastic/checked_reader.h"
 
 namespace {
 
 using Lucene::StringUtils;
+using vantrel::elastic::CheckedReader;
 
 void PrintPositions(const std::string& index_path, const std::string& field, const std::string& token,
                     int32_t document) {
   const auto term =
       Lucene::newLucene<Lucene::Term>(StringUtils::toUnicode(field), StringUtils::toUnicode(token));
-  const Lucene::IndexReaderPtr reader = OpenIndexReader(index_path);
-  if (!reader) {
+  const CheckedReader reader(index_path, term);
+  if (!reader.reader()) {
     std::cout << "No reader!!" << std::endl;
     return;
   }
-  const Lucene::TermPositionsPtr positions = reader->termPositions(term);
+  // No document is below 0, and the library subtracts from the number that it is given.
+  document = std::max(document, 0);
+  const Lucene::TermPositionsPtr positions = reader.Positions(document);
   if (!positions) {
     std::cout << "No position found!!" << std::endl;
     return;
   }
-  // No document is below 0, and the library subtracts from the number that it is given.
-  if (!positions->skipTo(std::max(document, 0))) {
+  if (!positions->skipTo(document)) {
     std::cout << "No entry!!" << std::endl;
     return;
   }

@@ -14,7 +14,7 @@
 namespace quorelastic::testing {
 namespace {
 
-constexpr rlim_t kMostMemory = rlim_t{1} << 30;
+constexpr rlim_t kMostMemory = rlim_t{2} << 30;
 constexpr unsigned kMostSeconds = 10;
 
 // A file in memory that takes what the program prints.

@@ -11,7 +11,7 @@ struct ToolRun {
   std::string errors;
 };
 
-// Runs the program with at most 1 GiB of address space (not where a sanitizer needs more) and 10 seconds, after
+// Runs the program with at most 2 GiB of address space (not where a sanitizer needs more) and 10 seconds, after
 // which SIGALRM ends it.
 ToolRun RunTool(const std::vector<std::string>& arguments);
 

@@ -7,7 +7,6 @@
 #include <utility>
 
 #include "elastic/format/text.h"
-#include "vantrel/elastic/index_error.h"
 
 namespace vantrel::elastic::format {
 
@@ -21,12 +20,15 @@ void ByteReader::Damaged(uint64_t offset, const std::string& problem) const {
   throw IndexDamagedError(name(), offset, problem);
 }
 
+void ByteReader::RefuseEnd(uint64_t offset, uint64_t wanted) const {
+  throw EndOfFileError(
+      name(), offset,
+      "wanted " + std::to_string(wanted) + " more bytes, but the file ends at " + std::to_string(size()));
+}
+
 void ByteReader::Refill(uint64_t wanted) {
   const uint64_t start = offset();
-  if (wanted > size() - start) {
-    Damaged(start, "wanted " + std::to_string(wanted) + " more bytes, but the file ends at " +
-                       std::to_string(size()));
-  }
+  if (wanted > size() - start) RefuseEnd(start, wanted);
   const auto length = static_cast<size_t>(std::min<uint64_t>(buffer_size_, size() - start));
   if (buffer_.size() < length) buffer_.resize(length);
   // Empty while the read runs: should it throw, the next attempt starts at the same offset.
@@ -103,10 +105,7 @@ uint64_t ByteReader::ReadLongVLong() {
 }
 
 void ByteReader::ReadBytes(std::span<uint8_t> out) {
-  if (out.size() > remaining()) {
-    Damaged(offset(), "wanted " + std::to_string(out.size()) + " more bytes, but the file ends at " +
-                          std::to_string(size()));
-  }
+  if (out.size() > remaining()) RefuseEnd(offset(), out.size());
   const size_t buffered = std::min(out.size(), filled_ - position_);
   std::copy_n(buffer_.begin() + static_cast<ptrdiff_t>(position_), buffered, out.begin());
   position_ += buffered;

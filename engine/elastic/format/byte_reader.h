@@ -8,8 +8,16 @@
 #include <vector>
 
 #include "elastic/format/byte_source.h"
+#include "vantrel/elastic/index_error.h"
 
 namespace vantrel::elastic::format {
+
+// A value goes on past the end of its source. Who has read the same bytes so far, by the same layout, comes to the
+// same end.
+class EndOfFileError : public IndexDamagedError {
+ public:
+  using IndexDamagedError::IndexDamagedError;
+};
 
 // A buffered cursor over a byte source that decodes the primitives of index files:
 //
@@ -20,7 +28,8 @@ namespace vantrel::elastic::format {
 //   String  VInt length in bytes, then UTF-8
 //
 // Every read is checked against the end of the source. What lies beyond it, or does not fit its type, is
-// reported by IndexDamagedError at the offset where the value begins. For one thread at a time.
+// reported by IndexDamagedError at the offset where the value begins (EndOfFileError where a number or bytes go on
+// past the end, but not a string that announces it). For one thread at a time.
 class ByteReader {
  public:
   static constexpr size_t kDefaultBufferSize = size_t{16} << 10;
@@ -81,6 +90,7 @@ class ByteReader {
   uint32_t ReadLongVInt();
   uint64_t ReadLongVLong();
   void Refill(uint64_t wanted);
+  [[noreturn]] void RefuseEnd(uint64_t offset, uint64_t wanted) const;
   bool PassShortVIntsAtEnd(uint64_t count);
 
   std::shared_ptr<const ByteSource> source_;

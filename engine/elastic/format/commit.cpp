@@ -105,8 +105,12 @@ void SkipUserData(ByteReader& reader, int32_t format) {
   }
 }
 
-void CheckChecksum(const ByteSource& source, ByteReader& reader) {
+void CheckChecksum(const ByteSource& source, ByteReader& reader, CommitChecksum kind) {
   const uint64_t end = reader.offset();
+  if (kind == CommitChecksum::kPassOver) {
+    reader.ReadLong();
+    return;
+  }
   uLong checksum = crc32(0, nullptr, 0);
   std::vector<uint8_t> piece(ByteReader::kDefaultBufferSize);
   for (uint64_t offset = 0; offset < end;) {
@@ -152,7 +156,8 @@ int64_t HintedGeneration(const Folder& folder) {
   }
 }
 
-Commit ReadCommit(const std::shared_ptr<const ByteSource>& source, int64_t generation) {
+Commit ReadCommit(const std::shared_ptr<const ByteSource>& source, int64_t generation,
+                  CommitChecksum checksum) {
   if (source->size() > kLargestCommit) {
     throw IndexError(source->name(), std::to_string(source->size()) + " bytes are too many for a commit");
   }
@@ -176,7 +181,7 @@ Commit ReadCommit(const std::shared_ptr<const ByteSource>& source, int64_t gener
   }
   for (int32_t i = 0; i < count; ++i) commit.segments.push_back(ReadSegment(reader, format));
   if (format < 0) SkipUserData(reader, format);
-  if (format <= kWithChecksum) CheckChecksum(*source, reader);
+  if (format <= kWithChecksum) CheckChecksum(*source, reader, checksum);
   // The oldest layout may have its version here.
   if (format >= 0 && reader.remaining() >= 8) reader.ReadLong();
   commit.end = reader.offset();

@@ -76,8 +76,10 @@ inline constexpr uint64_t kLargestCommit = uint64_t{256} << 20;
 //   the oldest layout: Long version, or nothing
 //
 // Bytes after that are ignored. Throws IndexDamagedError, IndexIoError, and IndexError for a file of over
-// 256 MiB, which no commit reaches.
-Commit ReadCommit(const std::shared_ptr<const ByteSource>& source, int64_t generation);
+// 256 MiB, which no commit reaches. Whoever leaves it to others to compare the checksum takes kPassOver.
+enum class CommitChecksum { kCompare, kPassOver };
+Commit ReadCommit(const std::shared_ptr<const ByteSource>& source, int64_t generation,
+                  CommitChecksum checksum = CommitChecksum::kCompare);
 
 // What segments.gen says of the newest generation, -1 where it is missing, torn or unreadable: it is but a hint.
 //

@@ -8,10 +8,10 @@ namespace vantrel::elastic::format {
 PositionsReader::PositionsReader(std::shared_ptr<const ByteSource> source, size_t buffer_size)
     : reader_(std::move(source), buffer_size) {}
 
-void PositionsReader::Seek(uint64_t pointer, bool has_payloads) {
+void PositionsReader::Seek(uint64_t pointer, bool has_payloads, std::optional<uint32_t> payload_length) {
   reader_.Seek(pointer);
   has_payloads_ = has_payloads;
-  payload_length_.reset();
+  payload_length_ = payload_length;
   states_length_ = false;
 }
 

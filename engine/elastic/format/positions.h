@@ -24,8 +24,9 @@ class PositionsReader {
   PositionsReader(std::shared_ptr<const ByteSource> source,
                   size_t buffer_size = ByteReader::kDefaultBufferSize);
 
-  // Moves before the first document of a term. Throws IndexDamagedError, IndexIoError, as does PassDocument().
-  void Seek(uint64_t pointer, bool has_payloads);
+  // Moves before the first document of a term, or before a later one, where skip data tell the payload length that
+  // holds there. Throws IndexDamagedError, IndexIoError, as does PassDocument().
+  void Seek(uint64_t pointer, bool has_payloads, std::optional<uint32_t> payload_length = std::nullopt);
 
   // Moves past one document's positions. They must not descend, nor lie before -1.
   void PassDocument(uint32_t frequency) { has_payloads_ ? PassPayloads(frequency) : PassPlain(frequency); }

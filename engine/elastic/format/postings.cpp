@@ -17,6 +17,14 @@ void PostingsReader::Seek(const TermInfo& term, bool omits_frequencies) {
   document_ = 0;
 }
 
+void PostingsReader::Resume(uint64_t pointer, int32_t document, int32_t left, bool omits_frequencies) {
+  reader_.Seek(pointer);
+  omits_frequencies_ = omits_frequencies;
+  left_ = left;
+  at_first_ = false;
+  document_ = document;
+}
+
 namespace {
 
 constexpr size_t kLongestPosting = 10;  // bytes

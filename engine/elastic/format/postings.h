@@ -27,6 +27,10 @@ class PostingsReader {
   // Moves before the first document of a term. Throws IndexDamagedError, IndexIoError, as does Next().
   void Seek(const TermInfo& term, bool omits_frequencies);
 
+  // Moves behind some of a term's documents, as its skip data tell: to `pointer`, where the next one begins, with
+  // `document` the one before, and `left` to come.
+  void Resume(uint64_t pointer, int32_t document, int32_t left, bool omits_frequencies);
+
   // Moves to the next document; false at the end. Whatever the bytes, documents ascend and lie in the
   // segment.
   bool Next() {

@@ -24,11 +24,13 @@ int SkipListReader::LevelsOf(int32_t document_frequency) const {
 
 void SkipListReader::Seek(uint64_t pointer, int32_t document_frequency, bool has_payloads) {
   has_payloads_ = has_payloads;
+  document_frequency_ = document_frequency;
   level_count_ = LevelsOf(document_frequency);
   while (levels_.size() < static_cast<size_t>(level_count_)) levels_.emplace_back(source_, kBufferSize);
   for (int number = level_count_ - 1; number >= 0; --number) {
     Level& level = levels_[static_cast<size_t>(number)];
     level.entry = Entry();
+    level.passed = 0;
     level.reader.Seek(pointer);
     level.end = level.reader.size();
     level.start = pointer;
@@ -70,6 +72,61 @@ const SkipListReader::Entry& SkipListReader::Next(int number) {
     reader.Damaged(entry.offset, "skip entry reaches past its level's end at " + std::to_string(level.end));
   }
   return entry;
+}
+
+// False where the level has no more entries.
+bool SkipListReader::LoadNext(int number, int64_t interval, uint32_t document_count) {
+  Level& level = levels_[static_cast<size_t>(number)];
+  level.passed += interval;
+  if (level.passed > document_frequency_) return false;
+  const uint32_t before = level.entry.document;
+  const Entry& entry = Next(number);
+  if (entry.document >= document_count || entry.document < before) {
+    level.reader.Damaged(entry.offset, "skip entry leads from document " + std::to_string(before) + " to " +
+                                           std::to_string(entry.document) + " of " +
+                                           std::to_string(document_count));
+  }
+  return true;
+}
+
+// Moves a level to the place where the entry `from` of the level above leads.
+void SkipListReader::Descend(int number, const Entry& from, int64_t passed) {
+  Level& level = levels_[static_cast<size_t>(number)];
+  if (from.child > level.end - level.start) {
+    level.reader.Damaged(from.offset, "skip entry leads to byte " + std::to_string(from.child) +
+                                          " of a level of " + std::to_string(level.end - level.start));
+  }
+  level.reader.Seek(level.start + from.child);
+  level.entry = from;
+  level.entry.child = number > 0 ? level.reader.ReadVLong() : 0;
+  level.next = level.reader.offset();
+  level.passed = passed;
+}
+
+SkipListReader::Landing SkipListReader::SkipTo(int32_t target, int32_t document_count) {
+  Landing landing;
+  if (target <= 0) return landing;
+  int64_t interval = skip_interval_;
+  for (int number = 1; number < level_count_; ++number) {
+    interval *= skip_interval_;
+    const Level& level = levels_[static_cast<size_t>(number)];
+    if (level.start == level.end)
+      level.reader.Damaged(level.start, "level " + std::to_string(number) + " is empty");
+  }
+  for (int number = level_count_ - 1; number >= 0; --number, interval /= skip_interval_) {
+    Level& level = levels_[static_cast<size_t>(number)];
+    do {
+      landing.entry = level.entry;
+    } while (LoadNext(number, interval, static_cast<uint32_t>(document_count)) &&
+             static_cast<int64_t>(level.entry.document) < target);
+    const int64_t passed = level.passed - interval;
+    if (number == 0) {
+      landing.passed = static_cast<int32_t>(passed > 0 ? passed - 1 : 0);
+    } else if (landing.entry.child > 0) {
+      Descend(number - 1, landing.entry, passed);
+    }
+  }
+  return landing;
 }
 
 }  // namespace vantrel::elastic::format

@@ -32,8 +32,8 @@ class SkipListReader {
   struct Entry {
     uint64_t offset = 0;  // in the file
     uint32_t document = 0;
-    uint32_t postings_distance = 0;   // from the term's postings pointer, lower 32 bits
-    uint32_t positions_distance = 0;  // from its positions pointer, lower 32 bits
+    uint64_t postings_distance = 0;   // from the term's postings pointer; the lower 32 bits are certain
+    uint64_t positions_distance = 0;  // from its positions pointer, the same
     std::optional<uint32_t> payload_length;
     uint64_t child = 0;  // from the beginning of the level below
     uint64_t end = 0;    // of the entry without `child`, from the beginning of its level
@@ -43,6 +43,19 @@ class SkipListReader {
 
   // Moves before the first entry of each level of a term. Throws IndexDamagedError, IndexIoError, as does Next().
   void Seek(uint64_t pointer, int32_t document_frequency, bool has_payloads);
+
+  // Where a reader jumps to that looks for a document: behind the last place that lies before it.
+  struct Landing {
+    int32_t passed =
+        0;  // documents of the term; 0 where no jump is worth it, and all else is of no meaning then
+    Entry entry;
+  };
+
+  // Goes down the levels to the first document `target` or beyond, the way the index library does, entry by entry,
+  // and reads no others. To be called once after Seek(). Documents ascend and stay below `document_count`, and
+  // places in the level below lie in it: what the library reads on the way lies within the term's skip data, or the
+  // file.
+  Landing SkipTo(int32_t target, int32_t document_count);
 
   // How many levels the term has; 0 before the first Seek().
   int levels() const { return level_count_; }
@@ -64,14 +77,18 @@ class SkipListReader {
     uint64_t next = 0;
     uint64_t end = 0;
     Entry entry;
+    int64_t passed = 0;  // documents before the next entry's place, by SkipTo()
   };
 
+  bool LoadNext(int number, int64_t interval, uint32_t document_count);
+  void Descend(int number, const Entry& from, int64_t passed);
   int LevelsOf(int32_t document_frequency) const;
 
   std::shared_ptr<const ByteSource> source_;
   int32_t skip_interval_;
   int32_t most_levels_;
   bool has_payloads_ = false;
+  int32_t document_frequency_ = 0;
   int level_count_ = 0;
   std::vector<Level> levels_;
 };

@@ -92,10 +92,11 @@ void PostingsCheck::CompareSkip(const format::TermInfo& term, int level,
   RequireEqual(Grade::kUnsafe, file, entry.offset, "skip entry for document",
                static_cast<uint32_t>(postings_.document()), entry.document);
   RequireEqual(Grade::kUnsafe, file, entry.offset, "skip entry's distance in the postings",
-               static_cast<uint32_t>(postings_.offset() - term.postings_pointer), entry.postings_distance);
+               static_cast<uint32_t>(postings_.offset() - term.postings_pointer),
+               static_cast<uint32_t>(entry.postings_distance));
   const uint64_t positions = has_positions_ ? positions_->offset() - term.positions_pointer : 0;
   RequireEqual(Grade::kUnsafe, file, entry.offset, "skip entry's distance in the positions",
-               static_cast<uint32_t>(positions), entry.positions_distance);
+               static_cast<uint32_t>(positions), static_cast<uint32_t>(entry.positions_distance));
   if (!has_positions_ || level > 0 || !positions_->payload_length().has_value()) return;
   const uint32_t length = *positions_->payload_length();
   if (entry.payload_length.has_value()) {

@@ -17,6 +17,7 @@
 #include "elastic/format/file_names.h"
 #include "elastic/format/folder.h"
 #include "elastic/index/durable_file.h"
+#include "elastic/index/path_codecvt.h"
 
 namespace vantrel::elastic {
 namespace {
@@ -108,8 +109,7 @@ void SyncFile(const std::string& path) {
 }  // namespace
 
 DiskDirectory::DiskDirectory(const std::string& path)
-    : SimpleFSDirectory(StringUtils::toUnicode(path), Lucene::NoLockFactory::getNoLockFactory()),
-      path_(path) {}
+    : SimpleFSDirectory(ToWidePath(path), Lucene::NoLockFactory::getNoLockFactory()), path_(path) {}
 
 DiskDirectory::~DiskDirectory() = default;
 

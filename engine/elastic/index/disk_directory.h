@@ -29,7 +29,7 @@ namespace vantrel::elastic {
 // time, but for openInput and what comes from it.
 class DiskDirectory : public Lucene::SimpleFSDirectory {
  public:
-  // `path` is valid UTF-8. No lock factory is taken: the writer must hold our own lock, and the library's
+  // `path` is used byte for byte; PrepareIndexLibrary() must have been called. No lock factory is taken: the writer must hold our own lock, and the library's
   // keeps nobody out.
   explicit DiskDirectory(const std::string& path);
   ~DiskDirectory() override;

@@ -1,6 +1,7 @@
 #include "elastic/index/path_codecvt.h"
 
 #include <algorithm>
+#include <boost/filesystem/path.hpp>
 #include <string>
 #include <string_view>
 
@@ -62,5 +63,7 @@ PathCodecvt::result PathCodecvt::do_out(state_type&, const wchar_t* from, const 
   to_next = to;
   return outcome;
 }
+
+std::wstring ToWidePath(const std::string& bytes) { return boost::filesystem::path(bytes).wstring(); }
 
 }  // namespace vantrel::elastic

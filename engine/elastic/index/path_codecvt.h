@@ -2,6 +2,7 @@
 
 #include <cwchar>
 #include <locale>
+#include <string>
 
 namespace vantrel::elastic {
 
@@ -18,5 +19,9 @@ class PathCodecvt : public std::codecvt<wchar_t, char, std::mbstate_t> {
   bool do_always_noconv() const noexcept override { return false; }
   int do_max_length() const noexcept override { return 4; }
 };
+
+// A path, or a text with one in it, as the index library takes it: by that conversion, whose way back leads to the
+// same bytes. To be called after PrepareIndexLibrary().
+std::wstring ToWidePath(const std::string& bytes);
 
 }  // namespace vantrel::elastic

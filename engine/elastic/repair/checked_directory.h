@@ -12,7 +12,7 @@ namespace vantrel::elastic {
 // share them.
 class CheckedDirectory : public DiskDirectory {
  public:
-  // `path` is valid UTF-8; `condemned` holds names of segments, such as "_3".
+  // `path` is as DiskDirectory takes it; `condemned` holds names of segments, such as "_3".
   CheckedDirectory(const std::string& path, std::set<std::string> condemned);
 
   Lucene::IndexInputPtr openInput(const Lucene::String& name) override;

@@ -17,7 +17,6 @@
 
 #include "elastic/format/commit.h"
 #include "elastic/format/folder.h"
-#include "elastic/index/index_text.h"
 #include "elastic/index/manifest_keeper.h"
 #include "elastic/repair/checked_directory.h"
 #include "elastic/repair/checker_trial.h"
@@ -32,13 +31,6 @@ namespace {
 
 // How often a plan starts anew because there is a newer commit.
 constexpr int kMostTries = 10;
-
-void CheckPath(const std::string& path) {
-  std::wstring wide;
-  if (const char* problem = ToIndexText(path, wide)) {
-    throw IndexValueError(path, std::string("the path ") + problem);
-  }
-}
 
 // Throws where there is no commit to start from.
 format::Commit ReadNewestCommit(const std::string& path) {
@@ -145,7 +137,6 @@ class Checker {
 
 RepairReport RepairIndex(const std::string& path) {
   PrepareIndexLibrary();
-  CheckPath(path);
   ReadNewestCommit(path);
   std::optional<WriteLock> lock = TakeLockThatIsThere(path);
   if (!lock.has_value()) {
@@ -165,7 +156,6 @@ RepairReport RepairIndex(const std::string& path) {
 
 RepairReport PlanRepair(const std::string& path) {
   PrepareIndexLibrary();
-  CheckPath(path);
   for (int tries = 0; tries < kMostTries; ++tries) {
     RepairReport report = Checker(path).Report();
     // A writer takes away the files of the commit before.

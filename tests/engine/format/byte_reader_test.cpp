@@ -106,6 +106,27 @@ TEST(ByteReaderTest, ReportsTheEndOfTheFileWhereTheMissingBytesWouldBegin) {
                [&] { ByteReader(SourceOf("")).ReadByte(); });
 }
 
+TEST(ByteReaderTest, TellsTheEndOfTheFileFromOtherDamage) {
+  EXPECT_THROW(ByteReader(SourceOf("abc")).ReadInt(), EndOfFileError);
+  EXPECT_THROW(ByteReader(SourceOf("\x80")).ReadVInt(), EndOfFileError);
+  const auto throws_another = [](auto read) {
+    try {
+      read();
+    } catch (const EndOfFileError&) {
+      return false;
+    } catch (const IndexDamagedError&) {
+      return true;
+    }
+    return false;
+  };
+  EXPECT_TRUE(throws_another([] {
+    ByteReader(SourceOf("\x09"
+                        "abc"))
+        .ReadString();
+  }));
+  EXPECT_TRUE(throws_another([] { ByteReader(SourceOf("abc")).Skip(4); }));
+}
+
 TEST(ByteReaderTest, StaysUsableAfterAReadThatFailed) {
   ByteReader reader(SourceOf("\x01\x02\x03"));
   EXPECT_THROW(reader.ReadInt(), IndexDamagedError);

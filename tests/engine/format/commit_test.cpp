@@ -142,6 +142,7 @@ TEST(CommitTest, SaysWhichChecksumItFoundAndExpected) {
   bytes = CommitBytes(-9, {SegmentBytes{}});
   bytes[bytes.size() - 8] = 1;  // the upper half of the stored number must be 0
   ExpectDamage(bytes.size() - 8, "but the file says", [&] { Read(bytes); });
+  EXPECT_EQ(ReadCommit(SourceOf(bytes), 1, CommitChecksum::kPassOver).end, bytes.size());
 }
 
 TEST(CommitTest, RefusesCountsThatCannotBe) {

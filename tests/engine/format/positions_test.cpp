@@ -113,5 +113,14 @@ TEST(PositionsTest, RefusesInABlockWhatItRefusesInADocument) {
                [&] { ReaderOf(ByteWriter().VInt(5).VInt(1), false).PassBlock(reader); });
 }
 
+TEST(PositionsTest, TakesThePayloadLengthThatHoldsWhereItBegins) {
+  PositionsReader reader(SourceOf(ByteWriter().VInt(2).Raw("load").VInt(5).VInt(1).Raw("x").bytes()));
+  reader.Seek(0, true, 4);
+  reader.PassDocument(2);
+  EXPECT_EQ(reader.offset(), 8U);
+  reader.Seek(0, true);
+  ExpectDamage(0, "length of the term's first payload is not stated", [&] { reader.PassDocument(1); });
+}
+
 }  // namespace
 }  // namespace vantrel::elastic::format

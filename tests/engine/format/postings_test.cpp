@@ -91,5 +91,14 @@ TEST(PostingsTest, NoDocumentLiesInASegmentWithoutDocuments) {
   ExpectDamage(0, "posting lies 0 after document 0 of 0", [&] { reader.Next(); });
 }
 
+TEST(PostingsTest, GoesOnBehindSomeOfTheDocuments) {
+  PostingsReader reader(SourceOf(ByteWriter().VInt(11).VInt(21).VInt(7).bytes()), 100);
+  reader.Resume(1, 40, 2, false);
+  EXPECT_THAT(Walk(reader), ElementsAre(Pair(50, 1U), Pair(53, 1U)));
+  reader.Resume(2, 97, 1, false);
+  ExpectDamage(2, "posting lies 3 after document 97 of 100", [&] { reader.Next(); });
+  ExpectDamage(9, "past the end", [&] { reader.Resume(9, 0, 1, false); });
+}
+
 }  // namespace
 }  // namespace vantrel::elastic::format

@@ -84,5 +84,45 @@ TEST(SkipListTest, RefusesLevelsAndEntriesThatDoNotFit) {
                [] { ReaderOf(ByteWriter().VLong(2).VInt(1).VInt(1).VInt(1).VLong(1), 16, false).Next(1); });
 }
 
+// 16 documents, of which the level below has entries at the 4th, 8th, 12th and 16th, and the one above at the 16th:
+// documents 30, 70, 110 and 150, their postings 10 bytes each, their positions 20.
+ByteWriter TwoLevels() {
+  ByteWriter lower;
+  for (const int distance : {30, 40, 40, 40}) lower.VInt(distance).VInt(10).VInt(20);
+  const ByteWriter upper = ByteWriter().VInt(150).VInt(40).VInt(80).VLong(12);
+  return ByteWriter().VLong(upper.size()).Raw(upper.bytes()).Raw(lower.bytes());
+}
+
+TEST(SkipListTest, JumpsBehindTheLastEntryThatLiesBefore) {
+  const auto landing = [](int32_t target) { return ReaderOf(TwoLevels(), 17, false).SkipTo(target, 1000); };
+  EXPECT_EQ(landing(-5).passed, 0);
+  EXPECT_EQ(landing(0).passed, 0);
+  EXPECT_EQ(landing(30).passed, 0) << "the document itself may be that of the entry";
+  EXPECT_EQ(landing(31).passed, 3);
+  EXPECT_EQ(landing(31).entry.document, 30U);
+  EXPECT_EQ(landing(110).passed, 7);
+  EXPECT_EQ(landing(110).entry.postings_distance, 20U);
+  EXPECT_EQ(landing(150).passed, 11);
+  EXPECT_EQ(landing(150).entry.positions_distance, 60U);
+  EXPECT_EQ(landing(151).passed, 15);
+  EXPECT_EQ(landing(999).entry.document, 150U);
+  EXPECT_EQ(landing(999).entry.postings_distance, 40U);
+}
+
+TEST(SkipListTest, RefusesToBeLedAstray) {
+  const auto jump = [](const ByteWriter& bytes) { ReaderOf(bytes, 17, false).SkipTo(500, 1000); };
+  const auto two_levels = [](const ByteWriter& upper) {
+    return ByteWriter().VLong(upper.size()).Raw(upper.bytes()).VInt(30).VInt(1).VInt(1);
+  };
+  ExpectDamage(1, "from document 0 to 1000 of 1000",
+               [&] { jump(two_levels(ByteWriter().VInt(1000).VInt(1).VInt(1).VLong(3))); });
+  ExpectDamage(1, "to byte 4 of a level of 3",
+               [&] { jump(two_levels(ByteWriter().VInt(150).VInt(1).VInt(1).VLong(4))); });
+  ExpectDamage(1, "level 1 is empty", [&] { jump(two_levels(ByteWriter())); });
+  ExpectDamage(3, "from document 30 to 29 of 1000", [] {
+    ReaderOf(ByteWriter().VInt(30).VInt(1).VInt(1).VInt(-1).VInt(1).VInt(1), 8, false).SkipTo(500, 1000);
+  });
+}
+
 }  // namespace
 }  // namespace vantrel::elastic::format

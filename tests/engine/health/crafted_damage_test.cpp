@@ -3,11 +3,13 @@
 
 #include <gmock/gmock.h>
 #include <gtest/gtest.h>
+#include <sys/wait.h>
 
 #include <memory>
 #include <ostream>
 #include <string>
 
+#include "damage/run_tool.h"
 #include "support/byte_writer.h"
 #include "support/files.h"
 #include "support/library_index.h"
@@ -24,7 +26,9 @@ using ::quorelastic::testing::LibraryField;
 using ::quorelastic::testing::LibraryIndex;
 using ::quorelastic::testing::ListFolder;
 using ::quorelastic::testing::ReadFile;
+using ::quorelastic::testing::RunTool;
 using ::quorelastic::testing::TemporaryFolder;
+using ::quorelastic::testing::ToolRun;
 using ::quorelastic::testing::WriteFile;
 using Grade = HealthFinding::Grade;
 
@@ -50,6 +54,23 @@ void WriteSkips(const std::string& path) {
   LibraryIndex index(path, {.compound = false});
   for (int number = 0; number < 300; ++number)
     index.Add({{.name = "body", .value = "often", .stored = false}});
+}
+
+// The lookups of the real program in such an index, each of which must end in an answer or a report.
+void ExpectLookupsToEnd(const std::string& path) {
+  const auto expect_end = [&](const std::string& action, const std::string& token,
+                              const std::string& document) {
+    const ToolRun run = RunTool({"-a", action, "-d", path, "-f", "body", "-t", token, "-n", document});
+    EXPECT_TRUE(WIFEXITED(run.status) && WEXITSTATUS(run.status) == 0)
+        << action << " of " << token << " from " << document << " ends in signal " << WTERMSIG(run.status)
+        << "\n"
+        << run.output << run.errors;
+    EXPECT_EQ(run.output.find("bad_alloc"), std::string::npos) << action << " of " << token;
+    EXPECT_NE(run.output, "");
+  };
+  for (const char* token : {"alpha", "beta", "gamma", "often", "zeta"}) expect_end("position", token, "0");
+  for (const char* document : {"2", "17", "280"}) expect_end("position", "often", document);
+  for (const char* document : {"0", "1", "2", "3"}) expect_end("doc_term", "", document);
 }
 
 enum class Index { kSmall, kCompound, kSkips };
@@ -211,6 +232,16 @@ class CraftedDamageTest : public ::testing::TestWithParam<Craft> {
 
   std::string path() const { return folder_ / "index"; }
 
+  void Apply(const Craft& craft) const {
+    const std::string file = path() + "/" + FindFile(path(), craft.file);
+    std::string bytes = ReadFile(file);
+    ASSERT_LT(craft.offset, bytes.size());
+    const std::string before = bytes;
+    bytes.replace(craft.offset, craft.bytes.size(), craft.bytes);
+    ASSERT_NE(bytes, before);
+    WriteFile(file, bytes);
+  }
+
  private:
   static std::string Original(Index index) { return *originals_ / std::to_string(static_cast<int>(index)); }
 
@@ -223,13 +254,7 @@ INSTANTIATE_TEST_SUITE_P(Values, CraftedDamageTest, ::testing::ValuesIn(kCrafts)
 
 TEST_P(CraftedDamageTest, IsFoundInItsFileAndGraded) {
   const Craft& craft = GetParam();
-  const std::string file = path() + "/" + FindFile(path(), craft.file);
-  std::string bytes = ReadFile(file);
-  ASSERT_LT(craft.offset, bytes.size());
-  const std::string before = bytes;
-  bytes.replace(craft.offset, craft.bytes.size(), craft.bytes);
-  ASSERT_NE(bytes, before);
-  WriteFile(file, bytes);
+  ASSERT_NO_FATAL_FAILURE(Apply(craft));
   const HealthReport report = CheckIndexHealth(path());
   std::string seen;
   bool is_found = false;
@@ -240,6 +265,11 @@ TEST_P(CraftedDamageTest, IsFoundInItsFileAndGraded) {
         is_found || (finding.file.find(craft.found_in) != std::string::npos && finding.grade == craft.grade);
   }
   EXPECT_TRUE(is_found) << "not among\n" << seen;
+}
+
+TEST_P(CraftedDamageTest, LetsLookupsEnd) {
+  ASSERT_NO_FATAL_FAILURE(Apply(GetParam()));
+  ExpectLookupsToEnd(path());
 }
 
 // Commits, whose checksum would tell anything else.
@@ -259,6 +289,7 @@ class CraftedCommitTest : public ::testing::Test {
     std::string damaged = intact_.substr(0, intact_.size() - kChecksumLength);
     damaged.replace(offset, bytes.size(), bytes);
     WriteFile(name_, ByteWriter().Raw(damaged).Checksum().bytes());
+    ExpectLookupsToEnd(folder_.path());
     return CheckIndexHealth(folder_.path());
   }
 

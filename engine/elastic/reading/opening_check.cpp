@@ -1,0 +1,169 @@
+#include "elastic/reading/opening_check.h"
+
+#include <algorithm>
+#include <limits>
+#include <set>
+#include <utility>
+
+#include "elastic/format/byte_reader.h"
+#include "elastic/format/file_names.h"
+#include "elastic/reading/term_place.h"
+#include "vantrel/elastic/index_error.h"
+
+namespace vantrel::elastic::reading {
+namespace {
+
+using format::ByteReader;
+using format::SegmentInfo;
+
+// The newest versions that the library knows; it refuses newer ones before it reads on.
+constexpr int32_t kCommitFormat = -9;
+constexpr int32_t kFieldsFormat = -2;
+constexpr int32_t kTermsFormat = -4;
+
+// Runs the check of a file that the library will read in the same order: where the file ends too early, it will find
+// that out itself.
+template <typename Check>
+void ReadAlong(Check check) {
+  try {
+    check();
+  } catch (const format::EndOfFileError&) {
+  }
+}
+
+int32_t FirstInt(const std::shared_ptr<const format::ByteSource>& source) {
+  return ByteReader(source, sizeof(int32_t)).ReadInt();
+}
+
+// The library counts up from what it finds there.
+void CheckHint(const std::shared_ptr<const format::ByteSource>& source) {
+  constexpr int64_t kNewest = std::numeric_limits<int64_t>::max() / 2;
+  ByteReader reader(source, 20);
+  reader.ReadInt();
+  const int64_t generation = reader.ReadLong();
+  if (generation <= kNewest) return;
+  reader.Damaged(4, "generation " + std::to_string(generation) + " is too large");
+}
+
+void CheckSegment(const std::string& file, const SegmentInfo& segment) {
+  const auto refuse = [&](const std::string& problem) {
+    throw IndexDamagedError(file, 0, "segment " + segment.name + " has " + problem);
+  };
+  if (segment.store_offset < SegmentInfo::kOwnStore) {
+    refuse("its documents at " + std::to_string(segment.store_offset) + " in the document store");
+  }
+  if (!segment.norm_generations.has_value()) return;
+  for (const int64_t generation : *segment.norm_generations) {
+    if (generation < SegmentInfo::kNoOwnNorms) refuse("norms of generation " + std::to_string(generation));
+  }
+}
+
+bool IsStoreFile(const std::string& extension) {
+  return extension == ".tvx" || extension == ".tvd" || extension == ".tvf" || extension == ".fdx" ||
+         extension == ".fdt";
+}
+
+}  // namespace
+
+OpeningCheck::OpeningCheck(std::optional<WantedTerm> term) : term_(std::move(term)) {}
+
+OpenedSegment* OpeningCheck::FindSegment(const std::string& name) {
+  const auto found = std::find_if(segments_.begin(), segments_.end(),
+                                  [&](const auto& segment) { return segment.info.name == name; });
+  return found == segments_.end() ? nullptr : &*found;
+}
+
+std::vector<OpenedSegment> OpeningCheck::TakeSegments() {
+  current_ = nullptr;
+  return std::exchange(segments_, {});
+}
+
+void OpeningCheck::Check(const std::string& name, const Source& source) {
+  if (name == format::kSegmentsGen) return ReadAlong([&] { CheckHint(source); });
+  if (const auto generation = format::CommitGeneration(name)) {
+    return ReadAlong([&] { CheckCommit(source, *generation); });
+  }
+  const size_t dot = name.find('.');
+  if (dot == std::string::npos) return;
+  const std::string extension = name.substr(dot);
+  if (extension == ".cfs" || extension == ".fnm") current_ = FindSegment(name.substr(0, dot));
+  if (current_ == nullptr) return;
+  (IsStoreFile(extension) ? current_->plain_store : current_->plain)[extension] = source;
+  if (extension == ".cfs") {
+    CheckCompound(source);
+  } else if (extension == ".cfx") {
+    ReadAlong([&] { current_->store_compound.emplace(source); });
+  } else if (extension == ".fnm") {
+    ReadAlong([&] { CheckFields(source); });
+  } else if (extension == ".tis") {
+    ReadAlong([&] { CheckDictionary(source); });
+  } else if (extension == ".tii") {
+    ReadAlong([&] { CheckTermsIndex(source); });
+  } else if (extension == ".del") {
+    ReadAlong([&] {
+      current_->deletions = std::make_shared<format::Deletions>(source, current_->info.document_count);
+    });
+  }
+}
+
+void OpeningCheck::CheckCommit(const Source& source, int64_t generation) {
+  segments_.clear();
+  current_ = nullptr;
+  if (FirstInt(source) < kCommitFormat) return;
+  format::Commit commit = ReadCommit(source, generation, format::CommitChecksum::kPassOver);
+  std::set<std::string> names;
+  int64_t documents = 0;
+  for (const SegmentInfo& segment : commit.segments) {
+    CheckSegment(source->name(), segment);
+    documents += segment.document_count;
+    if (!names.insert(segment.name).second) {
+      throw IndexDamagedError(source->name(), 0, "segment " + segment.name + " is there twice");
+    }
+  }
+  if (documents > std::numeric_limits<int32_t>::max()) {
+    throw IndexDamagedError(source->name(), 0, std::to_string(documents) + " documents are too many");
+  }
+  segments_.reserve(commit.segments.size());
+  for (SegmentInfo& segment : commit.segments) segments_.push_back({.info = std::move(segment)});
+}
+
+// The library opens the files within on its own.
+void OpeningCheck::CheckCompound(const Source& source) {
+  ReadAlong([&] {
+    current_->compound.emplace(source);
+    if (const Source fields = current_->Core(".fnm")) CheckFields(fields);
+    if (const Source dictionary = current_->Core(".tis")) CheckDictionary(dictionary);
+    if (const Source index = current_->Core(".tii")) CheckTermsIndex(index);
+  });
+}
+
+void OpeningCheck::CheckFields(const Source& source) {
+  ByteReader start(source, 16);
+  if (start.remaining() == 0) return;
+  const auto format = static_cast<int32_t>(start.ReadVInt());
+  if (format < 0 && format != kFieldsFormat) return;
+  try {
+    current_->fields = format::ReadFieldInfos(source);
+  } catch (const format::EndOfFileError& error) {
+    if (format == kFieldsFormat) throw;
+    // The library would try again as if it were of a still older layout.
+    start.Damaged(error.offset(), "the fields go on past the end of the file");
+  }
+  const auto& generations = current_->info.norm_generations;
+  if (!generations.has_value() || generations->size() >= current_->fields.size()) return;
+  start.Damaged(0, std::to_string(current_->fields.size()) + " fields, but the commit has norms of " +
+                       std::to_string(generations->size()));
+}
+
+void OpeningCheck::CheckDictionary(const Source& source) const {
+  if (FirstInt(source) < kTermsFormat) return;
+  format::TermCursor(source, format::TermCursor::File::kDictionary,
+                     static_cast<uint32_t>(current_->fields.size()), current_->info.document_count);
+}
+
+void OpeningCheck::CheckTermsIndex(const Source& source) {
+  if (FirstInt(source) < kTermsFormat) return;
+  current_->place = FindPlace(source, current_->fields, current_->info.document_count, term_);
+}
+
+}  // namespace vantrel::elastic::reading

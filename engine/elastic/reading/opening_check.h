@@ -1,0 +1,46 @@
+#pragma once
+
+#include <memory>
+#include <optional>
+#include <string>
+#include <vector>
+
+#include "elastic/format/byte_source.h"
+#include "elastic/reading/opened_segment.h"
+
+namespace vantrel::elastic::reading {
+
+// Goes along while the index library opens an index, and checks of every file what the library is about to read of
+// it, before it does: the commit, the tables of compound files, field names, the dictionary's header, the whole index
+// over it, and deleted documents. Nothing else is read then.
+//
+// Only what the library could crash on, run astray on or take gigabytes for is refused. Where it finds out by itself
+// (a version that is too new, a wrong checksum, a file that is too short, a missing one), it is left to it. For one
+// thread at a time.
+class OpeningCheck {
+ public:
+  // The place of `term` in the dictionaries is noted on the way.
+  explicit OpeningCheck(std::optional<WantedTerm> term);
+
+  // Checks a file, by its name in the folder, that the library has asked for. Throws IndexError.
+  void Check(const std::string& name, const std::shared_ptr<const format::ByteSource>& source);
+
+  // The segments of the commit that was opened last, in its order, and what was opened of them. Empties the check.
+  std::vector<OpenedSegment> TakeSegments();
+
+ private:
+  using Source = OpenedSegment::Source;
+
+  void CheckCommit(const Source& source, int64_t generation);
+  void CheckFields(const Source& source);
+  void CheckDictionary(const Source& source) const;
+  void CheckTermsIndex(const Source& source);
+  void CheckCompound(const Source& source);
+  OpenedSegment* FindSegment(const std::string& name);
+
+  std::optional<WantedTerm> term_;
+  std::vector<OpenedSegment> segments_;
+  OpenedSegment* current_ = nullptr;  // the one that is being opened
+};
+
+}  // namespace vantrel::elastic::reading

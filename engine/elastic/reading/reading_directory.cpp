@@ -1,0 +1,43 @@
+#include "elastic/reading/reading_directory.h"
+
+#include <lucene++/NoLockFactory.h>
+
+#include <utility>
+
+#include "elastic/index/path_codecvt.h"
+#include "elastic/reading/library_error.h"
+#include "elastic/reading/source_input.h"
+
+namespace vantrel::elastic::reading {
+
+ReadingDirectory::ReadingDirectory(const std::string& path, std::optional<WantedTerm> term)
+    : SimpleFSDirectory(ToWidePath(path), Lucene::NoLockFactory::getNoLockFactory()),
+      path_(path),
+      check_(std::move(term)) {}
+
+Lucene::IndexInputPtr ReadingDirectory::openInput(const Lucene::String& name) {
+  return openInput(name, Lucene::BufferedIndexInput::BUFFER_SIZE);
+}
+
+Lucene::IndexInputPtr ReadingDirectory::openInput(const Lucene::String& name, int32_t /*buffer_size*/) {
+  ensureOpen();
+  const std::string own_name = Lucene::StringUtils::toUTF8(name);
+  const auto source = Open(own_name);
+  try {
+    check_.Check(own_name, source);
+  } catch (const IndexError& error) {
+    ThrowAsLibrary(error);
+  }
+  return Lucene::newLucene<SourceInput>(source);
+}
+
+std::shared_ptr<const format::ByteSource> ReadingDirectory::Open(const std::string& name) {
+  try {
+    if (!folder_.has_value()) folder_.emplace(path_);
+    return folder_->Open(name);
+  } catch (const IndexError& error) {
+    ThrowAsNotFound(error);
+  }
+}
+
+}  // namespace vantrel::elastic::reading

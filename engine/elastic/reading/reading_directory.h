@@ -1,0 +1,40 @@
+#pragma once
+
+#include <lucene++/LuceneHeaders.h>
+
+// Not without the headers above.
+#include <lucene++/SimpleFSDirectory.h>
+
+#include <optional>
+#include <string>
+#include <vector>
+
+#include "elastic/format/folder.h"
+#include "elastic/reading/opened_segment.h"
+#include "elastic/reading/opening_check.h"
+
+namespace vantrel::elastic::reading {
+
+// The folder of an index as the index library opens it to read: each file is checked when it is asked for, and what
+// the library then reads is the very file that was checked, whatever a writer does meanwhile. Nothing is created,
+// locked or changed. Exceptions are the library's own. For one thread at a time.
+class ReadingDirectory : public Lucene::SimpleFSDirectory {
+ public:
+  // `path` is used byte for byte. PrepareIndexLibrary() must have been called.
+  ReadingDirectory(const std::string& path, std::optional<WantedTerm> term);
+
+  // As OpeningCheck has them.
+  std::vector<OpenedSegment> TakeSegments() { return check_.TakeSegments(); }
+
+  Lucene::IndexInputPtr openInput(const Lucene::String& name) override;
+  Lucene::IndexInputPtr openInput(const Lucene::String& name, int32_t buffer_size) override;
+
+ private:
+  std::shared_ptr<const format::ByteSource> Open(const std::string& name);
+
+  std::string path_;
+  std::optional<format::DiskFolder> folder_;
+  OpeningCheck check_;
+};
+
+}  // namespace vantrel::elastic::reading

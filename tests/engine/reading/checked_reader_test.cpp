@@ -1,0 +1,159 @@
+// Lookups with a check beforehand against the index library alone, on indexes of every kind: they must say the same.
+
+#include "vantrel/elastic/checked_reader.h"
+
+#include <gtest/gtest.h>
+#include <lucene++/LuceneHeaders.h>
+#include <sys/wait.h>
+// Not without the headers above.
+#include <lucene++/TermFreqVector.h>
+#include <lucene++/TermPositions.h>
+
+#include <cstdlib>
+#include <string>
+#include <vector>
+
+#include "engine/health/health_shapes.h"
+#include "support/temporary_folder.h"
+#include "support/varied_index.h"
+#include "vantrel/elastic/library_setup.h"
+
+namespace quorelastic::testing {
+namespace {
+
+using Lucene::IndexReaderPtr;
+using Lucene::newLucene;
+using Lucene::String;
+using Lucene::StringUtils;
+using Lucene::TermPtr;
+using vantrel::elastic::CheckedReader;
+
+IndexReaderPtr OpenWithLibrary(const std::string& path) {
+  return Lucene::IndexReader::open(Lucene::FSDirectory::open(StringUtils::toUnicode(path)), true);
+}
+
+// A few hundred terms that are there, spread over the dictionaries, and some that are not.
+std::vector<TermPtr> TermsOf(const IndexReaderPtr& reader) {
+  constexpr int kMost = 150;
+  std::vector<TermPtr> all;
+  const Lucene::TermEnumPtr cursor = reader->terms();
+  while (cursor->next()) all.push_back(cursor->term());
+  std::vector<TermPtr> terms;
+  for (size_t i = 0; i < all.size(); i += 1 + all.size() / kMost) terms.push_back(all[i]);
+  for (const wchar_t* field : {L"a", L"body", L"often", L"zzz"}) {
+    for (const wchar_t* text : {L"", L"a~", L"every0", L"\U0001f601"})
+      terms.push_back(newLucene<Lucene::Term>(field, text));
+  }
+  return terms;
+}
+
+std::vector<int32_t> DocumentsOf(const IndexReaderPtr& reader) {
+  const int32_t end = reader->maxDoc();
+  std::vector<int32_t> documents = {0, 1, 15, 16, 17, end / 2, end - 17, end - 1, end, end + 9};
+  for (int32_t i = 31; i < end; i += 61) documents.push_back(i);
+  std::erase_if(documents, [](int32_t document) { return document < 0; });
+  return documents;
+}
+
+// What a lookup comes to, the error where there is one.
+template <typename Lookup>
+std::wstring Told(Lookup lookup) {
+  try {
+    return lookup();
+  } catch (const Lucene::LuceneException& error) {
+    return L"error: " + error.getError();
+  }
+}
+
+std::wstring TellPositions(const Lucene::TermPositionsPtr& positions, int32_t document) {
+  if (!positions->skipTo(document)) return L"no entry";
+  std::wstring told = std::to_wstring(positions->doc()) + L":";
+  for (int32_t i = 0; i < positions->freq(); ++i) told += L" " + std::to_wstring(positions->nextPosition());
+  return told;
+}
+
+std::wstring TellVector(const Lucene::TermFreqVectorPtr& vector) {
+  if (!vector) return L"none";
+  std::wstring told;
+  for (const String& term : vector->getTerms()) told += term + L"\n";
+  return told;
+}
+
+void ExpectSamePositions(const std::string& path, const IndexReaderPtr& library) {
+  for (const TermPtr& term : TermsOf(library)) {
+    const CheckedReader checked(path, term);
+    for (const int32_t document : DocumentsOf(library)) {
+      EXPECT_EQ(Told([&] { return TellPositions(checked.Positions(document), document); }),
+                Told([&] { return TellPositions(library->termPositions(term), document); }))
+          << StringUtils::toUTF8(term->toString()) << " from document " << document;
+    }
+  }
+}
+
+void ExpectSameVectors(const std::string& path, const IndexReaderPtr& library) {
+  const CheckedReader checked(path);
+  for (const auto& field : library->getFieldNames(Lucene::IndexReader::FIELD_OPTION_ALL)) {
+    for (const int32_t document : DocumentsOf(library)) {
+      EXPECT_EQ(Told([&] { return TellVector(checked.TermVector(document, field)); }),
+                Told([&] { return TellVector(library->getTermFreqVector(document, field)); }))
+          << StringUtils::toUTF8(field) << " of document " << document;
+    }
+  }
+  EXPECT_FALSE(checked.TermVector(-1, L"body"));
+  EXPECT_FALSE(checked.TermVector(0, L"no such field"));
+}
+
+void ExpectSame(const std::string& path) {
+  const IndexReaderPtr library = OpenWithLibrary(path);
+  ExpectSamePositions(path, library);
+  ExpectSameVectors(path, library);
+}
+
+class CheckedReaderTest : public ::testing::TestWithParam<HealthShape> {
+ protected:
+  void SetUp() override { vantrel::elastic::PrepareIndexLibrary(); }
+
+  TemporaryFolder folder_;
+};
+
+INSTANTIATE_TEST_SUITE_P(Shapes, CheckedReaderTest, ::testing::ValuesIn(HealthShapes()),
+                         [](const auto& test) { return test.param.name; });
+
+TEST_P(CheckedReaderTest, AnswersAsTheLibraryDoes) {
+  const HealthShape& shape = GetParam();
+  if (shape.older_layout == nullptr) {
+    WriteVariedIndex(folder_.path(), shape.index);
+  } else {
+    const std::string command =
+        std::string(CLUCENE_WRITER) + " '" + folder_.path() + "' " + shape.older_layout;
+    const int status = std::system(command.c_str());
+    ASSERT_TRUE(WIFEXITED(status) && WEXITSTATUS(status) == 0) << command;
+  }
+  ExpectSame(folder_.path());
+}
+
+// Three levels of skip data, with and without payloads.
+TEST(CheckedReaderSkipTest, JumpsAsTheLibraryDoes) {
+  vantrel::elastic::PrepareIndexLibrary();
+  const TemporaryFolder folder;
+  WriteVariedIndex(folder.path(),
+                   {.seed = 23, .documents = 4600, .documents_per_segment = 5000, .deletions = 300});
+  ExpectSame(folder.path());
+}
+
+// QUORELASTIC_HEALTHY_INDEXES makes it a longer campaign.
+TEST(CheckedReaderRandomTest, AnswersAsTheLibraryDoesOnAnyIndex) {
+  vantrel::elastic::PrepareIndexLibrary();
+  const char* setting = std::getenv("QUORELASTIC_HEALTHY_INDEXES");
+  const int indexes = setting == nullptr ? 12 : std::atoi(setting);
+  for (int i = 0; i < indexes; ++i) {
+    SCOPED_TRACE("seed " + std::to_string(31000 + i));
+    const TemporaryFolder folder;
+    WriteVariedIndex(folder.path(), RandomShape(static_cast<uint32_t>(31000 + i)));
+    ExpectSame(folder.path());
+    if (::testing::Test::HasFailure()) return;
+  }
+}
+
+}  // namespace
+}  // namespace quorelastic::testing
