@@ -84,6 +84,7 @@ void Connection::ReadPayload() {
   DisarmTimer();
   request_.resize(arrived_);
   if (finishing_) return RefuseRequest(service_.RefuseShuttingDown());
+  memory_use_.Note(request_.capacity());
   execution_ = service_.Begin(std::exchange(request_, std::string()));
   RunStep();
 }
@@ -122,6 +123,7 @@ void Connection::RunNextStep() {
 void Connection::WriteReply(std::string reply, bool finished) {
   if (!socket_.is_open()) return;
   reply_ = std::move(reply);
+  memory_use_.Note(reply_.capacity());
   header_ = quordaemon::EncodeHeader(static_cast<uint32_t>(reply_.size()));
   error_code error;
   written_ = socket_.write_some(std::array{asio::buffer(header_), asio::buffer(reply_)}, error);
@@ -154,6 +156,7 @@ void Connection::AfterReply(bool finished) {
   reply_.clear();
   if (reply_.capacity() > kReadPiece) reply_.shrink_to_fit();
   if (refused_) return Linger();
+  if (finished) memory_use_.GiveBack();
   finished ? ReadHeader() : RunNextStep();
 }
 

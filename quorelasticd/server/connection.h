@@ -7,6 +7,7 @@
 #include <memory>
 #include <string>
 
+#include "base/memory_use.h"
 #include "quordaemon/wire.h"
 #include "server/service.h"
 
@@ -79,6 +80,7 @@ class Connection : public std::enable_shared_from_this<Connection> {
   Clock::time_point deadline_ = Clock::time_point::max();
   Clock::time_point waiting_until_ = Clock::time_point::max();
 
+  MemoryUse memory_use_;  // of what follows
   quordaemon::Header header_{};
   uint32_t request_length_ = 0;
   size_t arrived_ = 0;
