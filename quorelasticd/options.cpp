@@ -41,7 +41,7 @@ po::options_description Describe(Options& options) {
       ("idle-timeout", Number(options.idle_timeout, "SECONDS"),
        "hang up on a client that asks for nothing")  //
       ("stall-timeout", Number(options.stall_timeout, "SECONDS"),
-       "hang up on a client that stops within a message")  //
+       "hang up on a client that stops within a message, or takes longer over it than that and 1 s/MiB")  //
       ("shutdown-timeout", Number(options.shutdown_timeout, "SECONDS"),
        "cut off requests that run on when the daemon is to end")  //
       ("search-timeout", Number(options.search_timeout, "SECONDS"),

@@ -161,6 +161,48 @@ TEST_F(ShortTimeoutsTest, AClientThatStopsWithinAMessageIsHungUpOn) {
   EXPECT_TRUE(client.IsHungUp());
 }
 
+TEST_F(ShortTimeoutsTest, AClientThatSendsAMessageByteByByteIsHungUpOn) {
+  for (const std::string& start : {std::string(), std::string("\0\0\x10\0{", 5)}) {
+    DaemonClient client = Connect();
+    ASSERT_EQ(send(client.descriptor(), start.data(), start.size(), MSG_NOSIGNAL),
+              static_cast<ssize_t>(start.size()));
+    const auto begin = steady_clock::now();
+    const auto give_up = begin + std::chrono::seconds(8);
+    // Never a stop of a second. Of a header, which is all zeros here, only three bytes can be late.
+    const auto pause = std::chrono::milliseconds(start.empty() ? 700 : 100);
+    while (send(client.descriptor(), "\0", 1, MSG_NOSIGNAL) == 1 && steady_clock::now() < give_up) {
+      std::this_thread::sleep_for(pause);
+    }
+    const auto held = steady_clock::now() - begin;
+    EXPECT_GT(held, std::chrono::milliseconds(800));
+    EXPECT_LT(held, std::chrono::milliseconds(2500)) << "sent before: " << start.size();
+  }
+}
+
+TEST_F(ShortTimeoutsTest, AClientThatReadsAMessageInDribletsIsHungUpOn) {
+  constexpr size_t kReply = size_t{2} << 20;
+  std::string words;
+  while (words.size() < kReply) words += "word ";
+  DaemonClient client = Connect();
+  ASSERT_EQ(client.AskForError(
+                R"({"command":"document_bulk","data":{"id":"books","documents":[{"id":"1","title":")" +
+                words + "\"}]}}"),
+            "");
+  ASSERT_TRUE(
+      client.Send(R"({"command":"search","data":{"indice":["books"],"query_string":{"query":"word"}}})"));
+  const auto begin = steady_clock::now();
+  size_t read = 0;
+  std::string droplet(4096, '\0');
+  for (;;) {
+    const ssize_t got = recv(client.descriptor(), droplet.data(), droplet.size(), 0);
+    if (got <= 0) break;
+    read += static_cast<size_t>(got);
+    std::this_thread::sleep_for(std::chrono::milliseconds(50));
+  }
+  EXPECT_GT(steady_clock::now() - begin, std::chrono::milliseconds(2500));  // a second, and one for each MiB
+  EXPECT_LT(read, kReply / 2);
+}
+
 TEST_F(ShortTimeoutsTest, AClientThatStopsReadingIsHungUpOn) {
   AddManyWords();
   DaemonClient client = Connect();
