@@ -179,30 +179,6 @@ TEST_F(ShortTimeoutsTest, AClientThatSendsAMessageByteByByteIsHungUpOn) {
   }
 }
 
-TEST_F(ShortTimeoutsTest, AClientThatReadsAMessageInDribletsIsHungUpOn) {
-  constexpr size_t kReply = size_t{2} << 20;
-  std::string words;
-  while (words.size() < kReply) words += "word ";
-  DaemonClient client = Connect();
-  ASSERT_EQ(client.AskForError(
-                R"({"command":"document_bulk","data":{"id":"books","documents":[{"id":"1","title":")" +
-                words + "\"}]}}"),
-            "");
-  ASSERT_TRUE(
-      client.Send(R"({"command":"search","data":{"indice":["books"],"query_string":{"query":"word"}}})"));
-  const auto begin = steady_clock::now();
-  size_t read = 0;
-  std::string droplet(4096, '\0');
-  for (;;) {
-    const ssize_t got = recv(client.descriptor(), droplet.data(), droplet.size(), 0);
-    if (got <= 0) break;
-    read += static_cast<size_t>(got);
-    std::this_thread::sleep_for(std::chrono::milliseconds(50));
-  }
-  EXPECT_GT(steady_clock::now() - begin, std::chrono::milliseconds(2500));  // a second, and one for each MiB
-  EXPECT_LT(read, kReply / 2);
-}
-
 TEST_F(ShortTimeoutsTest, AClientThatStopsReadingIsHungUpOn) {
   AddManyWords();
   DaemonClient client = Connect();
@@ -225,6 +201,35 @@ TEST_F(ShortTimeoutsTest, AClientThatReadsSlowlyIsServedToTheEnd) {
     if (++replies % 50 == 0) std::this_thread::sleep_for(std::chrono::milliseconds(500));
   } while (!reply.isMember("success"));
   EXPECT_EQ(reply["result"]["count"].asInt(), kManyWords + 1);
+}
+
+class TwoSecondStallTest : public ConnectionsTest {
+ protected:
+  TwoSecondStallTest() : ConnectionsTest({"--stall-timeout", "2"}) {}
+};
+
+TEST_F(TwoSecondStallTest, AClientThatReadsAMessageInDribletsIsHungUpOn) {
+  constexpr size_t kReply = size_t{2} << 20;
+  std::string words;
+  while (words.size() < kReply) words += "word ";
+  DaemonClient client = Connect();
+  ASSERT_EQ(client.AskForError(
+                R"({"command":"document_bulk","data":{"id":"books","documents":[{"id":"1","title":")" +
+                words + "\"}]}}"),
+            "");
+  ASSERT_TRUE(
+      client.Send(R"({"command":"search","data":{"indice":["books"],"query_string":{"query":"word"}}})"));
+  const auto begin = steady_clock::now();
+  size_t read = 0;
+  std::string droplet(16384, '\0');
+  while (read < kReply) {
+    const ssize_t got = recv(client.descriptor(), droplet.data(), droplet.size(), 0);
+    if (got <= 0) break;
+    read += static_cast<size_t>(got);
+    std::this_thread::sleep_for(std::chrono::milliseconds(50));
+  }
+  EXPECT_GT(steady_clock::now() - begin, std::chrono::milliseconds(2500));  // so it did not stop
+  EXPECT_LT(read, kReply);  // which would have taken more than six seconds
 }
 
 class FewConnectionsTest : public ConnectionsTest {
