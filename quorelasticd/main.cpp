@@ -76,7 +76,7 @@ int Serve(const Options& options) {
   Turns quick_searches(static_cast<int>(options.threads) - 1);
   boost::asio::thread_pool search_threads(threads);
   boost::asio::thread_pool slow_threads(threads);
-  IndexRegistry registry(root, slow_threads.get_executor());
+  IndexRegistry registry(root, slow_threads.get_executor(), static_cast<size_t>(options.max_open_indexes));
   Statistics statistics;
   const Daemon daemon(registry, statistics,
                       {plugins, quick_searches, search_threads.get_executor(), SearchTimeLimit(options)});
