@@ -78,7 +78,7 @@ int Serve(const Options& options) {
   Turns quick_searches(static_cast<int>(options.threads) - 1);
   boost::asio::thread_pool search_threads(threads);
   boost::asio::thread_pool slow_threads(threads);
-  IndexRegistry registry(root, slow_threads.get_executor());
+  IndexRegistry registry(root, slow_threads.get_executor(), static_cast<size_t>(options.max_open_indexes));
   Statistics statistics;
   Turns health_turns(kMostHealthRuns);
   const Daemon daemon(registry, statistics,

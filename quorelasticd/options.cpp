@@ -38,10 +38,12 @@ po::options_description Describe(Options& options) {
       ("threads", Number(options.threads, "N"),
        "threads for connections, as many for searches, and as many for writing")                //
       ("max-connections", Number(options.max_connections, "N"), "clients connected at a time")  //
+      ("max-open-indexes", Number(options.max_open_indexes, "N"),
+       "close indexes that nobody uses when more are open")  //
       ("idle-timeout", Number(options.idle_timeout, "SECONDS"),
        "hang up on a client that asks for nothing")  //
       ("stall-timeout", Number(options.stall_timeout, "SECONDS"),
-       "hang up on a client that stops within a message")  //
+       "hang up on a client that stops within a message, or takes longer over it than that and 1 s/MiB")  //
       ("shutdown-timeout", Number(options.shutdown_timeout, "SECONDS"),
        "cut off requests that run on when the daemon is to end")  //
       ("search-timeout", Number(options.search_timeout, "SECONDS"),
@@ -64,6 +66,7 @@ void Check(const Options& options) {
   constexpr int64_t kDay = int64_t{24} * 60 * 60;
   CheckRange<int64_t>("threads", options.threads, 1, 256);
   CheckRange<int64_t>("max-connections", options.max_connections, 1, 100000);
+  CheckRange<int64_t>("max-open-indexes", options.max_open_indexes, 1, 100000);
   CheckRange<int64_t>("idle-timeout", options.idle_timeout, 1, kDay);
   CheckRange<int64_t>("stall-timeout", options.stall_timeout, 1, kDay);
   CheckRange<int64_t>("shutdown-timeout", options.shutdown_timeout, 1, kDay);

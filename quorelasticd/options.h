@@ -17,6 +17,7 @@ struct Options {
   std::string plugins;  // a folder; empty for none
   int64_t threads = 4;
   int64_t max_connections = 256;
+  int64_t max_open_indexes = 100;
   int64_t idle_timeout = 300;  // seconds, as the two below
   int64_t stall_timeout = 30;
   int64_t shutdown_timeout = 60;

@@ -8,7 +8,9 @@
 // What the daemon takes at most. An error that a limit causes names it; docs/protocol.md lists them.
 namespace quorelasticd {
 
-inline constexpr int64_t kMostJsonDepth = 1000;         // levels; the parser's own limit
+inline constexpr int64_t kMostJsonDepth = 1000;  // levels of a request, or of a line of a bulk
+// Values of a request, or of a line of a bulk: each takes up to 200 bytes of memory, be it two bytes of text.
+inline constexpr int64_t kMostJsonValues = 2000000;
 inline constexpr int64_t kLongestRequestId = 256;       // bytes
 inline constexpr int64_t kMostIndexes = 1000;           // in the data folder
 inline constexpr int64_t kMostFields = 1000;            // of one index

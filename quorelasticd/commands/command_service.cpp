@@ -2,7 +2,6 @@
 
 #include <spdlog/spdlog.h>
 
-#include <new>
 #include <utility>
 
 #include "commands/reply.h"
@@ -32,11 +31,8 @@ class CommandExecution : public Execution {
   Step Run() override {
     try {
       return running_ == nullptr ? Begin() : Continue();
-    } catch (const std::bad_alloc&) {
-      running_.reset();
-      return {kLastResort, true};
     } catch (...) {
-      return Fail(ToRequestError());
+      return Fail();
     }
   }
 
@@ -63,23 +59,33 @@ class CommandExecution : public Execution {
     }
     running_.reset();  // lets go of its index before the client can know
     if (!outcome.failure.has_value()) return {replies_.Result(std::move(outcome.value)), true};
+    std::string reply = replies_.Partial(std::move(outcome.value), *outcome.failure);
     ++daemon_.statistics().failed_requests;
-    return {replies_.Partial(std::move(outcome.value), *outcome.failure), true};
+    return {std::move(reply), true};
+  }
+
+  // Called within a catch block. What the request held is let go first: where memory has run out, the reply may
+  // need some of it.
+  Step Fail() {
+    running_.reset();
+    try {
+      return Fail(ToRequestError());
+    } catch (...) {
+      ++daemon_.statistics().failed_requests;
+      return {kLastResort, true};
+    }
   }
 
   Step Fail(const RequestError& error) {
     running_.reset();
-    ++daemon_.statistics().failed_requests;
     const bool is_our_fault = error.code() == ErrorCode::kInternal || error.code() == ErrorCode::kIoError ||
                               error.code() == ErrorCode::kCorrupt;
     spdlog::log(is_our_fault ? spdlog::level::err : spdlog::level::debug, "{}: {}: {}",
                 command_ == nullptr ? "request" : command_->name.c_str(), ToText(error.code()),
                 error.reason());
-    try {
-      return {replies_.Error(error), true};
-    } catch (...) {
-      return {kLastResort, true};
-    }
+    std::string reply = replies_.Error(error);
+    ++daemon_.statistics().failed_requests;
+    return {std::move(reply), true};
   }
 
   const Daemon& daemon_;

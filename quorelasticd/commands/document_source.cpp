@@ -3,10 +3,10 @@
 #include <utility>
 
 #include "base/limits.h"
-#include "base/text.h"
+#include "base/memory_use.h"
+#include "commands/json_text.h"
 #include "data_root/import_file.h"
 #include "errors/request_error.h"
-#include "vantrel/elastic/json_value.h"
 
 namespace quorelasticd {
 namespace {
@@ -38,6 +38,7 @@ class ImportSource : public DocumentSource {
     for (;;) {
       const std::optional<ImportFile::Line> line = file_.Next();
       if (!line.has_value()) return std::nullopt;
+      memory_use_.Note(line->text.size());
       const bool is_blank = line->text.find_first_not_of(" \t\r") == std::string_view::npos;
       if (!is_blank || line->is_too_long) return ToItem(*line);
     }
@@ -52,18 +53,19 @@ class ImportSource : public DocumentSource {
   static Item ToItem(const ImportFile::Line& line) {
     Item item;
     item.position = line.number;
-    vantrel::elastic::JsonValue json;
     if (line.is_too_long) {
       item.problem = "the line is longer than " + std::to_string(kLongestImportLine) + " bytes";
-    } else if (FindInvalidUtf8(line.text) != std::string_view::npos) {
-      item.problem = "the line is no valid UTF-8";
-    } else if (!json.fromString(std::string(line.text))) {
-      item.problem = "the line is no JSON document";
+      return item;
     }
-    item.json.swap(json);
+    try {
+      item.json = ParseJson(std::string(line.text), "the line");
+    } catch (const RequestError& error) {
+      item.problem = error.reason();
+    }
     return item;
   }
 
+  MemoryUse memory_use_;  // of what follows
   ImportFile file_;
 };
 

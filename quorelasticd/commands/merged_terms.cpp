@@ -21,6 +21,7 @@ MergedTerms::MergedTerms(const std::string& path, bool live_only, TermSelection 
     : selection_(std::move(selection)), info_(vantrel::newClassInit<vantrel::elastic::IndexInfo>(path)) {
   for (int i = 0; i < info_->GetSegmentNum(); ++i) {
     Segment segment{info_->GetTermDict(i, live_only), {}};
+    if (selection_.field.has_value()) segment.terms->StartNear(*selection_.field, selection_.prefix);
     Advance(segment);
     if (segment.term) segments_.push_back(std::move(segment));
   }

@@ -1,11 +1,12 @@
 #pragma once
 
+#include <json/value.h>
+
 #include <optional>
 #include <string>
 
 #include "commands/command.h"
 #include "errors/request_error.h"
-#include "vantrel/elastic/json_value.h"
 
 namespace quorelasticd {
 

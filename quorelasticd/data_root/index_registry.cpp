@@ -2,6 +2,7 @@
 
 #include <spdlog/spdlog.h>
 
+#include <boost/asio/post.hpp>
 #include <boost/asio/strand.hpp>
 #include <filesystem>
 #include <stdexcept>
@@ -20,6 +21,18 @@ namespace {
 
 RequestError NotFound(const std::string& name) {
   return RequestError(ErrorCode::kIndexNotFound, "there is no index " + Quoted(name));
+}
+
+// Commits, on its writing turn, an index that nobody uses, so that it can be closed.
+void CommitLater(const std::shared_ptr<OpenIndex>& index) {
+  boost::asio::post(index->writing_turn(), [index] {
+    if (!index->has_changes()) return;
+    try {
+      Changes(index).Commit();
+    } catch (...) {
+      spdlog::error("index {}: cannot commit: {}", index->name(), ToRequestError().reason());
+    }
+  });
 }
 
 }  // namespace
@@ -43,18 +56,46 @@ class IndexRegistry::Reservation {
   std::string name_;
 };
 
-IndexRegistry::IndexRegistry(const DataRoot& root, boost::asio::any_io_executor slow_executor)
-    : root_(root), slow_executor_(std::move(slow_executor)) {}
+IndexRegistry::IndexRegistry(const DataRoot& root, boost::asio::any_io_executor slow_executor,
+                             size_t most_open)
+    : root_(root), slow_executor_(std::move(slow_executor)), most_open_(most_open) {}
 
 std::shared_ptr<OpenIndex> IndexRegistry::Use(const std::string& name) {
   const std::lock_guard lock(mutex_);
-  if (const auto found = open_.find(name); found != open_.end()) return found->second;
+  if (const auto found = open_.find(name); found != open_.end()) {
+    found->second.last_use = ++uses_;
+    return found->second.index;
+  }
   RequireUnreserved(name);
   auto index = vantrel::elastic::Index::Open(root_.IndexPath(name));
   const auto open =
       std::make_shared<OpenIndex>(name, std::move(index), boost::asio::make_strand(slow_executor_));
-  open_.emplace(name, open);
+  open_.emplace(name, Entry{open, ++uses_});
+  CloseIdle();
   return open;
+}
+
+// The mutex is held: nobody else can begin to use an index meanwhile.
+std::map<std::string, IndexRegistry::Entry>::iterator IndexRegistry::FindIdle(
+    const std::function<bool(const OpenIndex&)>& may) {
+  auto idle = open_.end();
+  for (auto entry = open_.begin(); entry != open_.end(); ++entry) {
+    if (entry->second.index.use_count() > 1 || !may(*entry->second.index)) continue;
+    if (idle == open_.end() || entry->second.last_use < idle->second.last_use) idle = entry;
+  }
+  return idle;
+}
+
+// What is not committed is committed first, and closed when the next index is opened.
+void IndexRegistry::CloseIdle() {
+  while (open_.size() > most_open_) {
+    const auto idle = FindIdle([](const OpenIndex& index) { return !index.is_needed(); });
+    if (idle == open_.end()) break;
+    open_.erase(idle);
+  }
+  if (open_.size() <= most_open_) return;
+  const auto changed = FindIdle([](const OpenIndex& index) { return index.has_changes(); });
+  if (changed != open_.end()) CommitLater(changed->second.index);
 }
 
 vantrel::elastic::IndexSettings IndexRegistry::Create(const std::string& name,
@@ -90,10 +131,10 @@ void IndexRegistry::RequireUnreserved(const std::string& name) const {
 std::shared_ptr<OpenIndex> IndexRegistry::TakeUnused(const std::string& name) {
   const auto found = open_.find(name);
   if (found == open_.end()) return nullptr;
-  if (found->second.use_count() > 1) {
+  if (found->second.index.use_count() > 1) {
     throw RequestError(ErrorCode::kLocked, "index " + Quoted(name) + " is in use by requests still running");
   }
-  std::shared_ptr<OpenIndex> taken = std::move(found->second);
+  std::shared_ptr<OpenIndex> taken = std::move(found->second.index);
   open_.erase(found);
   return taken;
 }
@@ -148,9 +189,9 @@ size_t IndexRegistry::open_count() const {
 bool IndexRegistry::CommitAll() {
   const std::lock_guard lock(mutex_);
   bool is_done = true;
-  for (const auto& [name, open] : open_) {
+  for (const auto& [name, entry] : open_) {
     try {
-      Changes(open).Commit();
+      Changes(entry.index).Commit();
     } catch (...) {
       is_done = false;
       spdlog::error("index {}: cannot commit: {}", name, ToRequestError().reason());

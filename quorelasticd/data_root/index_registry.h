@@ -1,6 +1,9 @@
 #pragma once
 
 #include <boost/asio/any_io_executor.hpp>
+#include <cstddef>
+#include <cstdint>
+#include <functional>
 #include <map>
 #include <memory>
 #include <mutex>
@@ -12,12 +15,13 @@
 
 namespace quorelasticd {
 
-// The indexes of a data root that are open: each is opened when it is first used, and once. For any thread.
-// Throws RequestError, what the engine throws, and std::system_error.
+// The indexes of a data root that are open: each is opened when it is first used, and once, and of those that
+// nobody uses any more only the last ones stay open. For any thread. Throws RequestError, what the engine throws, and std::system_error.
 class IndexRegistry {
  public:
-  // `slow_executor` runs what takes long. `root` must outlive the registry.
-  IndexRegistry(const DataRoot& root, boost::asio::any_io_executor slow_executor);
+  // `slow_executor` runs what takes long. Where more than `most_open` indexes are open, those are closed that have
+  // not been used for the longest time, but none that is in use. `root` must outlive the registry.
+  IndexRegistry(const DataRoot& root, boost::asio::any_io_executor slow_executor, size_t most_open);
   IndexRegistry(const IndexRegistry&) = delete;
   IndexRegistry& operator=(const IndexRegistry&) = delete;
 
@@ -54,14 +58,26 @@ class IndexRegistry {
   // Keeps a name from everybody else.
   class Reservation;
 
-  // For what follows, the mutex is held.
+  struct Entry {
+    std::shared_ptr<OpenIndex> index;
+    uint64_t last_use;  // the greater the later
+  };
+
+  // The one that nobody uses, and nobody has used for the longest time, of those that `may` is true for; the end
+  // where there is none.
+  std::map<std::string, Entry>::iterator FindIdle(const std::function<bool(const OpenIndex&)>& may);
+  void CloseIdle();
+
+  // For these, the mutex is held.
   void RequireUnreserved(const std::string& name) const;
   std::shared_ptr<OpenIndex> TakeUnused(const std::string& name);
 
   const DataRoot& root_;
   boost::asio::any_io_executor slow_executor_;
   mutable std::mutex mutex_;
-  std::map<std::string, std::shared_ptr<OpenIndex>> open_;
+  size_t most_open_;
+  std::map<std::string, Entry> open_;
+  uint64_t uses_ = 0;
   std::map<std::string, Reason> reserved_;
 };
 

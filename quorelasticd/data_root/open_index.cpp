@@ -21,6 +21,7 @@ void Changes::Commit() {
     }
   });
   open_->has_promised_ = false;
+  open_->has_changes_ = false;
 }
 
 void Changes::Promise() {
@@ -29,7 +30,7 @@ void Changes::Promise() {
 }
 
 void Changes::ReportBrokenPromise() {
-  if (!std::exchange(open_->has_broken_promise_, false)) return;
+  if (!open_->has_broken_promise_.exchange(false)) return;
   throw RequestError(
       ErrorCode::kIoError,
       "changes that earlier requests made without a commit have been lost by a failure; what was "
@@ -53,6 +54,7 @@ void Changes::NoteFailure() {
     return;  // nothing could be begun
   } catch (...) {
     ++open_->failures_;
+    open_->has_changes_ = false;
     if (std::exchange(open_->has_promised_, false)) open_->has_broken_promise_ = true;
   }
 }

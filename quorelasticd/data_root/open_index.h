@@ -1,5 +1,6 @@
 #pragma once
 
+#include <atomic>
 #include <boost/asio/any_io_executor.hpp>
 #include <cstdint>
 #include <memory>
@@ -24,6 +25,12 @@ class OpenIndex {
   const std::shared_ptr<vantrel::elastic::Index>& shared_index() const { return index_; }
   const boost::asio::any_io_executor& writing_turn() const { return writing_turn_; }
 
+  // Whether changes stand that are not committed. For any thread; settled as long as nobody else holds the index.
+  bool has_changes() const { return has_changes_; }
+
+  // Whether something would be forgotten if the index were closed now, and opened again. The same.
+  bool is_needed() const { return has_changes_ || has_broken_promise_; }
+
  private:
   friend class Changes;
 
@@ -31,10 +38,11 @@ class OpenIndex {
   std::shared_ptr<vantrel::elastic::Index> index_;
   boost::asio::any_io_executor writing_turn_;
 
-  // For the writing turn alone.
-  uint64_t failures_ = 0;            // how often the changes since the last commit were lost
-  bool has_promised_ = false;        // changes stand uncommitted whose request has been answered
-  bool has_broken_promise_ = false;  // such changes were lost, and nobody has been told
+  // Written on the writing turn alone.
+  uint64_t failures_ = 0;                        // how often the changes since the last commit were lost
+  bool has_promised_ = false;                    // changes stand uncommitted whose request has been answered
+  std::atomic<bool> has_broken_promise_{false};  // such changes were lost, and nobody has been told
+  std::atomic<bool> has_changes_{false};         // any that are not committed
 };
 
 // The changes that one request makes. When the disk fails under one request, the engine drops every change since
@@ -48,6 +56,7 @@ class Changes {
   template <typename Change>
   auto Apply(Change change) {
     CheckNothingLost();
+    open_->has_changes_ = true;
     try {
       return change(*open_->index_);
     } catch (...) {

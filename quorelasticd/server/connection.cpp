@@ -51,8 +51,11 @@ void Connection::ReadHeader() {
   if (finishing_ && !HasArrived()) return Close();
   awaiting_request_ = true;
   ArmTimer(timeouts_.idle);
-  const auto missing = [self = shared_from_this()](error_code error, size_t got) -> size_t {
-    if (!error && got > 0 && got < self->header_.size()) self->ArmTimer(self->timeouts_.stalled);
+  const auto missing = [self = shared_from_this(), has_begun = false](error_code error,
+                                                                      size_t got) mutable -> size_t {
+    if (!error && got > 0 && got < self->header_.size()) {
+      if (!std::exchange(has_begun, true)) self->BeginMessage(0);
+    }
     return error ? 0 : self->header_.size() - got;
   };
   asio::async_read(socket_, asio::buffer(header_), missing,
@@ -64,6 +67,7 @@ void Connection::ReadHeader() {
                        // What follows cannot be told apart from the next request any more.
                        return self->RefuseRequest(self->service_.RefuseTooLong());
                      }
+                     self->BeginMessage(self->request_length_);
                      self->arrived_ = 0;
                      self->request_.clear();
                      self->ReadPayload();
@@ -84,12 +88,13 @@ void Connection::ReadPayload() {
   DisarmTimer();
   request_.resize(arrived_);
   if (finishing_) return RefuseRequest(service_.RefuseShuttingDown());
+  memory_use_.Note(request_.capacity());
   execution_ = service_.Begin(std::exchange(request_, std::string()));
   RunStep();
 }
 
 void Connection::AwaitPayload() {
-  ArmTimer(timeouts_.stalled);
+  ArmMessageTimer();
   socket_.async_wait(Socket::wait_read, [self = shared_from_this()](error_code error) {
     error ? self->Close() : self->ReadPayload();
   });
@@ -122,6 +127,7 @@ void Connection::RunNextStep() {
 void Connection::WriteReply(std::string reply, bool finished) {
   if (!socket_.is_open()) return;
   reply_ = std::move(reply);
+  memory_use_.Note(reply_.capacity());
   header_ = quordaemon::EncodeHeader(static_cast<uint32_t>(reply_.size()));
   error_code error;
   written_ = socket_.write_some(std::array{asio::buffer(header_), asio::buffer(reply_)}, error);
@@ -131,7 +137,7 @@ void Connection::WriteReply(std::string reply, bool finished) {
 }
 
 void Connection::WriteRest(bool finished) {
-  ArmTimer(timeouts_.stalled);
+  BeginMessage(reply_.size());
   const size_t of_header = std::min(written_, header_.size());
   const std::array pieces{asio::buffer(header_) + of_header, asio::buffer(reply_) + (written_ - of_header)};
   asio::async_write(
@@ -139,7 +145,7 @@ void Connection::WriteRest(bool finished) {
       [self = shared_from_this(), last = size_t{0}](const error_code& error,
                                                     size_t written) mutable -> size_t {
         if (error) return 0;
-        if (written > last) self->ArmTimer(self->timeouts_.stalled);
+        if (written > last) self->ArmMessageTimer();
         last = written;
         return kReadPiece;
       },
@@ -154,6 +160,7 @@ void Connection::AfterReply(bool finished) {
   reply_.clear();
   if (reply_.capacity() > kReadPiece) reply_.shrink_to_fit();
   if (refused_) return Linger();
+  if (finished) memory_use_.GiveBack();
   finished ? ReadHeader() : RunNextStep();
 }
 
@@ -184,8 +191,22 @@ bool Connection::HasArrived() const {
   return !error && available > 0;
 }
 
-void Connection::ArmTimer(std::chrono::milliseconds limit) {
-  deadline_ = Clock::now() + limit;
+void Connection::BeginMessage(size_t length) {
+  const std::chrono::duration<double> at_slowest(static_cast<double>(length) /
+                                                 static_cast<double>(timeouts_.slowest));
+  message_end_ =
+      Clock::now() + timeouts_.stalled + std::chrono::duration_cast<std::chrono::milliseconds>(at_slowest);
+  ArmMessageTimer();
+}
+
+void Connection::ArmMessageTimer() {
+  ArmTimerUntil(std::min(Clock::now() + timeouts_.stalled, message_end_));
+}
+
+void Connection::ArmTimer(std::chrono::milliseconds limit) { ArmTimerUntil(Clock::now() + limit); }
+
+void Connection::ArmTimerUntil(Clock::time_point deadline) {
+  deadline_ = deadline;
   if (deadline_ < waiting_until_) WaitForDeadline();
 }
 

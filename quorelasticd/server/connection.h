@@ -4,9 +4,11 @@
 #include <boost/asio/local/stream_protocol.hpp>
 #include <boost/asio/steady_timer.hpp>
 #include <chrono>
+#include <cstddef>
 #include <memory>
 #include <string>
 
+#include "base/memory_use.h"
 #include "quordaemon/wire.h"
 #include "server/service.h"
 
@@ -15,8 +17,10 @@ namespace quorelasticd {
 struct ConnectionTimeouts {
   // Between two requests.
   std::chrono::milliseconds idle{std::chrono::minutes(5)};
-  // Within a message, either way, without progress.
+  // Within a message, either way, without progress. And what a message may take as a whole, beside the time that
+  // its length takes at the slowest speed: a client that goes on byte by byte must not hold its place for ever.
   std::chrono::milliseconds stalled{std::chrono::seconds(30)};
+  size_t slowest = size_t{1} << 20;  // bytes a second
   // For a client that was refused to hang up.
   std::chrono::milliseconds lingering{std::chrono::seconds(2)};
 };
@@ -47,6 +51,8 @@ class Connection : public std::enable_shared_from_this<Connection> {
   void Abort();
 
  private:
+  using Clock = std::chrono::steady_clock;
+
   void ReadHeader();
   void ReadPayload();
   void AwaitPayload();
@@ -63,7 +69,13 @@ class Connection : public std::enable_shared_from_this<Connection> {
   // Whether the client has sent something that is not read yet.
   bool HasArrived() const;
 
+  // A message of this many bytes, or what there is to it yet, begins to come or to go.
+  void BeginMessage(size_t length);
+  // To be called whenever some of it has come or gone.
+  void ArmMessageTimer();
+
   void ArmTimer(std::chrono::milliseconds limit);
+  void ArmTimerUntil(Clock::time_point deadline);
   void DisarmTimer();
   void WaitForDeadline();
   void Close();
@@ -74,11 +86,12 @@ class Connection : public std::enable_shared_from_this<Connection> {
 
   // What is under way is given up at the deadline. Deadlines move with every message, but seldom come: the timer is
   // set anew only where it would fire too late, and looks at the deadline when it fires.
-  using Clock = std::chrono::steady_clock;
   boost::asio::steady_timer timer_;
   Clock::time_point deadline_ = Clock::time_point::max();
   Clock::time_point waiting_until_ = Clock::time_point::max();
+  Clock::time_point message_end_;  // when the message under way is given up, whatever comes of it
 
+  MemoryUse memory_use_;  // of what follows
   quordaemon::Header header_{};
   uint32_t request_length_ = 0;
   size_t arrived_ = 0;

@@ -50,6 +50,11 @@ TEST_F(BadRequestsTest, EveryMalformedRequestGetsOneReplyAndTheConnectionGoesOn)
       {R"({"command":"commit","data":{"id":"../books"}})", "index_not_found"},
       {R"({"command":"commit","data":{"id":"books\u0000"}})", "index_not_found"},
       {R"({"command":"commit","data":{"id":"\udc00"}})", "bad_request"},
+      {R"(/* how is it? */ {"command":"status"})", "bad_request"},
+      {"\xef\xbb\xbf"
+       R"({"command":"status"})",
+       "bad_request"},
+      {R"({"command":"status","command":"status"})", "bad_request"},
       {deep, "limit_exceeded"},
       {R"({"command":)" + deep, "limit_exceeded"},
   };
@@ -136,17 +141,48 @@ rlim_t AddressSpace(pid_t pid) {
   return pages * 4096;
 }
 
+// An array of so many values, itself not counted.
+std::string EmptyArrays(int count) {
+  std::string text = "[[]";
+  for (int i = 1; i < count; ++i) text += ",[]";
+  return text + "]";
+}
+
 TEST_F(BadRequestsTest, RunningOutOfMemoryFailsTheRequestAndNotTheDaemon) {
   if (kIsSanitized) GTEST_SKIP() << "a sanitizer ends the process when memory runs out";
   DaemonClient client = Connect();
-  ASSERT_EQ(client.AskForError(R"({"command":"status"})"), "");
-  const rlim_t most = AddressSpace(daemon_.pid()) + (rlim_t{512} << 20);
+  const JsonValue before = client.Ask(R"({"command":"status"})");
+  const rlim_t most = AddressSpace(daemon_.pid()) + (rlim_t{128} << 20);
   const rlimit limit{most, most};
   ASSERT_EQ(prlimit(daemon_.pid(), RLIMIT_AS, &limit, nullptr), 0);
-  std::string request = R"({"command":"status","data":[[])";
-  while (request.size() < (size_t{60} << 20)) request += ",[]";
-  EXPECT_EQ(client.AskForError(request + "]}"), "internal");
-  EXPECT_EQ(client.AskForError(R"({"command":"status"})"), "");
+  const JsonValue reply =
+      client.Ask(R"({"command":"commit","request_id":"r","data":)" + EmptyArrays(1000000) + "}");
+  EXPECT_EQ(reply["error"]["code"].asString(), "internal");
+  EXPECT_EQ(reply["error"]["reason"].asString(), "out of memory");
+  EXPECT_EQ(reply["command"].asString(), "commit");
+  EXPECT_EQ(reply["request_id"].asString(), "r");
+  const JsonValue after = client.Ask(R"({"command":"status"})");
+  EXPECT_EQ(after["result"]["failed_requests"].asUInt(), before["result"]["failed_requests"].asUInt() + 1);
+}
+
+// Bytes of memory that a process holds.
+size_t Resident(pid_t pid) {
+  std::ifstream file("/proc/" + std::to_string(pid) + "/statm");
+  size_t all = 0;
+  size_t resident = 0;
+  file >> all >> resident;
+  return resident * 4096;
+}
+
+TEST_F(BadRequestsTest, MemoryOfALargeRequestIsGivenBack) {
+  if (kIsSanitized) GTEST_SKIP() << "a sanitizer keeps what was freed";
+  DaemonClient client = Connect();
+  ASSERT_EQ(client.AskForError(R"({"command":"status"})"), "");
+  const size_t before = Resident(daemon_.pid());
+  const std::string request = R"({"command":"status","data":)" + EmptyArrays(1000000) + "}";
+  for (int i = 0; i < 3; ++i) EXPECT_EQ(client.AskForError(request), "bad_request");
+  ASSERT_EQ(client.AskForError(R"({"command":"status"})"), "");  // the memory goes after a reply
+  EXPECT_LT(Resident(daemon_.pid()), before + (size_t{32} << 20));
 }
 
 TEST_F(BadRequestsTest, NoMoreIndexesThanTheLimit) {

@@ -211,6 +211,22 @@ TEST_F(CommandsTest, DocumentBulkReadsAFileOfTheImportFolder) {
   EXPECT_EQ(CountBooks(client_), 3);
 }
 
+TEST_F(CommandsTest, ALineOfABulkIsHeldToWhatARequestIs) {
+  std::string values = "[0";
+  for (int i = 2; i < 2000000; ++i) values += ",0";
+  WriteImport("strict", "{\"id\":\"1\",\"title\":" + values + "]}\n" +
+                            "{\"id\":\"2\",\"title\":" + std::string(1000, '[') + std::string(1000, ']') +
+                            "}\n" + "{\"id\":\"3\",\"id\":\"4\"}\n{\"id\":\"5\"} // so\n{\"id\":\"6\"}\n");
+  const JsonValue reply = Ask(R"({"command":"document_bulk","data":{"id":"books","file":"strict"}})");
+  EXPECT_EQ(reply["result"]["indexed"].asInt(), 1) << reply.toString();
+  const Json::Value& failures = reply["result"]["failures"];
+  ASSERT_EQ(failures.size(), 4u);
+  EXPECT_EQ(failures[0]["reason"].asString(), "json_values: at most 2000000 values");
+  EXPECT_EQ(failures[1]["reason"].asString(), "json_depth: at most 1000 levels");
+  EXPECT_NE(failures[2]["reason"].asString().find("Duplicate key: 'id'"), std::string::npos);
+  EXPECT_NE(failures[3]["reason"].asString().find("a comment"), std::string::npos);
+}
+
 TEST_F(CommandsTest, ALongImportTellsHowFarItIs) {
   std::string lines;
   for (int i = 0; i < 2500; ++i) lines += "{\"id\":\"" + std::to_string(i) + "\"}\n";

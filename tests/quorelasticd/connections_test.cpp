@@ -161,6 +161,24 @@ TEST_F(ShortTimeoutsTest, AClientThatStopsWithinAMessageIsHungUpOn) {
   EXPECT_TRUE(client.IsHungUp());
 }
 
+TEST_F(ShortTimeoutsTest, AClientThatSendsAMessageByteByByteIsHungUpOn) {
+  for (const std::string& start : {std::string(), std::string("\0\0\x10\0{", 5)}) {
+    DaemonClient client = Connect();
+    ASSERT_EQ(send(client.descriptor(), start.data(), start.size(), MSG_NOSIGNAL),
+              static_cast<ssize_t>(start.size()));
+    const auto begin = steady_clock::now();
+    const auto give_up = begin + std::chrono::seconds(8);
+    // Never a stop of a second. Of a header, which is all zeros here, only three bytes can be late.
+    const auto pause = std::chrono::milliseconds(start.empty() ? 700 : 100);
+    while (send(client.descriptor(), "\0", 1, MSG_NOSIGNAL) == 1 && steady_clock::now() < give_up) {
+      std::this_thread::sleep_for(pause);
+    }
+    const auto held = steady_clock::now() - begin;
+    EXPECT_GT(held, std::chrono::milliseconds(800));
+    EXPECT_LT(held, std::chrono::milliseconds(2500)) << "sent before: " << start.size();
+  }
+}
+
 TEST_F(ShortTimeoutsTest, AClientThatStopsReadingIsHungUpOn) {
   AddManyWords();
   DaemonClient client = Connect();
@@ -183,6 +201,35 @@ TEST_F(ShortTimeoutsTest, AClientThatReadsSlowlyIsServedToTheEnd) {
     if (++replies % 50 == 0) std::this_thread::sleep_for(std::chrono::milliseconds(500));
   } while (!reply.isMember("success"));
   EXPECT_EQ(reply["result"]["count"].asInt(), kManyWords + 1);
+}
+
+class TwoSecondStallTest : public ConnectionsTest {
+ protected:
+  TwoSecondStallTest() : ConnectionsTest({"--stall-timeout", "2"}) {}
+};
+
+TEST_F(TwoSecondStallTest, AClientThatReadsAMessageInDribletsIsHungUpOn) {
+  constexpr size_t kReply = size_t{2} << 20;
+  std::string words;
+  while (words.size() < kReply) words += "word ";
+  DaemonClient client = Connect();
+  ASSERT_EQ(client.AskForError(
+                R"({"command":"document_bulk","data":{"id":"books","documents":[{"id":"1","title":")" +
+                words + "\"}]}}"),
+            "");
+  ASSERT_TRUE(
+      client.Send(R"({"command":"search","data":{"indice":["books"],"query_string":{"query":"word"}}})"));
+  const auto begin = steady_clock::now();
+  size_t read = 0;
+  std::string droplet(16384, '\0');
+  while (read < kReply) {
+    const ssize_t got = recv(client.descriptor(), droplet.data(), droplet.size(), 0);
+    if (got <= 0) break;
+    read += static_cast<size_t>(got);
+    std::this_thread::sleep_for(std::chrono::milliseconds(50));
+  }
+  EXPECT_GT(steady_clock::now() - begin, std::chrono::milliseconds(2500));  // so it did not stop
+  EXPECT_LT(read, kReply);  // which would have taken more than six seconds
 }
 
 class FewConnectionsTest : public ConnectionsTest {

@@ -6,11 +6,13 @@
 #include <sys/un.h>
 #include <unistd.h>
 
+#include <algorithm>
 #include <atomic>
 #include <chrono>
 #include <csignal>
 #include <cstring>
 #include <filesystem>
+#include <iterator>
 #include <memory>
 #include <set>
 #include <string>
@@ -304,6 +306,47 @@ void EndUnderLoad(int signal, int expected_status) {
 TEST(Lifecycle, NothingAcknowledgedIsLostInAShutdownUnderLoad) { EndUnderLoad(SIGTERM, 0); }
 
 TEST(Lifecycle, NothingAcknowledgedIsLostInAKillUnderLoad) { EndUnderLoad(SIGKILL, -SIGKILL); }
+
+size_t CountDescriptors(pid_t pid) {
+  const fs::directory_iterator entries("/proc/" + std::to_string(pid) + "/fd");
+  return static_cast<size_t>(std::distance(fs::begin(entries), fs::end(entries)));
+}
+
+TEST(Lifecycle, MoreIndexesThanMayBeOpenAreAllServedWithFewDescriptors) {
+  const TemporaryFolder folder;
+  DaemonProcess daemon(folder.path(), {"--max-open-indexes", "5"});
+  constexpr int kIndexes = 60;
+  const auto name = [](int i) { return "\"x" + std::to_string(i) + "\""; };
+  const auto search = [&](DaemonClient& client, int i) {
+    return client.Ask(R"({"command":"search","data":{"indice":[)" + name(i) +
+                      R"(],"query_string":{"query":"word"}}})")["result"]["total"];
+  };
+  size_t most = 0;
+  DaemonClient client(daemon.socket());
+  for (int i = 0; i < kIndexes; ++i) {
+    ASSERT_EQ(client.AskForError(R"({"command":"index_create","data":{"id":)" + name(i) +
+                                 R"(,"settings":{"fields":[{"name":"t","type":"text"}]}}})"),
+              "");
+    // Every other one is left with a change that is not committed.
+    ASSERT_EQ(client.AskForError(R"({"command":"document_bulk","data":{"id":)" + name(i) +
+                                 R"(,"documents":[{"id":"1","t":"word"}]}})"),
+              "");
+    ASSERT_EQ(client.AskForError(R"({"command":"document_bulk","data":{"id":)" + name(i) +
+                                 R"(,"documents":[{"id":"2","t":"word"}],"commit":)" +
+                                 (i % 2 == 0 ? "true" : "false") + "}}"),
+              "");
+    EXPECT_GE(search(client, i), i % 2 == 0 ? 2 : 1);
+    most = std::max(most, CountDescriptors(daemon.pid()));
+  }
+  for (int i = 0; i < kIndexes; ++i) EXPECT_GE(search(client, i), i % 2 == 0 ? 2 : 1) << i;
+  most = std::max(most, CountDescriptors(daemon.pid()));
+  EXPECT_LT(most, 200U);
+  EXPECT_LT(client.Ask(R"({"command":"status"})")["result"]["open_indexes"], 12);
+  ASSERT_EQ(daemon.Stop(), 0);
+  DaemonProcess again(folder.path());
+  DaemonClient other(again.socket());
+  for (int i = 0; i < kIndexes; ++i) EXPECT_EQ(search(other, i), 2) << i;
+}
 
 }  // namespace
 }  // namespace quorelastic::testing

@@ -35,7 +35,7 @@ TEST(Options, HaveDefaults) {
 TEST(Options, AreTakenInBothForms) {
   const auto options =
       Parse({"--socket", "/s", "--data=/d", "--threads", "2", "--log-level=debug", "--max-connections", "3",
-             "--idle-timeout=4", "--stall-timeout=5", "--shutdown-timeout=6"});
+             "--idle-timeout=4", "--stall-timeout=5", "--shutdown-timeout=6", "--max-open-indexes", "7"});
   ASSERT_TRUE(options.has_value());
   EXPECT_EQ(options->socket, "/s");
   EXPECT_EQ(options->data, "/d");
@@ -45,6 +45,7 @@ TEST(Options, AreTakenInBothForms) {
   EXPECT_EQ(options->idle_timeout, 4);
   EXPECT_EQ(options->stall_timeout, 5);
   EXPECT_EQ(options->shutdown_timeout, 6);
+  EXPECT_EQ(options->max_open_indexes, 7);
 }
 
 TEST(Options, HelpAndVersionAreTextsOnly) {
@@ -52,7 +53,7 @@ TEST(Options, HelpAndVersionAreTextsOnly) {
   EXPECT_FALSE(Parse({"--help", "--threads", "0"}, &text).has_value());
   for (const char* option :
        {"--socket", "--data", "--threads", "--log-level", "--max-connections", "--idle-timeout",
-        "--stall-timeout", "--shutdown-timeout", "--help", "--version"}) {
+        "--stall-timeout", "--shutdown-timeout", "--max-open-indexes", "--help", "--version"}) {
     EXPECT_NE(text.find(option), std::string::npos) << option;
   }
   EXPECT_FALSE(Parse({"--version"}, &text).has_value());

@@ -77,6 +77,7 @@ TEST_F(ProtocolTables, EveryLimitIsDocumentedAsItIs) {
           row("message_bytes", quordaemon::kLongestMessage, "bytes of a request"),
           row("reply_bytes", quordaemon::kLongestMessage, "bytes of a reply"),
           row("json_depth", kMostJsonDepth, "levels of a request"),
+          row("json_values", kMostJsonValues, "values of a request"),
           row("connections", Options().max_connections, "at a time; an option of the daemon"),
           row("stored_indexes", kMostIndexes, "in the data folder"),
           row("request_id", kLongestRequestId, "bytes"),

@@ -3,9 +3,14 @@
 #include <signal.h>
 #include <sys/resource.h>
 
+#include <boost/asio/post.hpp>
 #include <boost/asio/thread_pool.hpp>
+#include <cerrno>
+#include <chrono>
 #include <filesystem>
 #include <future>
+#include <map>
+#include <memory>
 #include <string>
 #include <thread>
 #include <vector>
@@ -34,6 +39,8 @@ IndexSettings Settings() {
   return settings;
 }
 
+std::string Name(int number) { return std::string("x").append(std::to_string(number)); }
+
 class RegistryTest : public ::testing::Test {
  protected:
   ErrorCode Failure(const std::function<void()>& action) {
@@ -49,7 +56,8 @@ class RegistryTest : public ::testing::Test {
   TemporaryFolder folder_;
   DataRoot root_{folder_.path()};
   boost::asio::thread_pool threads_{2};
-  IndexRegistry registry_{root_, threads_.get_executor()};
+  static constexpr size_t kMostOpen = 4;
+  IndexRegistry registry_{root_, threads_.get_executor(), kMostOpen};
 };
 
 TEST_F(RegistryTest, AnIndexIsOpenedOnce) {
@@ -59,6 +67,77 @@ TEST_F(RegistryTest, AnIndexIsOpenedOnce) {
   EXPECT_EQ(registry_.Use("x"), first);
   EXPECT_EQ(registry_.open_count(), 1u);
   EXPECT_EQ(first->index().path(), root_.IndexPath("x"));
+}
+
+TEST_F(RegistryTest, WhatNobodyUsesIsClosedTheLongestUnusedFirst) {
+  const std::vector<std::string> names = {"a", "b", "c", "d", "e", "f"};
+  for (const std::string& name : names) registry_.Create(name, Settings());
+  std::map<std::string, std::weak_ptr<OpenIndex>> opened;
+  for (const char* name : {"a", "b", "c", "d"}) opened[name] = registry_.Use(name);
+  registry_.Use("a");
+  registry_.Use("e");
+  EXPECT_TRUE(opened["b"].expired());
+  EXPECT_FALSE(opened["a"].expired());
+  registry_.Use("f");
+  EXPECT_TRUE(opened["c"].expired());
+  EXPECT_FALSE(opened["a"].expired());
+  EXPECT_EQ(registry_.open_count(), kMostOpen);
+  EXPECT_EQ(registry_.Use("b")->name(), "b");
+  EXPECT_EQ(registry_.open_count(), kMostOpen);
+}
+
+TEST_F(RegistryTest, WhatIsUsedStaysOpenBeyondTheLimit) {
+  std::vector<std::shared_ptr<OpenIndex>> used;
+  for (int i = 0; i < 10; ++i) {
+    registry_.Create(Name(i), Settings());
+    used.push_back(registry_.Use(Name(i)));
+  }
+  EXPECT_EQ(registry_.open_count(), 10U);
+  EXPECT_EQ(registry_.Use("x0"), used[0]);
+  used.clear();
+  registry_.Create("y", Settings());
+  registry_.Use("y");
+  EXPECT_EQ(registry_.open_count(), kMostOpen);
+}
+
+TEST_F(RegistryTest, ChangesThatAreNotCommittedAreBeforeTheirIndexIsClosed) {
+  constexpr int kIndexes = 20;
+  for (int i = 0; i < kIndexes; ++i) {
+    registry_.Create(Name(i), Settings());
+    const auto open = registry_.Use(Name(i));
+    // Where an index is committed in its writing turn, it has to wait.
+    boost::asio::post(open->writing_turn(), std::packaged_task<void()>([open] {
+                        Changes changes(open);
+                        changes.Apply([](Index& index) { index.Update({{{"id", "1"}}}); });
+                        changes.Promise();
+                      }));
+  }
+  const auto give_up = std::chrono::steady_clock::now() + std::chrono::seconds(20);
+  while (registry_.open_count() > kMostOpen && std::chrono::steady_clock::now() < give_up) {
+    for (int i = 0; i < kIndexes; ++i) registry_.Use(Name(i));
+    std::this_thread::sleep_for(std::chrono::milliseconds(5));
+  }
+  EXPECT_EQ(registry_.open_count(), kMostOpen);
+  threads_.join();
+  registry_.CommitAll();
+  for (int i = 0; i < kIndexes; ++i) {
+    EXPECT_EQ(Index::Open(root_.IndexPath(Name(i)))->CountDocuments().live, 1U) << Name(i);
+  }
+}
+
+TEST_F(RegistryTest, ALossThatNobodyWasToldOfIsNotForgotten) {
+  for (const char* name : {"x", "a", "b", "c", "d", "e"}) registry_.Create(name, Settings());
+  {
+    const auto open = registry_.Use("x");
+    Changes changes(open);
+    changes.Apply([](Index& index) { index.Update({{{"id", "1"}}}); });
+    changes.Promise();
+    EXPECT_EQ(
+        Failure([&] { changes.Apply([](Index&) { throw IndexIoError("x", "the disk is gone", EIO); }); }),
+        ErrorCode::kIoError);
+  }
+  for (const char* name : {"a", "b", "c", "d", "e"}) registry_.Use(name);
+  EXPECT_EQ(Failure([&] { Changes(registry_.Use("x")).ReportBrokenPromise(); }), ErrorCode::kIoError);
 }
 
 TEST_F(RegistryTest, WhatIsNotThereIsNotFound) {

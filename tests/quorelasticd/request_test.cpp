@@ -5,6 +5,7 @@
 #include <set>
 #include <string>
 
+#include "base/limits.h"
 #include "commands/command_table.h"
 
 namespace quorelasticd {
@@ -85,6 +86,60 @@ TEST(Request, TooDeepJsonNamesTheLimit) {
   // Brackets within strings are none.
   const Request flat = ParseRequest(R"({"command":"\"[[[",)" + std::string(2000, '"'));
   EXPECT_EQ(flat.error->code(), ErrorCode::kBadRequest);
+}
+
+std::string Values(int64_t count) {
+  std::string text = "[0";
+  for (int64_t i = 1; i < count; ++i) text += ",0";
+  return text + "]";
+}
+
+TEST(Request, TooManyValuesNameTheLimit) {
+  constexpr int64_t kAround = 3;  // the request, the command and the array
+  const auto request = [](int64_t values) {
+    return ParseRequest(R"({"command":"commit","data":)" + Values(values - kAround) + "}");
+  };
+  EXPECT_EQ(request(kMostJsonValues).error->code(), ErrorCode::kBadRequest);
+  const Request refused = request(kMostJsonValues + 1);
+  EXPECT_EQ(refused.error->code(), ErrorCode::kLimitExceeded);
+  EXPECT_EQ(refused.error->details()["limit"].asString(), "json_values");
+}
+
+TEST(Request, WhatIsRefusedForItsSizeIsStillKnown) {
+  for (const std::string& data : {Values(kMostJsonValues), std::string(5000, '[') + std::string(5000, ']')}) {
+    for (const std::string& text :
+         {R"({"command":"commit","data":)" + data + R"(,"request_id":"r"})",
+          R"( { "data" : )" + data + R"( , "request_id":"r", "command":"commit"})"}) {
+      const Request request = ParseRequest(text);
+      EXPECT_EQ(request.error->code(), ErrorCode::kLimitExceeded);
+      ASSERT_NE(request.command, nullptr) << text.substr(0, 40);
+      EXPECT_EQ(request.command->name, "commit");
+      EXPECT_EQ(request.request_id.asString(), "r");
+    }
+  }
+  const Request unknown = ParseRequest(R"({"command":)" + Values(kMostJsonValues) + R"(,"request_id":"r"})");
+  EXPECT_EQ(unknown.command, nullptr);
+  EXPECT_TRUE(unknown.request_id.isNull());
+}
+
+TEST(Request, WhatIsJsonByCourtesyOnlyIsRefused) {
+  const struct {
+    const char* text;
+    const char* reason;
+  } cases[] = {
+      {R"({"command":"status"} // so)", "a comment, or a stray /, at byte 21 (counted from 0)"},
+      {R"(/* so */ {"command":"status"})", "a comment, or a stray /, at byte 0 (counted from 0)"},
+      {"\xef\xbb\xbf{\"command\":\"status\"}", "it begins with a byte order mark"},
+      {R"({"command":"status","command":"help"})", "Line 1, Column 21   Duplicate key: 'command'"},
+      {R"({"command":"commit","data":{"id":"a","id":"b"}})", "Line 1, Column 38   Duplicate key: 'id'"},
+  };
+  for (const auto& [text, reason] : cases) {
+    const Request request = ParseRequest(text);
+    ASSERT_TRUE(request.error.has_value()) << text;
+    EXPECT_EQ(request.error->code(), ErrorCode::kBadRequest);
+    EXPECT_EQ(request.error->reason(), std::string("the request is no JSON document: ") + reason);
+  }
+  EXPECT_FALSE(ParseRequest(R"({"command":"status","request_id":"// \u0041 \" /*"})").error.has_value());
 }
 
 TEST(Request, UnknownMembersAreRefused) {

@@ -132,8 +132,8 @@ TEST_F(ReliabilityFullDisk, WritersAreToldAndEverythingElseGoesOn) {
     ASSERT_EQ(Create("books"), "");
     ASSERT_EQ(Create("other"), "");
     ASSERT_EQ(Load("books", 10), "");
-    // What makes room in the end is at least twice what is written: a commit may merge all of that, which is
-    // written as files first and then once more as one.
+    // What makes room in the end is at least twice what is written, which is written as files first and then once
+    // more as one.
     const bool is_file = round % 2 == 0;
     for (int i = 0; i < (is_file ? 1 : 4); ++i) ASSERT_EQ(Load("other", is_file ? 100 : 1000), "");
     daemon().WriteBallast("ballast", (is_file ? 11 : 0) * kMebibyte);

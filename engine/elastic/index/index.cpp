@@ -150,6 +150,7 @@ class Index::Impl {
       throw;
     }
     has_changes_ = false;
+    MergeSegments();
   }
 
   // Decodes the newest commit within bounds: the library, which trusts its bytes, reads it next.
@@ -176,6 +177,16 @@ class Index::Impl {
       open_.emplace(path_, ReadSettings(path_));
     }
     return *open_;
+  }
+
+  // Everything is committed: a failure loses nobody anything. The segments stay as they are, and the next commit
+  // tries again, with another writer.
+  void MergeSegments() {
+    try {
+      writer_->MergeSegments();
+    } catch (...) {
+      writer_.reset();
+    }
   }
 
   template <typename Operation>

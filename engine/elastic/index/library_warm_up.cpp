@@ -5,12 +5,16 @@
 // Not without the headers above.
 #include <lucene++/SerialMergeScheduler.h>
 
+#include <chrono>
+#include <memory>
 #include <mutex>
 #include <vector>
 
 #include "elastic/index/text_analyzer.h"
 #include "elastic/search/hit_collector.h"
 #include "elastic/search/query_builder.h"
+#include "elastic/search/time_check.h"
+#include "elastic/search/timed_reader.h"
 
 namespace vantrel::elastic {
 namespace {
@@ -41,11 +45,11 @@ void WarmUp() {
   IndexSettings settings;
   settings.fields = {{.name = "text"}};
   const Lucene::IndexReaderPtr reader = WriteAndOpen(newLucene<Lucene::RAMDirectory>());
-  const auto searcher = newLucene<Lucene::IndexSearcher>(reader);
+  const auto time = std::make_shared<TimeCheck>(std::chrono::steady_clock::time_point::max());
+  const auto searcher = newLucene<Lucene::IndexSearcher>(newLucene<TimedReader>(reader, time));
   for (const char* query : {"one", "one two", "+one -two", "\"one two\"", "\"one three\"~5", "t*", "*o*",
                             "twi~", "[one TO two]", "*:*", "one AND (two OR three)^2"}) {
-    searcher->search(BuildQuery(query, settings, SearchLimits()).query,
-                     newLucene<HitCollector>(10, std::nullopt));
+    searcher->search(BuildQuery(query, settings, SearchLimits()).query, newLucene<HitCollector>(10, time));
   }
   reader->document(0);
   reader->reopen()->close();

@@ -20,6 +20,19 @@ constexpr double kBufferMegabytes = 64;
 
 }  // namespace
 
+// Merges on the caller's thread, as the library's background merges report failures to nobody; or not for now.
+class DeferrableMerges : public Lucene::SerialMergeScheduler {
+ public:
+  void set_deferred(bool deferred) { deferred_ = deferred; }
+
+  void merge(const Lucene::IndexWriterPtr& writer) override {
+    if (!deferred_) SerialMergeScheduler::merge(writer);
+  }
+
+ private:
+  bool deferred_ = false;
+};
+
 LibraryWriter::LibraryWriter(std::string folder, const WriteLock& /*lock*/, const IndexSettings& settings,
                              Start start)
     : folder_(std::move(folder)), manifest_(folder_) {
@@ -39,8 +52,8 @@ void LibraryWriter::Open(const IndexSettings& settings, Start start) {
   policy->setUseCompoundDocStore(settings.compound_files);
   policy->setNoCFSRatio(1.0);  // also for segments that make up most of the index
   writer_->setMergePolicy(policy);
-  // Merges on the caller's thread: the library's background merges report failures to nobody.
-  writer_->setMergeScheduler(newLucene<Lucene::SerialMergeScheduler>());
+  merges_ = newLucene<DeferrableMerges>();
+  writer_->setMergeScheduler(merges_);
   writer_->setRAMBufferSizeMB(kBufferMegabytes);
 }
 
@@ -61,7 +74,17 @@ void LibraryWriter::Optimize() {
 }
 
 void LibraryWriter::Commit() {
+  merges_->set_deferred(true);
   Run("cannot commit", [&] { writer_->commit(); });
+  merges_->set_deferred(false);
+  manifest_.Update();
+}
+
+void LibraryWriter::MergeSegments() {
+  Run("cannot merge segments", [&] {
+    writer_->maybeMerge();
+    writer_->commit();
+  });
   manifest_.Update();
 }
 

@@ -12,6 +12,8 @@
 
 namespace vantrel::elastic {
 
+class DeferrableMerges;
+
 // The index library's writer, in two steps from changes to a commit, with its failures turned into ours. Once
 // an operation has thrown, the writer is of no more use: every change since the last commit is lost. What is
 // not committed is dropped on destruction. For one thread at a time.
@@ -31,7 +33,12 @@ class LibraryWriter {
   void Update(const Lucene::TermPtr& term, const Lucene::DocumentPtr& document);
   void Delete(const Lucene::TermPtr& term);
   void Optimize();
+
+  // Leaves the merges that are due to MergeSegments(), so that no failure of theirs undoes what is committed.
   void Commit();
+
+  // Does the merges that are due, and commits them. To be called when nothing else waits for a commit.
+  void MergeSegments();
 
  private:
   // Runs an operation of the library; `purpose` says what cannot be done where it fails.
@@ -41,6 +48,7 @@ class LibraryWriter {
 
   std::string folder_;
   boost::shared_ptr<DiskDirectory> directory_;
+  boost::shared_ptr<DeferrableMerges> merges_;
   Lucene::IndexWriterPtr writer_;
   ManifestKeeper manifest_;
 };

@@ -15,12 +15,6 @@ void SetAll(Lucene::OpenBitSet& bits, const Lucene::TermDocsPtr& documents) {
   while (documents->next()) bits.set(static_cast<int64_t>(documents->doc()));
 }
 
-// The documents of a filter; null where there is none, as the library may say in two ways.
-Lucene::DocIdSetIteratorPtr Documents(const Lucene::FilterPtr& filter, const Lucene::IndexReaderPtr& reader) {
-  const Lucene::DocIdSetPtr kept = filter->getDocIdSet(reader);
-  return kept ? kept->iterator() : Lucene::DocIdSetIteratorPtr();
-}
-
 }  // namespace
 
 TermsFilter::TermsFilter(std::wstring field, std::vector<std::wstring> terms)
@@ -61,14 +55,24 @@ Lucene::DocIdSetPtr JudgedTermsFilter::getDocIdSet(const Lucene::IndexReaderPtr&
   return bits;
 }
 
-AllFilter::AllFilter(std::vector<Lucene::FilterPtr> filters) : filters_(std::move(filters)) {}
+AllFilter::AllFilter(std::vector<Lucene::FilterPtr> filters, std::shared_ptr<TimeCheck> time)
+    : filters_(std::move(filters)), time_(std::move(time)) {}
+
+Lucene::DocIdSetPtr AllFilter::Kept(const Lucene::FilterPtr& filter,
+                                    const Lucene::IndexReaderPtr& reader) const {
+  Lucene::DocIdSetPtr kept = filter->getDocIdSet(reader);
+  time_->LookAtClock();
+  return kept;
+}
 
 Lucene::DocIdSetPtr AllFilter::getDocIdSet(const Lucene::IndexReaderPtr& reader) {
-  if (filters_.size() == 1) return filters_.front()->getDocIdSet(reader);
+  if (filters_.size() == 1) return Kept(filters_.front(), reader);
   const auto bits = newLucene<Lucene::OpenBitSetDISI>(reader->maxDoc());
   bool is_first = true;
   for (const Lucene::FilterPtr& filter : filters_) {
-    const Lucene::DocIdSetIteratorPtr documents = Documents(filter, reader);
+    // That there is no document the library may say in two ways.
+    const Lucene::DocIdSetPtr kept = Kept(filter, reader);
+    const Lucene::DocIdSetIteratorPtr documents = kept ? kept->iterator() : Lucene::DocIdSetIteratorPtr();
     if (!documents) return Lucene::DocIdSetPtr();
     if (is_first) {
       bits->inPlaceOr(documents);

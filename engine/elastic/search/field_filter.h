@@ -6,8 +6,11 @@
 #include <lucene++/Filter.h>
 
 #include <functional>
+#include <memory>
 #include <string>
 #include <vector>
+
+#include "elastic/search/time_check.h"
 
 namespace vantrel::elastic {
 
@@ -40,15 +43,19 @@ class JudgedTermsFilter : public Lucene::Filter {
   Judge judge_;
 };
 
-// Keeps the documents that all of some filters keep; there is at least one.
+// Keeps the documents that all of some filters keep; there is at least one. How long each of them takes is up to
+// a plugin, so that the clock is looked at after each.
 class AllFilter : public Lucene::Filter {
  public:
-  explicit AllFilter(std::vector<Lucene::FilterPtr> filters);
+  AllFilter(std::vector<Lucene::FilterPtr> filters, std::shared_ptr<TimeCheck> time);
 
   Lucene::DocIdSetPtr getDocIdSet(const Lucene::IndexReaderPtr& reader) override;
 
  private:
+  Lucene::DocIdSetPtr Kept(const Lucene::FilterPtr& filter, const Lucene::IndexReaderPtr& reader) const;
+
   std::vector<Lucene::FilterPtr> filters_;
+  std::shared_ptr<TimeCheck> time_;
 };
 
 }  // namespace vantrel::elastic

@@ -12,9 +12,6 @@
 namespace vantrel::elastic {
 namespace {
 
-// How many documents are collected between two looks at the clock.
-constexpr uint64_t kDeadlineInterval = 1024;
-
 // Boosts within boosts can leave the range of a score; neither the order nor JSON could do with what comes of that.
 double FiniteScore(double score) {
   constexpr double kLargest = std::numeric_limits<float>::max();
@@ -29,8 +26,8 @@ bool IsBetter(const FoundDocument& a, const FoundDocument& b) {
 
 }  // namespace
 
-HitCollector::HitCollector(size_t most_kept, Deadline deadline)
-    : most_kept_(most_kept), deadline_(deadline) {}
+HitCollector::HitCollector(size_t most_kept, std::shared_ptr<TimeCheck> time)
+    : most_kept_(most_kept), time_(std::move(time)) {}
 
 std::vector<FoundDocument> HitCollector::TakeBest() {
   std::sort(heap_.begin(), heap_.end(), IsBetter);
@@ -42,7 +39,8 @@ void HitCollector::setScorer(const Lucene::ScorerPtr& scorer) { scorer_ = scorer
 void HitCollector::collect(int32_t document) {
   const FoundDocument found{FiniteScore(scorer_->score()), index_, document_base_ + document};
   max_score_ = total_ == 0 ? found.score : std::max(max_score_, found.score);
-  if (total_++ % kDeadlineInterval == 0) CheckDeadline();
+  ++total_;
+  time_->Step();
   if (heap_.size() < most_kept_) {
     heap_.push_back(found);
     std::push_heap(heap_.begin(), heap_.end(), IsBetter);
@@ -54,13 +52,8 @@ void HitCollector::collect(int32_t document) {
 }
 
 void HitCollector::setNextReader(const Lucene::IndexReaderPtr& /*reader*/, int32_t document_base) {
-  CheckDeadline();
+  time_->LookAtClock();
   document_base_ = document_base;
-}
-
-void HitCollector::CheckDeadline() const {
-  if (!deadline_.has_value() || std::chrono::steady_clock::now() < *deadline_) return;
-  boost::throw_exception(Lucene::TimeExceededException(L"the search took too long"));
 }
 
 }  // namespace vantrel::elastic

@@ -5,11 +5,12 @@
 // Not without the headers above.
 #include <lucene++/Collector.h>
 
-#include <chrono>
 #include <cstddef>
 #include <cstdint>
-#include <optional>
+#include <memory>
 #include <vector>
+
+#include "elastic/search/time_check.h"
 
 namespace vantrel::elastic {
 
@@ -24,10 +25,8 @@ struct FoundDocument {
 // earlier index, then the lower document number.
 class HitCollector : public Lucene::Collector {
  public:
-  using Deadline = std::optional<std::chrono::steady_clock::time_point>;
-
-  // After `deadline`, the library's TimeExceededException is thrown.
-  HitCollector(size_t most_kept, Deadline deadline);
+  // Each document that is found takes part in the time check.
+  HitCollector(size_t most_kept, std::shared_ptr<TimeCheck> time);
 
   // What is collected from now on is from this index.
   void SetIndex(size_t index) { index_ = index; }
@@ -44,10 +43,8 @@ class HitCollector : public Lucene::Collector {
   bool acceptsDocsOutOfOrder() override { return true; }
 
  private:
-  void CheckDeadline() const;
-
   size_t most_kept_;
-  Deadline deadline_;
+  std::shared_ptr<TimeCheck> time_;
   size_t index_ = 0;
   int32_t document_base_ = 0;
   Lucene::Scorer* scorer_ = nullptr;  // the library's, which calls with it

@@ -1,6 +1,7 @@
 #include "vantrel/elastic/search.h"
 
 #include <algorithm>
+#include <functional>
 #include <limits>
 #include <map>
 #include <set>
@@ -14,6 +15,8 @@
 #include "elastic/search/query_builder.h"
 #include "elastic/search/search_run.h"
 #include "elastic/search/stored_fields.h"
+#include "elastic/search/time_check.h"
+#include "elastic/search/timed_reader.h"
 #include "vantrel/elastic/index.h"
 #include "vantrel/elastic/index_error.h"
 #include "vantrel/elastic/search_error.h"
@@ -43,7 +46,7 @@ void CheckRequest(const SearchRequest& request, const SearchLimits& limits) {
 
 // Null where the request has no filter.
 Lucene::FilterPtr MakeFilter(const SearchRequest& request, const SearchPluginRegistry& plugins,
-                             const SearchPluginContext& context) {
+                             const SearchPluginContext& context, const std::shared_ptr<TimeCheck>& time) {
   std::vector<Lucene::FilterPtr> made;
   for (const SearchFilter& filter : request.filters) {
     if (filter.plugin.empty()) continue;
@@ -52,10 +55,10 @@ Lucene::FilterPtr MakeFilter(const SearchRequest& request, const SearchPluginReg
     made.push_back(plugin->MakeFilter(context, filter.data));
     if (!made.back()) throw PluginDataError(filter.plugin, "the plugin made no filter of its data");
   }
-  return made.empty() ? Lucene::FilterPtr() : newLucene<AllFilter>(made);
+  return made.empty() ? Lucene::FilterPtr() : newLucene<AllFilter>(made, time);
 }
 
-HitCollector::Deadline DeadlineOf(const SearchRequest& request) {
+TimeCheck::Deadline DeadlineOf(const SearchRequest& request) {
   using Clock = std::chrono::steady_clock;
   const auto now = Clock::now();
   if (request.time_limit.count() <= 0) return std::nullopt;
@@ -65,6 +68,9 @@ HitCollector::Deadline DeadlineOf(const SearchRequest& request) {
   return now + request.time_limit;
 }
 
+// What it takes to load a document, in documents looked at.
+constexpr uint32_t kLoadWeight = 128;
+
 class SearchRun {
  public:
   SearchRun(const std::vector<SearchedIndex>& indexes, const SearchRequest& request,
@@ -72,10 +78,11 @@ class SearchRun {
       : indexes_(indexes),
         request_(request),
         limits_(limits),
-        collector_(newLucene<HitCollector>(request.from + request.size, DeadlineOf(request))) {
+        time_(std::make_shared<TimeCheck>(DeadlineOf(request))),
+        collector_(newLucene<HitCollector>(request.from + request.size, time_)) {
     for (const SearchedIndex& index : indexes_) {
       queries_.push_back(BuildQuery(request.query, index.settings, limits));
-      filters_.push_back(MakeFilter(request, plugins, {index.settings, limits}));
+      filters_.push_back(MakeFilter(request, plugins, {index.settings, limits}, time_));
     }
   }
 
@@ -92,27 +99,31 @@ class SearchRun {
  private:
   void Collect() {
     std::vector<Lucene::IndexReaderPtr> readers;
-    for (const SearchedIndex& index : indexes_) readers.push_back(index.snapshot->reader());
-    const auto statistics = std::make_shared<CommonStatistics>(std::move(readers));
+    for (const SearchedIndex& index : indexes_) readers.push_back(Timed(index.snapshot->reader()));
+    const auto statistics = std::make_shared<CommonStatistics>(readers);
     const auto scale = newLucene<CommonScale>();
     for (size_t i = 0; i < indexes_.size(); ++i) {
-      const SearchedIndex& index = indexes_[i];
       collector_->SetIndex(i);
-      RunReading(index.path, index.snapshot->directory(), "cannot search", [&] {
-        const auto searcher = newLucene<CommonSearcher>(index.snapshot->reader(), statistics);
+      Read(indexes_[i], "cannot search", [&] {
+        const auto searcher = newLucene<CommonSearcher>(readers[i], statistics);
         searcher->setSimilarity(scale);
-        SearchWith(*searcher, queries_[i].query->weight(searcher), filters_[i]);
+        searcher->search(queries_[i].query->weight(searcher), filters_[i], collector_);
       });
     }
   }
 
-  void SearchWith(Lucene::IndexSearcher& searcher, const Lucene::WeightPtr& weight,
-                  const Lucene::FilterPtr& filter) const {
-    try {
-      searcher.search(weight, filter, collector_);
-    } catch (const Lucene::TimeExceededException&) {
-      throw SearchTimeoutError();
-    }
+  Lucene::IndexReaderPtr Timed(const Lucene::IndexReaderPtr& reader) const {
+    return time_->has_deadline() ? newLucene<TimedReader>(reader, time_) : reader;
+  }
+
+  static void Read(const SearchedIndex& index, const char* purpose, const std::function<void()>& operation) {
+    RunReading(index.path, index.snapshot->directory(), purpose, [&] {
+      try {
+        operation();
+      } catch (const Lucene::TimeExceededException&) {
+        throw SearchTimeoutError();
+      }
+    });
   }
 
   void Describe(SearchResult& result) const {
@@ -142,7 +153,8 @@ class SearchRun {
     for (size_t i = request_.from; i < best.size(); ++i) {
       const SearchedIndex& index = indexes_[best[i].index];
       SearchHit hit{best[i].index, "", best[i].score, {}};
-      RunReading(index.path, index.snapshot->directory(), "cannot load a document", [&] {
+      Read(index, "cannot load a document", [&] {
+        time_->Step(kLoadWeight);
         bytes += stored[best[i].index].Load(*index.snapshot->reader(), best[i].document, hit);
       });
       if (bytes > limits_.result_bytes) {
@@ -156,6 +168,7 @@ class SearchRun {
   const std::vector<SearchedIndex>& indexes_;
   const SearchRequest& request_;
   const SearchLimits& limits_;
+  std::shared_ptr<TimeCheck> time_;
   boost::shared_ptr<HitCollector> collector_;
   std::vector<UnderstoodQuery> queries_;    // by index
   std::vector<Lucene::FilterPtr> filters_;  // by index

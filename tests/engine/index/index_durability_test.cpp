@@ -270,5 +270,45 @@ TEST_F(IndexDurabilityTest, AMergeThatFailsKeepsTheCommitBefore) {
   EXPECT_THAT(DocumentsWith(path(), "body", "word19999"), ElementsAre(1));
 }
 
+// Words that no other document has.
+std::string OwnWords(int document) {
+  std::string text;
+  for (int i = 0; i < 2000; ++i) text += "own" + std::to_string(document * 2000 + i) + " ";
+  return text;
+}
+
+TEST_F(IndexDurabilityTest, AMergeThatACommitMakesDueAndThatFailsLosesNothing) {
+  constexpr int kCommits = 25;  // two of them make a merge due
+  {
+    const FileSizeLimit no_room_for_a_merge(200'000);
+    for (int i = 0; i < kCommits; ++i) {
+      index().Add(MakeDocument("new" + std::to_string(i), OwnWords(i)));
+      index().Commit();
+      EXPECT_EQ(Index::Open(path())->CountDocuments().live, static_cast<uint64_t>(i) + 2);
+    }
+    EXPECT_EQ(index().Statistics().segments, kCommits + 1U);  // so every merge has failed
+  }
+  index().Add(MakeDocument("last", "text"));
+  index().Commit();
+  EXPECT_LT(index().Statistics().segments, 10U);
+  EXPECT_EQ(index().Statistics().documents.live, kCommits + 2U);
+  for (int i = 0; i < kCommits; ++i) {
+    EXPECT_EQ(DocumentsWith(path(), "body", "own" + std::to_string(i * 2000)).size(), 1U) << i;
+  }
+}
+
+TEST_F(IndexDurabilityTest, MergesThatACommitMakesDueAreDoneAndDurable) {
+  for (int i = 0; i < 25; ++i) {
+    index().Add(MakeDocument("new" + std::to_string(i), "text"));
+    index().Commit();
+  }
+  EXPECT_LT(index().Statistics().segments, 10U);
+  for (const std::string& name : ListFolder(path())) {
+    if (name == "segments.gen" || name == "quorelastic.lock" || name == "quorelastic.json") continue;
+    if (name.starts_with("_0.")) continue;  // committed before the journal begins
+    EXPECT_THAT(journal, Contains("sync " + path() + "/" + name));
+  }
+}
+
 }  // namespace
 }  // namespace vantrel::elastic

@@ -103,7 +103,8 @@ class VANTREL_ELASTIC_EXPORT Index {
   void Optimize();
 
   // Makes every change durable and visible: once this has returned, a crash or a loss of power does not undo
-  // it. Without changes it does nothing. Where an earlier failure has lost changes, it commits nothing and throws
+  // it. Then merges segments where that is due; what fails of that is left to a later commit, and told nobody.
+  // Without changes it does nothing. Where an earlier failure has lost changes, it commits nothing and throws
   // IndexChangesLostError once; what was changed since then is committed by the next call.
   void Commit();
 

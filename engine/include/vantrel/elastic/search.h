@@ -56,8 +56,8 @@ struct SearchRequest {
   std::vector<SearchFilter> filters;                    // all of them have to let a document through
   std::optional<std::vector<std::string>> load_fields;  // stored fields to hand back; when nothing, all
 
-  // When the search gives up, counted from its begin; 0 is never. It is looked at as documents are found, not
-  // while a dictionary is walked.
+  // When the search gives up, counted from its begin; 0 is never. It is looked at while dictionaries and the
+  // documents of their terms are walked, also by the filters of plugins, and while hits are loaded.
   std::chrono::milliseconds time_limit{0};
 };
 
