@@ -24,7 +24,6 @@ namespace {
 
 using Lucene::newLucene;
 using Lucene::StringUtils;
-using ::testing::HasSubstr;
 using ::testing::StartsWith;
 using vantrel::elastic::CheckedReader;
 
