@@ -7,7 +7,7 @@
 namespace quorelasticd {
 
 void MemoryUse::GiveBack() {
-  constexpr size_t kLarge = size_t{1} << 20;
+  constexpr size_t kLarge = size_t{512} << 10;
   if (std::exchange(largest_, 0) >= kLarge) malloc_trim(0);
 }
 

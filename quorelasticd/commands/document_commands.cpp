@@ -69,18 +69,22 @@ class DocumentBulk : public RunningCommand {
   }
 
   void Add(const DocumentSource::Item& item) {
+    if (!item.problem.empty()) return NoteFailure(item.position, item.problem);
     try {
-      const vantrel::elastic::Document document = item.ToDocument();
-      changes_.Apply([&](Index& index) { index.Update(document); });
+      changes_.Apply([&](Index& index) { index.Update(item.document); });
       ++indexed_;
     } catch (...) {
       const RequestError error = ToRequestError();
       if (error.code() != ErrorCode::kBadRequest) throw error;
-      if (++failed_ > kFailuresReported) return;
-      Json::Value& failure = failures_.append(Json::objectValue);
-      failure["position"] = static_cast<Json::UInt64>(item.position);
-      failure["reason"] = error.reason();
+      NoteFailure(item.position, error.reason());
     }
+  }
+
+  void NoteFailure(uint64_t position, const std::string& reason) {
+    if (++failed_ > kFailuresReported) return;
+    Json::Value& failure = failures_.append(Json::objectValue);
+    failure["position"] = static_cast<Json::UInt64>(position);
+    failure["reason"] = reason;
   }
 
   void AddTallies(Json::Value& object) const {

@@ -1,6 +1,12 @@
 #include "commands/document_source.h"
 
+#include <condition_variable>
+#include <deque>
+#include <exception>
+#include <mutex>
+#include <thread>
 #include <utility>
+#include <vector>
 
 #include "base/limits.h"
 #include "base/memory_use.h"
@@ -11,15 +17,26 @@
 namespace quorelasticd {
 namespace {
 
+// Sets the item's document, or its problem.
+void Take(const Json::Value& json, DocumentSource::Item& item) {
+  try {
+    item.document = ToDocument(json);
+  } catch (const RequestError& error) {
+    item.problem = error.reason();
+  }
+}
+
 class InlineSource : public DocumentSource {
  public:
   explicit InlineSource(Json::Value documents) : documents_(std::move(documents)) {}
 
   std::optional<Item> Next() override {
     if (next_ >= documents_.size()) return std::nullopt;
+    Json::Value json;
+    json.swap(documents_[next_]);
     Item item;
-    item.json.swap(documents_[next_]);
     item.position = ++next_;
+    Take(json, item);
     return item;
   }
 
@@ -30,35 +47,39 @@ class InlineSource : public DocumentSource {
   Json::ArrayIndex next_ = 0;
 };
 
-class ImportSource : public DocumentSource {
+// The documents of a file, and how far one has read when one has them.
+class ImportReader {
  public:
-  ImportSource(const std::string& folder, const std::string& name) : file_(folder, name) {}
+  ImportReader(const std::string& folder, const std::string& name) : file_(folder, name) {}
 
-  std::optional<Item> Next() override {
+  struct Read {
+    DocumentSource::Item item;
+    uint64_t bytes_read = 0;
+    size_t size = 0;  // of the line
+  };
+
+  std::optional<Read> Next() {
     for (;;) {
       const std::optional<ImportFile::Line> line = file_.Next();
       if (!line.has_value()) return std::nullopt;
       memory_use_.Note(line->text.size());
       const bool is_blank = line->text.find_first_not_of(" \t\r") == std::string_view::npos;
-      if (!is_blank || line->is_too_long) return ToItem(*line);
+      if (!is_blank || line->is_too_long) return Read{ToItem(*line), file_.bytes_read(), line->text.size()};
     }
   }
 
-  void DescribeProgress(Json::Value& progress) const override {
-    progress["bytes"] = static_cast<Json::UInt64>(file_.bytes_read());
-    progress["total_bytes"] = static_cast<Json::UInt64>(file_.total_bytes());
-  }
+  uint64_t total_bytes() const { return file_.total_bytes(); }
 
  private:
-  static Item ToItem(const ImportFile::Line& line) {
-    Item item;
+  static DocumentSource::Item ToItem(const ImportFile::Line& line) {
+    DocumentSource::Item item;
     item.position = line.number;
     if (line.is_too_long) {
       item.problem = "the line is longer than " + std::to_string(kLongestImportLine) + " bytes";
       return item;
     }
     try {
-      item.json = ParseJson(std::string(line.text), "the line");
+      Take(ParseJson(std::string(line.text), "the line"), item);
     } catch (const RequestError& error) {
       item.problem = error.reason();
     }
@@ -69,12 +90,117 @@ class ImportSource : public DocumentSource {
   ImportFile file_;
 };
 
-}  // namespace
+// Parsing takes a good part of the time that indexing takes: each has a thread. They hand over whole batches, a few
+// of which may wait.
+class ImportSource : public DocumentSource {
+ public:
+  ImportSource(const std::string& folder, const std::string& name)
+      : reader_(folder, name), total_bytes_(reader_.total_bytes()) {}
+  ~ImportSource() override {
+    {
+      const std::lock_guard lock(mutex_);
+      is_given_up_ = true;
+    }
+    changed_.notify_all();
+    if (thread_.joinable()) thread_.join();
+  }
 
-vantrel::elastic::Document DocumentSource::Item::ToDocument() const {
-  if (!problem.empty()) throw RequestError(ErrorCode::kBadRequest, problem);
-  return quorelasticd::ToDocument(json);
-}
+  std::optional<Item> Next() override {
+    if (!thread_.joinable()) thread_ = std::thread([this] { ReadAhead(); });
+    if (next_ == batch_.read.size() && !TakeBatch()) return std::nullopt;
+    ImportReader::Read& read = batch_.read[next_++];
+    bytes_read_ = read.bytes_read;
+    return std::move(read.item);
+  }
+
+  void DescribeProgress(Json::Value& progress) const override {
+    progress["bytes"] = static_cast<Json::UInt64>(bytes_read_);
+    progress["total_bytes"] = static_cast<Json::UInt64>(total_bytes_);
+  }
+
+ private:
+  struct Batch {
+    std::vector<ImportReader::Read> read;
+    size_t bytes = 0;  // of the lines
+  };
+
+  static constexpr size_t kBatchDocuments = 100;
+  static constexpr size_t kBatchBytes = size_t{256} << 10;
+  static constexpr size_t kWaitingBytes = size_t{1} << 20;  // of batches; with so many, nothing is added
+
+  void ReadAhead() {
+    try {
+      while (HandOver(ReadBatch())) continue;
+    } catch (...) {
+      const std::lock_guard lock(mutex_);
+      failure_ = std::current_exception();
+    }
+    {
+      const std::lock_guard lock(mutex_);
+      is_over_ = true;
+    }
+    changed_.notify_all();
+  }
+
+  // Empty at the end of the file.
+  Batch ReadBatch() {
+    Batch batch;
+    while (batch.read.size() < kBatchDocuments && batch.bytes < kBatchBytes) {
+      std::optional<ImportReader::Read> read = reader_.Next();
+      if (!read.has_value()) break;
+      batch.bytes += read->size;
+      batch.read.push_back(std::move(*read));
+    }
+    return batch;
+  }
+
+  // False where no further one is wanted.
+  bool HandOver(Batch batch) {
+    if (batch.read.empty()) return false;
+    std::unique_lock lock(mutex_);
+    changed_.wait(lock, [&] { return is_given_up_ || waiting_bytes_ < kWaitingBytes; });
+    if (is_given_up_) return false;
+    waiting_bytes_ += batch.bytes;
+    waiting_.push_back(std::move(batch));
+    lock.unlock();
+    changed_.notify_all();
+    return true;
+  }
+
+  // False at the end. Throws what the reading threw.
+  bool TakeBatch() {
+    std::unique_lock lock(mutex_);
+    changed_.wait(lock, [&] { return is_over_ || !waiting_.empty(); });
+    if (waiting_.empty()) {
+      if (failure_ != nullptr) std::rethrow_exception(failure_);
+      return false;
+    }
+    batch_ = std::move(waiting_.front());
+    next_ = 0;
+    waiting_.pop_front();
+    waiting_bytes_ -= batch_.bytes;
+    lock.unlock();
+    changed_.notify_all();
+    return true;
+  }
+
+  ImportReader reader_;  // the thread's, from its start
+  const uint64_t total_bytes_;
+  uint64_t bytes_read_ = 0;
+  Batch batch_;  // what is being taken
+  size_t next_ = 0;
+
+  std::mutex mutex_;  // for what follows
+  std::condition_variable changed_;
+  std::deque<Batch> waiting_;
+  size_t waiting_bytes_ = 0;
+  std::exception_ptr failure_;
+  bool is_over_ = false;      // nothing more is handed over
+  bool is_given_up_ = false;  // nothing more is taken
+  std::thread thread_;
+};
+
+}  // namespace
 
 std::unique_ptr<DocumentSource> InlineDocuments(Json::Value documents) {
   return std::make_unique<InlineSource>(std::move(documents));

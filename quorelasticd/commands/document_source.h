@@ -16,11 +16,8 @@ class DocumentSource {
  public:
   struct Item {
     uint64_t position = 0;  // from 1: of the element, or of the line
-    Json::Value json;       // null where there is a problem
-    std::string problem;    // why there is no JSON value; empty where there is one
-
-    // Throws RequestError (bad_request).
-    vantrel::elastic::Document ToDocument() const;
+    vantrel::elastic::Document document;
+    std::string problem;  // why there is no document; empty where there is one
   };
 
   DocumentSource() = default;
@@ -38,7 +35,8 @@ class DocumentSource {
 // The elements of an array.
 std::unique_ptr<DocumentSource> InlineDocuments(Json::Value documents);
 
-// The lines of a file below `folder`, blank ones passed over. Throws like ImportFile.
+// The lines of a file below `folder`, blank ones passed over. While they are taken, a thread of its own reads on, some
+// way ahead. Throws like ImportFile.
 std::unique_ptr<DocumentSource> ImportedDocuments(const std::string& folder, const std::string& name);
 
 }  // namespace quorelasticd

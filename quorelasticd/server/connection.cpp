@@ -18,6 +18,9 @@ using boost::system::error_code;
 // How far a request's buffer runs ahead of the bytes that have arrived.
 constexpr size_t kReadPiece = size_t{64} << 10;
 
+// Replies whose own memory is worth giving back, beside that of what they were made of.
+constexpr size_t kLongReply = size_t{4} << 20;
+
 }  // namespace
 
 Connection::Connection(Socket socket, Service& service, const ConnectionTimeouts& timeouts)
@@ -112,7 +115,11 @@ void Connection::RunStep() {
 }
 
 void Connection::AfterStep(Execution::Step step) {
-  if (step.finished || !socket_.is_open()) execution_.reset();
+  if (step.finished || !socket_.is_open()) {
+    execution_.reset();
+    if (step.reply.has_value()) memory_use_.Note(step.reply->size());
+    memory_use_.GiveBack();  // before the reply goes out: its client may take its time to read it
+  }
   if (!socket_.is_open()) return;
   if (step.reply.has_value()) return WriteReply(std::move(*step.reply), step.finished);
   RunNextStep();
@@ -127,7 +134,7 @@ void Connection::RunNextStep() {
 void Connection::WriteReply(std::string reply, bool finished) {
   if (!socket_.is_open()) return;
   reply_ = std::move(reply);
-  memory_use_.Note(reply_.capacity());
+  if (reply_.size() >= kLongReply) memory_use_.Note(reply_.size());
   header_ = quordaemon::EncodeHeader(static_cast<uint32_t>(reply_.size()));
   error_code error;
   written_ = socket_.write_some(std::array{asio::buffer(header_), asio::buffer(reply_)}, error);
