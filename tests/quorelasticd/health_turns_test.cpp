@@ -28,7 +28,7 @@ class HealthTurnsTest : public ::testing::Test {
   quorelastic::testing::TemporaryFolder folder_;
   DataRoot root_{folder_.path()};
   boost::asio::thread_pool threads_{1};
-  IndexRegistry registry_{root_, threads_.get_executor()};
+  IndexRegistry registry_{root_, threads_.get_executor(), 10};
   Statistics statistics_;
   vantrel::elastic::SearchPluginRegistry plugins_;
   Turns searches_{1};
