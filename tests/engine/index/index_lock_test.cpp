@@ -162,7 +162,7 @@ TEST(IndexLockTest, OfTwoThatCreateAnIndexInOneFolderOneIsRefused) {
   const auto first = Index::Create(folder.path(), IdAndBody());
   EXPECT_THROW(Index::Create(folder.path(), IdAndBody()), IndexExistsError);
   // As if the first had not come further than its lock.
-  for (const char* name : {"segments_1", "segments.gen", "quorelastic.json"}) {
+  for (const char* name : {"segments_1", "segments.gen", "quorelastic.json", "quorelastic.manifest"}) {
     std::filesystem::remove(folder / name);
   }
   EXPECT_THROW(Index::Create(folder.path(), IdAndBody()), IndexLockedError);
