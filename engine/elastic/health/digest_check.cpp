@@ -52,9 +52,10 @@ void FileDigestCheck::Take(uint64_t offset, std::span<const uint8_t> bytes) {
     const uint64_t from = offset % kDigestBlock;
     const auto piece = bytes.first(std::min<uint64_t>(bytes.size(), kDigestBlock - from));
     const uint64_t to = from + piece.size();
-    if (auto [digest, done] = Claim(block, from, to); digest != nullptr) {
-      digest->Add(piece.subspan(done - from));
-      Return(block, to, std::move(digest));
+    Claimed claimed = Claim(block, from, to);
+    if (claimed.digest != nullptr) {
+      claimed.digest->Add(piece.subspan(claimed.done - from));
+      Return(block, to, std::move(claimed.digest));
     }
     offset += piece.size();
     bytes = bytes.subspan(piece.size());
@@ -62,11 +63,10 @@ void FileDigestCheck::Take(uint64_t offset, std::span<const uint8_t> bytes) {
 }
 
 // The digest of a block, if that can go on somewhere from `from` up to `to`, and up to where it is done.
-std::pair<FileDigestCheck::DigestPtr, uint64_t> FileDigestCheck::Claim(uint64_t block, uint64_t from,
-                                                                       uint64_t to) {
+FileDigestCheck::Claimed FileDigestCheck::Claim(uint64_t block, uint64_t from, uint64_t to) {
   const std::lock_guard lock(mutex_);
   const uint64_t done = done_[block];
-  if (done < from || done >= to) return {nullptr, 0};
+  if (done < from || done >= to) return {};
   DigestPtr digest = done == 0 ? std::make_unique<BlockDigest>() : std::move(begun_.extract(block).mapped());
   done_[block] = kUnderWay;
   return {std::move(digest), done};

@@ -7,7 +7,6 @@
 #include <span>
 #include <string>
 #include <unordered_map>
-#include <utility>
 #include <vector>
 
 #include "elastic/format/block_digest.h"
@@ -35,9 +34,13 @@ class FileDigestCheck {
 
  private:
   using DigestPtr = std::unique_ptr<format::BlockDigest>;
+  struct Claimed {
+    DigestPtr digest;   // of a block; empty where it cannot go on here
+    uint64_t done = 0;  // up to where, from the block's start
+  };
 
   uint64_t LengthOf(uint64_t block) const;
-  std::pair<DigestPtr, uint64_t> Claim(uint64_t block, uint64_t from, uint64_t to);
+  Claimed Claim(uint64_t block, uint64_t from, uint64_t to);
   void Return(uint64_t block, uint64_t to, DigestPtr digest);
   void FinishBlock(uint64_t block, std::vector<uint8_t>& buffer);
 
