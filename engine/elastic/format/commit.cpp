@@ -217,4 +217,10 @@ void UseNewestCommit(const Folder& folder, const std::function<void(Commit)>& us
   }
 }
 
+Commit ReadNewestCommit(const Folder& folder) {
+  Commit newest;
+  UseNewestCommit(folder, [&](Commit commit) { newest = std::move(commit); });
+  return newest;
+}
+
 }  // namespace vantrel::elastic::format

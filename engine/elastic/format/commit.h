@@ -96,4 +96,7 @@ int64_t ListedGeneration(const Folder& folder);
 // writer has replaced the commit meanwhile, the search begins again, else its exception passes on.
 void UseNewestCommit(const Folder& folder, const std::function<void(Commit)>& use);
 
+// The same for who needs no more than the commit.
+Commit ReadNewestCommit(const Folder& folder);
+
 }  // namespace vantrel::elastic::format

@@ -8,14 +8,17 @@
 
 #include "elastic/format/block_digest.h"
 #include "elastic/format/file_names.h"
+#include "elastic/format/quoted.h"
 #include "elastic/format/whole_segment.h"
 #include "vantrel/elastic/index_error.h"
 
 namespace vantrel::elastic::format {
 namespace {
 
-// Room for the digests of some ten terabytes.
-constexpr uint64_t kLargestManifest = uint64_t{256} << 20;
+// Whether a file of this name may be looked for in the folder.
+bool IsFileName(const std::string& name) {
+  return name.find('/') == std::string::npos && (name.starts_with('_') || CommitGeneration(name).has_value());
+}
 
 constexpr std::string_view kTitle = "quorelastic manifest ";
 constexpr std::string_view kVersion = "1";
@@ -31,6 +34,7 @@ class Lines {
   Lines(const std::string& path, std::string_view text) : path_(path), text_(text) {}
 
   bool at_end() const { return at_ == text_.size(); }
+  size_t offset() const { return at_; }
 
   void Expect(std::string_view word) {
     if (!text_.substr(at_).starts_with(word)) Refuse("\"" + std::string(word) + "\" is missing");
@@ -59,7 +63,10 @@ class Lines {
     at_ = start;
     Refuse("no number where one must be");
   }
-  [[noreturn]] void Refuse(const std::string& problem) const { throw IndexDamagedError(path_, at_, problem); }
+  [[noreturn]] void Refuse(const std::string& problem) const { Refuse(at_, problem); }
+  [[noreturn]] void Refuse(size_t offset, const std::string& problem) const {
+    throw IndexDamagedError(path_, offset, problem);
+  }
 
  private:
   const std::string& path_;
@@ -70,7 +77,9 @@ class Lines {
 Manifest::File ReadFileLine(Lines& lines) {
   Manifest::File file;
   lines.Expect("file ");
+  const size_t start = lines.offset();
   file.name = lines.Word();
+  if (!IsFileName(file.name)) lines.Refuse(start, Quoted(file.name) + " is no file of a commit");
   lines.Expect(" ");
   file.size = lines.TakeNumber<uint64_t>();
   while (lines.Passes(' ')) file.digests.push_back(lines.TakeNumber<uint64_t>(16));

@@ -49,6 +49,9 @@ struct Manifest {
 // A name that no file of the index library bears.
 inline constexpr const char* kManifestName = "quorelastic.manifest";
 
+// Room for the digests of more than a terabyte. A commit that needs more has no manifest.
+inline constexpr uint64_t kLargestManifest = uint64_t{24} << 20;
+
 std::string WriteManifest(const Manifest& manifest);
 
 // Decodes a manifest; nothing where it is whole, but of another version. Throws IndexDamagedError, IndexIoError, and

@@ -8,6 +8,9 @@ namespace {
 
 constexpr size_t kBufferSize = 4096;
 
+// Five numbers of up to 5, 5, 5, 5 and 9 bytes.
+constexpr uint64_t kLongestEntry = 29;
+
 }  // namespace
 
 SkipListReader::SkipListReader(std::shared_ptr<const ByteSource> source, int32_t skip_interval,
@@ -36,16 +39,28 @@ void SkipListReader::Seek(uint64_t pointer, int32_t document_frequency, bool has
     level.start = pointer;
     if (number > 0) {
       const uint64_t length = level.reader.ReadVLong();
-      if (length > level.reader.remaining()) {
-        level.reader.Damaged(pointer, "level " + std::to_string(number) + " of skip data takes " +
-                                          std::to_string(length) + " bytes, but the file ends at " +
-                                          std::to_string(level.reader.size()));
-      }
+      RequireLength(level.reader, pointer, number, length);
       level.start = level.reader.offset();
       level.end = level.start + length;
     }
     level.next = level.start;
     pointer = level.end;
+  }
+}
+
+// The index library takes the highest level into memory, however long it says to be.
+void SkipListReader::RequireLength(const ByteReader& reader, uint64_t pointer, int number,
+                                   uint64_t length) const {
+  auto entries = static_cast<uint64_t>(document_frequency_);
+  for (int level = 0; level <= number && skip_interval_ > 1; ++level)
+    entries /= static_cast<uint64_t>(skip_interval_);
+  const std::string what =
+      "level " + std::to_string(number) + " of skip data takes " + std::to_string(length);
+  if (length > reader.remaining()) {
+    reader.Damaged(pointer, what + " bytes, but the file ends at " + std::to_string(reader.size()));
+  }
+  if (length > entries * kLongestEntry) {
+    reader.Damaged(pointer, what + " bytes for " + std::to_string(entries) + " entries");
   }
 }
 
@@ -57,21 +72,35 @@ const SkipListReader::Entry& SkipListReader::Next(int number) {
   if (entry.offset >= level.end) {
     reader.Damaged(entry.offset, "level " + std::to_string(number) + " of skip data has too few entries");
   }
+  try {
+    ReadEntry(number);
+  } catch (const EndOfFileError&) {
+    // Where the length of a level is known, the index library does not look at the end of the file any more.
+    if (number == 0) throw;
+    reader.Damaged(entry.offset, "skip entry reaches past its level's end at " + std::to_string(level.end));
+  }
+  if (level.next > level.end) {
+    reader.Damaged(entry.offset, "skip entry reaches past its level's end at " + std::to_string(level.end));
+  }
+  return entry;
+}
+
+void SkipListReader::ReadEntry(int number) {
+  Level& level = levels_[static_cast<size_t>(number)];
+  ByteReader& reader = level.reader;
+  Entry& entry = level.entry;
   uint32_t distance = reader.ReadVInt();
   if (has_payloads_) {
     if ((distance & 1) != 0) entry.payload_length = reader.ReadVInt();
     distance >>= 1;
   }
   entry.document += distance;
-  entry.postings_distance += reader.ReadVInt();
-  entry.positions_distance += reader.ReadVInt();
+  // Signed, as the index library adds them.
+  entry.postings_distance += static_cast<uint64_t>(int64_t{static_cast<int32_t>(reader.ReadVInt())});
+  entry.positions_distance += static_cast<uint64_t>(int64_t{static_cast<int32_t>(reader.ReadVInt())});
   entry.end = reader.offset() - level.start;
   entry.child = number > 0 ? reader.ReadVLong() : 0;
   level.next = reader.offset();
-  if (level.next > level.end) {
-    reader.Damaged(entry.offset, "skip entry reaches past its level's end at " + std::to_string(level.end));
-  }
-  return entry;
 }
 
 // False where the level has no more entries.

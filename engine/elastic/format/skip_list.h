@@ -10,6 +10,9 @@
 
 namespace vantrel::elastic::format {
 
+// Dictionaries of this format and newer ones (smaller numbers) have skip data of the layout below.
+inline constexpr int32_t kFormatWithSkipLists = -2;
+
 // The skip data of a term, which lets a reader jump ahead in its postings (.frq, behind the term's documents).
 // With a skip interval of n, level 0 has an entry at each n-th document, level 1 at each n*n-th, and so on, as far
 // as the document frequency reaches and the dictionary's header allows. Layout:
@@ -80,6 +83,8 @@ class SkipListReader {
     int64_t passed = 0;  // documents before the next entry's place, by SkipTo()
   };
 
+  void RequireLength(const ByteReader& reader, uint64_t pointer, int number, uint64_t length) const;
+  void ReadEntry(int number);
   bool LoadNext(int number, int64_t interval, uint32_t document_count);
   void Descend(int number, const Entry& from, int64_t passed);
   int LevelsOf(int32_t document_frequency) const;

@@ -141,8 +141,9 @@ class CommitRun {
         if (!read.has_value() || !read->BelongsTo(folder, commit_)) return;
         found = std::move(*read);
         manifest_use_ = HealthReport::Manifest::kCompared;
-      } catch (const IndexDamagedError&) {
-        throw;
+      } catch (const IndexDamagedError& error) {
+        // No harm to the index library, which does not know the file.
+        Refuse(Grade::kDamaged, error.path(), error.offset(), "a manifest as it was written", "another one");
       } catch (const IndexError& error) {
         format::RethrowOpening(error);
       }

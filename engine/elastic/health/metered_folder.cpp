@@ -29,9 +29,8 @@ class MeteredSource : public format::ByteSource {
 }  // namespace
 
 void Meter::AddOpened(const format::ByteSource& file) {
-  opened_ += file.size();
   const std::lock_guard lock(opening_);
-  files_.insert(file.name());
+  if (files_.insert(file.name()).second) opened_ += file.size();
 }
 
 std::vector<std::string> Meter::TakeFiles() {

@@ -22,7 +22,11 @@ class Meter {
   void AddOpened(const format::ByteSource& file);
   void AddRead(uint64_t bytes);
 
-  void SetSegments(size_t segments) { segments_ = segments; }
+  // A commit of so many segments is begun.
+  void SetSegments(size_t segments) {
+    segments_ = segments;
+    segments_opened_ = 0;
+  }
   void AddSegmentOpened() { ++segments_opened_; }
 
   // The paths of what was opened since the last call, sorted.

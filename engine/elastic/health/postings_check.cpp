@@ -10,9 +10,6 @@ namespace {
 
 constexpr size_t kBufferSize = size_t{128} << 10;
 
-// Formats of the dictionary before this one had skip data of another kind, or none.
-constexpr int32_t kWithSkipLists = -2;
-
 }  // namespace
 
 PostingsCheck::PostingsCheck(const std::shared_ptr<const format::ByteSource>& postings,
@@ -21,7 +18,7 @@ PostingsCheck::PostingsCheck(const std::shared_ptr<const format::ByteSource>& po
     : postings_(postings, document_count, kBufferSize),
       skips_(postings, dictionary.skip_interval(), dictionary.most_skip_levels()),
       skip_interval_(dictionary.skip_interval()),
-      reads_skips_(dictionary.format() <= kWithSkipLists) {
+      reads_skips_(dictionary.format() <= format::kFormatWithSkipLists) {
   if (positions != nullptr) positions_.emplace(std::move(positions), kBufferSize);
 }
 

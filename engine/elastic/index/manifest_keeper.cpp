@@ -11,16 +11,11 @@
 namespace vantrel::elastic {
 namespace {
 
-format::Commit ReadNewestCommit(const format::Folder& folder) {
-  format::Commit newest;
-  format::UseNewestCommit(folder, [&](format::Commit commit) { newest = std::move(commit); });
-  return newest;
-}
-
 std::optional<format::Manifest> ReadOwnManifest(const format::Folder& folder) {
   try {
     auto manifest = format::ReadManifest(*folder.Open(format::kManifestName));
-    if (manifest.has_value() && manifest->BelongsTo(folder, ReadNewestCommit(folder))) return manifest;
+    if (manifest.has_value() && manifest->BelongsTo(folder, format::ReadNewestCommit(folder)))
+      return manifest;
   } catch (const IndexError&) {
     // None that could be relied on.
   }
@@ -42,7 +37,7 @@ void ManifestKeeper::Update() {
 
 void ManifestKeeper::Write() {
   const format::DiskFolder folder(folder_);
-  const format::Commit commit = ReadNewestCommit(folder);
+  const format::Commit commit = format::ReadNewestCommit(folder);
   if (manifest_.has_value() && manifest_->generation == commit.generation) return;
   format::Manifest next;
   next.generation = commit.generation;
@@ -50,7 +45,9 @@ void ManifestKeeper::Write() {
     const format::Manifest::File* known = manifest_.has_value() ? manifest_->Find(name) : nullptr;
     next.files.push_back(known != nullptr ? *known : format::DigestFile(folder, name));
   }
-  WriteFileDurably(folder_, format::kManifestName, format::WriteManifest(next));
+  const std::string text = format::WriteManifest(next);
+  if (text.size() > format::kLargestManifest) return;
+  WriteFileDurably(folder_, format::kManifestName, text);
   manifest_ = std::move(next);
 }
 

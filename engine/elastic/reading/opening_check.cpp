@@ -7,6 +7,8 @@
 
 #include "elastic/format/byte_reader.h"
 #include "elastic/format/file_names.h"
+#include "elastic/format/quoted.h"
+#include "elastic/format/text.h"
 #include "elastic/reading/term_place.h"
 #include "vantrel/elastic/index_error.h"
 
@@ -148,6 +150,13 @@ void OpeningCheck::CheckFields(const Source& source) {
     if (format == kFieldsFormat) throw;
     // The library would try again as if it were of a still older layout.
     start.Damaged(error.offset(), "the fields go on past the end of the file");
+  }
+  // Terms of a field whose name the library loses are compared, and end, elsewhere than by the name in the file.
+  for (const format::FieldInfo& field : current_->fields) {
+    if (!format::IsKeptText(field.name)) {
+      start.Damaged(field.offset,
+                    "the index library cannot keep the field name " + format::Quoted(field.name));
+    }
   }
   const auto& generations = current_->info.norm_generations;
   if (!generations.has_value() || generations->size() >= current_->fields.size()) return;

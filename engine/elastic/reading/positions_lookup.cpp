@@ -94,7 +94,10 @@ class SegmentLookup {
     postings_.Seek(info, field.omits_frequencies);
     positions_pointer_ = info.positions_pointer;
     payload_length_.reset();
-    if (info.document_frequency < dictionary_.skip_interval()) return;
+    // Of dictionaries before this format, the library reads no skip data.
+    if (dictionary_.format() > format::kFormatWithSkipLists ||
+        info.document_frequency < dictionary_.skip_interval())
+      return;
     RequireSkipLevels(info);
     format::SkipListReader skips(segment_.Core(".frq"), dictionary_.skip_interval(),
                                  dictionary_.most_skip_levels());

@@ -34,10 +34,7 @@ constexpr int kMostTries = 10;
 
 // Throws where there is no commit to start from.
 format::Commit ReadNewestCommit(const std::string& path) {
-  format::Commit newest;
-  format::UseNewestCommit(format::DiskFolder(path),
-                          [&](format::Commit commit) { newest = std::move(commit); });
-  return newest;
+  return format::ReadNewestCommit(format::DiskFolder(path));
 }
 
 // The lock, where it can be had without leaving a file: on an index that needs no repair, nothing is changed.

@@ -78,13 +78,15 @@ class TimedDocuments : public Lucene::TermPositions, public Lucene::LuceneObject
   std::shared_ptr<TimeCheck> time_;
 };
 
-// The positions themselves are left out: those of one document are few enough.
 class TimedPositions : public TimedDocuments {
  public:
   TimedPositions(const Lucene::TermPositionsPtr& positions, std::shared_ptr<TimeCheck> time)
-      : TimedDocuments(positions, std::move(time)), positions_(positions.get()) {}
+      : TimedDocuments(positions, time), positions_(positions.get()), time_(std::move(time)) {}
 
-  int32_t nextPosition() override { return positions_->nextPosition(); }
+  int32_t nextPosition() override {
+    time_->Step();
+    return positions_->nextPosition();
+  }
   int32_t getPayloadLength() override { return positions_->getPayloadLength(); }
   Lucene::ByteArray getPayload(Lucene::ByteArray data, int32_t offset) override {
     return positions_->getPayload(std::move(data), offset);
@@ -93,6 +95,7 @@ class TimedPositions : public TimedDocuments {
 
  private:
   Lucene::TermPositions* positions_;  // which the other class holds
+  std::shared_ptr<TimeCheck> time_;
 };
 
 }  // namespace

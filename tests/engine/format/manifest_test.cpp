@@ -94,6 +94,9 @@ TEST(ManifestTest, RefusesWhatItsWriterWouldNotWrite) {
   refuses("commit 9223372036854775808\n", 30, "no number where one must be");
   refuses("commit 2\nfolder\n", 32, "\"file \" is missing");
   refuses("commit 2\nfile  1\n", 37, "a word is missing");
+  refuses("commit 2\nfile ../_0.frq 0\n", 37, "is no file of a commit");
+  refuses("commit 2\nfile _0/.frq 0\n", 37, "is no file of a commit");
+  refuses("commit 2\nfile segments.gen 0\n", 37, "is no file of a commit");
   refuses("commit 2\nfile _0.frq -1\n", 44, "no number where one must be");
   refuses("commit 2\nfile _0.frq 18446744073709551616\n", 44, "no number where one must be");
   refuses("commit 2\nfile _0.frq 1\n", 45, "digests and size do not agree");
