@@ -160,6 +160,14 @@ void AddSkipsAndPositions(const Corpus& corpus) {
   }
 }
 
+void AddManifests(const Corpus& corpus) {
+  const std::string digest = " 0123456789abcdef";
+  corpus.Add("manifest", "files",
+             "commit 36\nfile _0.cfs 1048577" + digest + digest + "\nfile _0_1.del 0\nfile segments_10 80" +
+                 digest + "\n");
+  corpus.Add("manifest", "empty", "commit 1\n");
+}
+
 void AddOlderLayouts(const Corpus& corpus) {
   corpus.Add("commit", "oldest", ByteWriter().Int(1).Int(1).String("_0").Int(3).bytes());
   corpus.Add("commit", "minus-1", ByteWriter().Int(-1).Long(1).Int(1).Int(1).String("_0").Int(3).bytes());
@@ -209,6 +217,7 @@ int main(int argc, char** argv) {
   AddIndex(corpus, {.seed = 1, .documents = 12, .deletions = 3, .compound = false, .term_index_interval = 3},
            "plain");
   AddIndex(corpus, {.seed = 2, .documents = 5, .deletions = 3}, "compound");
+  AddManifests(corpus);
   AddOlderLayouts(corpus);
   AddWholeIndexes(corpus);
   AddSkipsAndPositions(corpus);

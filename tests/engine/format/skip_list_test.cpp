@@ -84,6 +84,27 @@ TEST(SkipListTest, RefusesLevelsAndEntriesThatDoNotFit) {
                [] { ReaderOf(ByteWriter().VLong(2).VInt(1).VInt(1).VInt(1).VLong(1), 16, false).Next(1); });
 }
 
+// The index library reads such a level into a buffer and does not look at its end again.
+TEST(SkipListTest, RefusesALevelThatIsLongerThanItsEntriesCanBe) {
+  const auto level = [](uint64_t length) {
+    return ByteWriter().VLong(length).Raw(std::string(length, '\0'));
+  };
+  ReaderOf(level(29), 16, false);
+  ExpectDamage(0, "takes 30 bytes for 1 entries", [&] { ReaderOf(level(30), 16, false); });
+}
+
+TEST(SkipListTest, RefusesAnEntryOfAnUpperLevelThatGoesOnPastTheFile) {
+  ExpectDamage(1, "reaches past its level's end", [] {
+    ReaderOf(ByteWriter().VLong(4).VInt(1).VInt(1).VInt(1).Raw("\x80"), 16, false).Next(1);
+  });
+}
+
+TEST(SkipListTest, AddsDistancesAsSignedNumbers) {
+  const SkipListReader::Entry entry = ReaderOf(ByteWriter().VInt(7).VInt(-16).VInt(-1), 4, false).Next(0);
+  EXPECT_EQ(static_cast<int64_t>(entry.postings_distance), -16);
+  EXPECT_EQ(static_cast<int64_t>(entry.positions_distance), -1);
+}
+
 // 16 documents, of which the level below has entries at the 4th, 8th, 12th and 16th, and the one above at the 16th:
 // documents 30, 70, 110 and 150, their postings 10 bytes each, their positions 20.
 ByteWriter TwoLevels() {
