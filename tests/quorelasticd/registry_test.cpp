@@ -180,6 +180,30 @@ TEST_F(RegistryTest, WhatAnotherProcessWritesToIsNotDeleted) {
   registry_.Delete("x");
 }
 
+TEST_F(RegistryTest, WhatIsClosedForARepairIsLockedUntilItsEnd) {
+  registry_.Create("x", Settings());
+  registry_.Create("y", Settings());
+  auto repair = registry_.Close("x");
+  EXPECT_EQ(Failure([&] { registry_.Use("x"); }), ErrorCode::kLocked);
+  EXPECT_EQ(Failure([&] { registry_.Delete("x"); }), ErrorCode::kLocked);
+  EXPECT_EQ(Failure([&] { registry_.Close("x"); }), ErrorCode::kLocked);
+  EXPECT_EQ(Failure([&] { registry_.Create("x", Settings()); }), ErrorCode::kIndexExists);
+  EXPECT_EQ(registry_.Use("y")->name(), "y");
+  repair.reset();
+  EXPECT_EQ(registry_.Use("x")->name(), "x");
+  EXPECT_NE(registry_.Close("x"), nullptr);
+  registry_.Delete("x");
+}
+
+TEST_F(RegistryTest, WhatIsUsedIsNotClosedForARepair) {
+  registry_.Create("x", Settings());
+  auto use = registry_.Use("x");
+  EXPECT_EQ(Failure([&] { registry_.Close("x"); }), ErrorCode::kLocked);
+  EXPECT_EQ(registry_.Use("x"), use);
+  use.reset();
+  EXPECT_NE(registry_.Close("x"), nullptr);
+}
+
 TEST_F(RegistryTest, ManyThreadsMakeUseAndDeleteAtOnce) {
   std::vector<std::thread> threads;
   threads.reserve(4);
