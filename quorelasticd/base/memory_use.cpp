@@ -25,7 +25,9 @@ bool IsTimeToTrim() {
 
 void MemoryUse::GiveBack() {
   constexpr size_t kLarge = size_t{512} << 10;
-  if (std::exchange(largest_, 0) >= kLarge && IsTimeToTrim()) malloc_trim(0);
+  static std::atomic<bool> is_due{false};
+  if (std::exchange(largest_, 0) >= kLarge) is_due = true;
+  if (is_due && IsTimeToTrim() && is_due.exchange(false)) malloc_trim(0);
 }
 
 }  // namespace quorelasticd

@@ -155,16 +155,18 @@ class Repair : public RunningCommand {
 
  private:
   // A client that has gone is noticed when it is told something: a plan ends then, but a repair goes on.
-  Outcome StillRunning() const {
-    if (!is_dry_run_) return Nothing();
+  Outcome StillRunning() {
     const auto elapsed =
         std::chrono::duration_cast<std::chrono::seconds>(std::chrono::steady_clock::now() - start_);
+    if (!is_dry_run_ || elapsed == told_) return Nothing();
+    told_ = elapsed;
     Json::Value progress(Json::objectValue);
     progress["elapsed_s"] = static_cast<Json::Int64>(elapsed.count());
     return Progress(std::move(progress));
   }
 
   const std::chrono::steady_clock::time_point start_ = std::chrono::steady_clock::now();
+  std::chrono::seconds told_{0};
   Turns::Turn turn_;
   boost::asio::any_io_executor executor_;
   IndexRegistry& registry_;
