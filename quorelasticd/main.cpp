@@ -81,9 +81,10 @@ int Serve(const Options& options) {
   IndexRegistry registry(root, slow_threads.get_executor(), static_cast<size_t>(options.max_open_indexes));
   Statistics statistics;
   Turns health_turns(kMostHealthRuns);
+  boost::asio::thread_pool health_threads(kMostHealthRuns);
   const Daemon daemon(registry, statistics,
                       {plugins, quick_searches, search_threads.get_executor(), SearchTimeLimit(options)},
-                      health_turns);
+                      {health_turns, health_threads.get_executor()});
   CommandService service(daemon);
   Server server(listener.Release(), service, LimitsOf(options), statistics.connections);
   ShutdownWatch watch(std::chrono::seconds(options.shutdown_timeout) + kGrace);
@@ -93,9 +94,10 @@ int Serve(const Options& options) {
     watch.Start();
   });
   search_threads.join();
+  health_threads.join();
   slow_threads.join();
-  watch.Stop();
   const bool is_committed = registry.CommitAll();
+  watch.Stop();
   spdlog::info("ended");
   return is_committed ? 0 : kFailure;
 }

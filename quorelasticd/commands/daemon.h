@@ -32,26 +32,32 @@ struct Searching {
   std::chrono::milliseconds time_limit;
 };
 
+// What checks and repairs work with: they wait for most of their time, which would keep writers from a shared thread.
+struct HealthWork {
+  Turns& turns;                           // as many as there are threads
+  boost::asio::any_io_executor executor;  // theirs alone
+};
+
 // What the commands work on. For any thread.
 class Daemon {
  public:
   // What is referred to must outlive it.
-  Daemon(IndexRegistry& registry, Statistics& statistics, Searching searching, Turns& health_turns)
+  Daemon(IndexRegistry& registry, Statistics& statistics, Searching searching, HealthWork health)
       : registry_(registry),
         statistics_(statistics),
         searching_(std::move(searching)),
-        health_turns_(health_turns) {}
+        health_(std::move(health)) {}
 
   IndexRegistry& registry() const { return registry_; }
   Statistics& statistics() const { return statistics_; }
   const Searching& searching() const { return searching_; }
-  Turns& health_turns() const { return health_turns_; }  // for checks and repairs
+  const HealthWork& health() const { return health_; }
 
  private:
   IndexRegistry& registry_;
   Statistics& statistics_;
   Searching searching_;
-  Turns& health_turns_;
+  HealthWork health_;
 };
 
 }  // namespace quorelasticd

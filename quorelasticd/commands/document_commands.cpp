@@ -1,6 +1,5 @@
 #include <chrono>
 #include <limits>
-#include <optional>
 #include <utility>
 
 #include "base/limits.h"
@@ -55,12 +54,14 @@ class DocumentBulk : public RunningCommand {
     const auto start = std::chrono::steady_clock::now();
     for (size_t i = 0; i < kDocumentsPerStep; ++i) {
       if (std::chrono::steady_clock::now() - start > kLongestStep) break;
-      const std::optional<DocumentSource::Item> item = source_->Next();
-      if (!item.has_value()) {
+      DocumentSource::Item item;
+      const DocumentSource::Move move = source_->Next(kLongestStep, item);
+      if (move == DocumentSource::Move::kNotYet) break;
+      if (move == DocumentSource::Move::kEnd) {
         at_end_ = true;
         return Nothing();
       }
-      Add(*item);
+      Add(item);
     }
     Json::Value progress(Json::objectValue);
     AddTallies(progress);

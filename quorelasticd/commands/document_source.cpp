@@ -4,6 +4,7 @@
 #include <deque>
 #include <exception>
 #include <mutex>
+#include <optional>
 #include <thread>
 #include <utility>
 #include <vector>
@@ -30,14 +31,14 @@ class InlineSource : public DocumentSource {
  public:
   explicit InlineSource(Json::Value documents) : documents_(std::move(documents)) {}
 
-  std::optional<Item> Next() override {
-    if (next_ >= documents_.size()) return std::nullopt;
+  Move Next(std::chrono::milliseconds /*most*/, Item& item) override {
+    if (next_ >= documents_.size()) return Move::kEnd;
     Json::Value json;
     json.swap(documents_[next_]);
-    Item item;
+    item = {};
     item.position = ++next_;
     Take(json, item);
-    return item;
+    return Move::kItem;
   }
 
   void DescribeProgress(Json::Value& progress) const override { progress["total"] = documents_.size(); }
@@ -67,6 +68,9 @@ class ImportReader {
       if (!is_blank || line->is_too_long) return Read{ToItem(*line), file_.bytes_read(), line->text.size()};
     }
   }
+
+  // Lets Next() end soon. For any thread.
+  void GiveUp() { file_.GiveUp(); }
 
   uint64_t total_bytes() const { return file_.total_bytes(); }
 
@@ -101,16 +105,20 @@ class ImportSource : public DocumentSource {
       const std::lock_guard lock(mutex_);
       is_given_up_ = true;
     }
+    reader_.GiveUp();
     changed_.notify_all();
     if (thread_.joinable()) thread_.join();
   }
 
-  std::optional<Item> Next() override {
+  Move Next(std::chrono::milliseconds most, Item& item) override {
     if (!thread_.joinable()) thread_ = std::thread([this] { ReadAhead(); });
-    if (next_ == batch_.read.size() && !TakeBatch()) return std::nullopt;
+    if (next_ == batch_.read.size()) {
+      if (const Move move = TakeBatch(most); move != Move::kItem) return move;
+    }
     ImportReader::Read& read = batch_.read[next_++];
     bytes_read_ = read.bytes_read;
-    return std::move(read.item);
+    item = std::move(read.item);
+    return Move::kItem;
   }
 
   void DescribeProgress(Json::Value& progress) const override {
@@ -167,13 +175,13 @@ class ImportSource : public DocumentSource {
     return true;
   }
 
-  // False at the end. Throws what the reading threw.
-  bool TakeBatch() {
+  // Throws what the reading threw.
+  Move TakeBatch(std::chrono::milliseconds most) {
     std::unique_lock lock(mutex_);
-    changed_.wait(lock, [&] { return is_over_ || !waiting_.empty(); });
+    if (!changed_.wait_for(lock, most, [&] { return is_over_ || !waiting_.empty(); })) return Move::kNotYet;
     if (waiting_.empty()) {
       if (failure_ != nullptr) std::rethrow_exception(failure_);
-      return false;
+      return Move::kEnd;
     }
     batch_ = std::move(waiting_.front());
     next_ = 0;
@@ -181,7 +189,7 @@ class ImportSource : public DocumentSource {
     waiting_bytes_ -= batch_.bytes;
     lock.unlock();
     changed_.notify_all();
-    return true;
+    return Move::kItem;
   }
 
   ImportReader reader_;  // the thread's, from its start

@@ -2,9 +2,9 @@
 
 #include <json/value.h>
 
+#include <chrono>
 #include <cstdint>
 #include <memory>
-#include <optional>
 #include <string>
 
 #include "commands/document_json.h"
@@ -20,13 +20,20 @@ class DocumentSource {
     std::string problem;  // why there is no document; empty where there is one
   };
 
+  enum class Move {
+    kItem,
+    kNotYet,  // it takes longer: to be asked again
+    kEnd,
+  };
+
   DocumentSource() = default;
   DocumentSource(const DocumentSource&) = delete;
   DocumentSource& operator=(const DocumentSource&) = delete;
   virtual ~DocumentSource() = default;
 
-  // Nothing at the end. Throws std::system_error where it cannot be read.
-  virtual std::optional<Item> Next() = 0;
+  // Sets `item` where there is a next one, and waits no longer than `most` for it. Throws std::system_error where it
+  // cannot be read.
+  virtual Move Next(std::chrono::milliseconds most, Item& item) = 0;
 
   // Adds how far it has come, and how far it goes.
   virtual void DescribeProgress(Json::Value& progress) const = 0;

@@ -44,12 +44,15 @@ const char* ToText(HealthReport::Manifest manifest) {
 class Check : public RunningCommand {
  public:
   Check(const Daemon& daemon, const Json::Value& data)
-      : turn_(daemon.health_turns()), registry_(daemon.registry()), name_(data["id"].asString()) {
+      : turn_(daemon.health().turns),
+        executor_(daemon.health().executor),
+        registry_(daemon.registry()),
+        name_(data["id"].asString()) {
     RequireTurn(turn_);
     run_.emplace(registry_.PathOf(name_));
   }
 
-  boost::asio::any_io_executor executor() const override { return registry_.slow_executor(); }
+  boost::asio::any_io_executor executor() const override { return executor_; }
 
   Outcome Step() override {
     if (!report_.has_value()) {
@@ -112,6 +115,7 @@ class Check : public RunningCommand {
   }
 
   Turns::Turn turn_;
+  boost::asio::any_io_executor executor_;
   IndexRegistry& registry_;
   std::string name_;
   std::string path_;
@@ -123,7 +127,8 @@ class Check : public RunningCommand {
 class Repair : public RunningCommand {
  public:
   Repair(const Daemon& daemon, const Json::Value& data)
-      : turn_(daemon.health_turns()),
+      : turn_(daemon.health().turns),
+        executor_(daemon.health().executor),
         registry_(daemon.registry()),
         name_(data["id"].asString()),
         is_dry_run_(data.get("dry_run", true).asBool()) {
@@ -131,7 +136,7 @@ class Repair : public RunningCommand {
     registry_.PathOf(name_);
   }
 
-  boost::asio::any_io_executor executor() const override { return registry_.slow_executor(); }
+  boost::asio::any_io_executor executor() const override { return executor_; }
 
   Outcome Step() override {
     if (!worker_.has_value()) {
@@ -139,7 +144,7 @@ class Repair : public RunningCommand {
       worker_.emplace(registry_.PathOf(name_), is_dry_run_);
     }
     std::optional<Json::Value> report = worker_->WaitFor(kLongestStep);
-    if (!report.has_value()) return Nothing();
+    if (!report.has_value()) return StillRunning();
     uint64_t documents = 0;
     for (const Json::Value& loss : (*report)["lost"]) documents += loss["documents"].asUInt64();
     (*report)["documents_lost"] = static_cast<Json::UInt64>(documents);
@@ -149,7 +154,21 @@ class Repair : public RunningCommand {
   }
 
  private:
+  // A client that has gone is noticed when it is told something: a plan ends then, but a repair goes on.
+  Outcome StillRunning() {
+    const auto elapsed =
+        std::chrono::duration_cast<std::chrono::seconds>(std::chrono::steady_clock::now() - start_);
+    if (!is_dry_run_ || elapsed == told_) return Nothing();
+    told_ = elapsed;
+    Json::Value progress(Json::objectValue);
+    progress["elapsed_s"] = static_cast<Json::Int64>(elapsed.count());
+    return Progress(std::move(progress));
+  }
+
+  const std::chrono::steady_clock::time_point start_ = std::chrono::steady_clock::now();
+  std::chrono::seconds told_{0};
   Turns::Turn turn_;
+  boost::asio::any_io_executor executor_;
   IndexRegistry& registry_;
   std::string name_;
   bool is_dry_run_;

@@ -40,7 +40,7 @@ class IndexList : public RunningCommand {
   IndexList(const Daemon& daemon, const Json::Value& data) : daemon_(daemon), is_one_(data.isMember("id")) {
     if (is_one_) {
       names_ = {data["id"].asString()};
-      daemon_.registry().Use(names_.front());
+      daemon_.registry().PathOf(names_.front());
     } else {
       names_ = daemon_.registry().root().ListIndexes();
     }
@@ -61,16 +61,19 @@ class IndexList : public RunningCommand {
     Json::Value entry(Json::objectValue);
     entry["id"] = name;
     try {
-      const std::shared_ptr<OpenIndex> open = daemon_.registry().Use(name);
-      const vantrel::elastic::IndexStatistics statistics = open->index().Statistics();
+      const std::shared_ptr<vantrel::elastic::Index> index = daemon_.registry().Look(name);
+      const vantrel::elastic::IndexStatistics statistics = index->Statistics();
       AddCounts(statistics.documents, entry);
       entry["segments"] = static_cast<Json::UInt64>(statistics.segments);
       entry["size_bytes"] = static_cast<Json::UInt64>(statistics.bytes);
-      entry["settings"] = ToJson(open->index().settings());
+      entry["settings"] = ToJson(index->settings());
     } catch (...) {
       const RequestError error = ToRequestError();
-      if (is_one_) throw error;
-      if (error.code() == ErrorCode::kIndexNotFound) return;  // deleted since
+      if (is_one_) {
+        daemon_.registry().PathOf(name);  // throws where it has been deleted since
+        throw error;
+      }
+      if (!daemon_.registry().root().HasIndex(name)) return;  // deleted since
       entry["error"] = error.ToJson();
     }
     entries_.append(std::move(entry));

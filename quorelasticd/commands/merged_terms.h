@@ -15,8 +15,8 @@ struct TermSelection {
 };
 
 // Walks the terms of all segments of an index together: in the dictionary's order, by field and then by text, each
-// term once. Where a field is selected, the walk begins near what is selected. The files stay open, so that nothing written meanwhile disturbs the walk. For one thread at a time.
-// Throws IndexError.
+// term once. Where a field is selected, the walk begins near what is selected. The files stay open, so that
+// nothing written meanwhile disturbs the walk. For one thread at a time. Throws IndexError.
 class MergedTerms {
  public:
   MergedTerms(const std::string& path, bool live_only, TermSelection selection);

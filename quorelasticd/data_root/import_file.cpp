@@ -89,6 +89,7 @@ std::optional<ImportFile::Line> ImportFile::Next() {
 bool ImportFile::Fill() {
   buffer_.erase(0, begin_);
   begin_ = 0;
+  if (is_given_up_) return false;
   const size_t kept = buffer_.size();
   buffer_.resize(kept + kReadPiece);
   ssize_t got = -1;

@@ -1,5 +1,6 @@
 #pragma once
 
+#include <atomic>
 #include <cstddef>
 #include <cstdint>
 #include <optional>
@@ -26,6 +27,9 @@ class ImportFile {
   // The next line, nothing at the end. A last line without a newline counts. Throws std::system_error.
   std::optional<Line> Next();
 
+  // Lets Next() end soon, as at the end of the file, be it within a line of terabytes. For any thread.
+  void GiveUp() { is_given_up_ = true; }
+
   uint64_t bytes_read() const { return bytes_read_; }
 
   // When the file was opened.
@@ -42,6 +46,7 @@ class ImportFile {
   uint64_t total_bytes_ = 0;
   uint64_t lines_ = 0;
   bool at_end_ = false;
+  std::atomic<bool> is_given_up_{false};
 };
 
 }  // namespace quorelasticd

@@ -2,6 +2,8 @@
 
 #include <spdlog/spdlog.h>
 
+#include <algorithm>
+#include <atomic>
 #include <boost/asio/post.hpp>
 #include <boost/asio/strand.hpp>
 #include <filesystem>
@@ -21,6 +23,14 @@ namespace {
 
 RequestError NotFound(const std::string& name) {
   return RequestError(ErrorCode::kIndexNotFound, "there is no index " + Quoted(name));
+}
+
+// Whether nobody but the registry holds an index, whose mutex is held.
+bool IsUnused(const std::shared_ptr<OpenIndex>& index) {
+  if (index.use_count() > 1) return false;
+  // The count is read relaxed. What the last holder did before it let go must be seen here.
+  std::atomic_thread_fence(std::memory_order_acquire);
+  return true;
 }
 
 // Commits, on its writing turn, an index that nobody uses, so that it can be closed.
@@ -75,12 +85,25 @@ std::shared_ptr<OpenIndex> IndexRegistry::Use(const std::string& name) {
   return open;
 }
 
+std::shared_ptr<vantrel::elastic::Index> IndexRegistry::Look(const std::string& name) {
+  {
+    const std::lock_guard lock(mutex_);
+    if (const auto found = open_.find(name); found != open_.end()) {
+      // The caller counts as one that uses it: who closed it now would leave its writer behind.
+      const std::shared_ptr<OpenIndex>& open = found->second.index;
+      return {open, &open->index()};
+    }
+    RequireUnreserved(name);
+  }
+  return vantrel::elastic::Index::Open(root_.IndexPath(name));
+}
+
 // The mutex is held: nobody else can begin to use an index meanwhile.
 std::map<std::string, IndexRegistry::Entry>::iterator IndexRegistry::FindIdle(
     const std::function<bool(const OpenIndex&)>& may) {
   auto idle = open_.end();
   for (auto entry = open_.begin(); entry != open_.end(); ++entry) {
-    if (entry->second.index.use_count() > 1 || !may(*entry->second.index)) continue;
+    if (!IsUnused(entry->second.index) || !may(*entry->second.index)) continue;
     if (idle == open_.end() || entry->second.last_use < idle->second.last_use) idle = entry;
   }
   return idle;
@@ -98,6 +121,12 @@ void IndexRegistry::CloseIdle() {
   if (changed != open_.end()) CommitLater(changed->second.index);
 }
 
+size_t IndexRegistry::CountBeingCreated() const {
+  return static_cast<size_t>(std::count_if(reserved_.begin(), reserved_.end(), [&](const auto& entry) {
+    return entry.second == Reason::kCreation && !root_.HasIndex(entry.first);
+  }));
+}
+
 vantrel::elastic::IndexSettings IndexRegistry::Create(const std::string& name,
                                                       const vantrel::elastic::IndexSettings& settings) {
   if (!IsIndexName(name)) throw std::invalid_argument("no name of an index: " + name);
@@ -107,10 +136,10 @@ vantrel::elastic::IndexSettings IndexRegistry::Create(const std::string& name,
     if (reserved_.contains(name) || root_.HasIndex(name)) {
       throw RequestError(ErrorCode::kIndexExists, "there is an index " + Quoted(name) + " already");
     }
-    if (root_.ListIndexes().size() + reserved_.size() >= kMostIndexes) {
+    if (root_.ListIndexes().size() + CountBeingCreated() >= kMostIndexes) {
       throw LimitExceeded("stored_indexes", kMostIndexes, "in the data folder");
     }
-    reservation = std::make_unique<Reservation>(*this, name, Reason::kComingOrGoing);
+    reservation = std::make_unique<Reservation>(*this, name, Reason::kCreation);
   }
   const auto created = vantrel::elastic::Index::Create(root_.HiddenPath(name), settings)->settings();
   root_.ShowIndex(name);
@@ -131,7 +160,7 @@ void IndexRegistry::RequireUnreserved(const std::string& name) const {
 std::shared_ptr<OpenIndex> IndexRegistry::TakeUnused(const std::string& name) {
   const auto found = open_.find(name);
   if (found == open_.end()) return nullptr;
-  if (found->second.index.use_count() > 1) {
+  if (!IsUnused(found->second.index)) {
     throw RequestError(ErrorCode::kLocked, "index " + Quoted(name) + " is in use by requests still running");
   }
   std::shared_ptr<OpenIndex> taken = std::move(found->second.index);
@@ -153,13 +182,7 @@ std::shared_ptr<void> IndexRegistry::Close(const std::string& name) {
     closing = TakeUnused(name);
     reservation = std::make_shared<Reservation>(*this, name, Reason::kRepair);
   }
-  if (closing != nullptr) {
-    try {
-      Changes(closing).Commit();
-    } catch (...) {
-      spdlog::warn("index {}: cannot commit before its repair: {}", name, ToRequestError().reason());
-    }
-  }
+  if (closing != nullptr) Changes(closing).Commit(vantrel::elastic::Index::Merging::kNone);
   return reservation;
 }
 
@@ -170,7 +193,7 @@ void IndexRegistry::Delete(const std::string& name) {
     const std::lock_guard lock(mutex_);
     RequireUnreserved(name);
     closing = TakeUnused(name);
-    reservation = std::make_unique<Reservation>(*this, name, Reason::kComingOrGoing);
+    reservation = std::make_unique<Reservation>(*this, name, Reason::kDeletion);
   }
   closing.reset();  // which lets go of its write lock
   const vantrel::elastic::WriteLock nobody_else_writes(root_.IndexPath(name));
@@ -191,7 +214,7 @@ bool IndexRegistry::CommitAll() {
   bool is_done = true;
   for (const auto& [name, entry] : open_) {
     try {
-      Changes(entry.index).Commit();
+      Changes(entry.index).Commit(vantrel::elastic::Index::Merging::kNone);
     } catch (...) {
       is_done = false;
       spdlog::error("index {}: cannot commit: {}", name, ToRequestError().reason());

@@ -16,7 +16,8 @@
 namespace quorelasticd {
 
 // The indexes of a data root that are open: each is opened when it is first used, and once, and of those that
-// nobody uses any more only the last ones stay open. For any thread. Throws RequestError, what the engine throws, and std::system_error.
+// nobody uses any more only the last ones stay open. For any thread. Throws RequestError, what the engine throws, and
+// std::system_error.
 class IndexRegistry {
  public:
   // `slow_executor` runs what takes long. Where more than `most_open` indexes are open, those are closed that have
@@ -31,6 +32,10 @@ class IndexRegistry {
   // The index of this name. It is not deleted as long as the result is held.
   std::shared_ptr<OpenIndex> Use(const std::string& name);
 
+  // The same to read from, but where it is not open, it is opened for the caller alone: no other is closed for it, and
+  // it may be deleted meanwhile.
+  std::shared_ptr<vantrel::elastic::Index> Look(const std::string& name);
+
   // Makes an empty index, durably, and returns its settings as the engine completed them. The name must satisfy
   // IsIndexName().
   vantrel::elastic::IndexSettings Create(const std::string& name,
@@ -40,8 +45,8 @@ class IndexRegistry {
   std::string PathOf(const std::string& name) const;
 
   // Commits an index, closes it, and keeps everybody from it as long as the result is held: they are told that it is
-  // being repaired. Where it is so damaged that it cannot commit, what was not committed is lost. Refused (locked)
-  // while anybody uses it.
+  // being repaired. Where it cannot commit, that is thrown, what was not committed is lost, and nobody is kept from the
+  // index: the next call succeeds. Refused (locked) while anybody uses it.
   std::shared_ptr<void> Close(const std::string& name);
 
   // Removes an index and all its files. Refused (locked) while anybody uses it, or writes to it.
@@ -49,11 +54,12 @@ class IndexRegistry {
 
   size_t open_count() const;
 
-  // Commits every open index; false, and log lines, where that failed. To be called when nothing else runs.
+  // Commits every open index, and merges nothing, as the daemon's end is waited for; false, and log lines, where that
+  // failed. To be called when nothing else runs.
   bool CommitAll();
 
  private:
-  enum class Reason { kComingOrGoing, kRepair };
+  enum class Reason { kCreation, kDeletion, kRepair };
 
   // Keeps a name from everybody else.
   class Reservation;
@@ -66,7 +72,13 @@ class IndexRegistry {
   // The one that nobody uses, and nobody has used for the longest time, of those that `may` is true for; the end
   // where there is none.
   std::map<std::string, Entry>::iterator FindIdle(const std::function<bool(const OpenIndex&)>& may);
+
+  // Closes those that are too many, and with the mutex held: else somebody might open one again while its writer is
+  // still about to go, and find it locked.
   void CloseIdle();
+
+  // Of the names that are kept, those whose index is not in the folder yet.
+  size_t CountBeingCreated() const;
 
   // For these, the mutex is held.
   void RequireUnreserved(const std::string& name) const;

@@ -11,13 +11,13 @@ OpenIndex::OpenIndex(std::string name, std::shared_ptr<vantrel::elastic::Index> 
                      boost::asio::any_io_executor writing_turn)
     : name_(std::move(name)), index_(std::move(index)), writing_turn_(std::move(writing_turn)) {}
 
-void Changes::Commit() {
-  Apply([](vantrel::elastic::Index& index) {
+void Changes::Commit(vantrel::elastic::Index::Merging merging) {
+  Apply([merging](vantrel::elastic::Index& index) {
     try {
-      index.Commit();
+      index.Commit(merging);
     } catch (const vantrel::elastic::IndexChangesLostError&) {
       // Noted when it happened, and told to those who lose by it; it is no reason to refuse the changes made since.
-      index.Commit();
+      index.Commit(merging);
     }
   });
   open_->has_promised_ = false;

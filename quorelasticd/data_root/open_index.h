@@ -65,8 +65,8 @@ class Changes {
     }
   }
 
-  // Makes what was applied durable.
-  void Commit();
+  // Makes what was applied durable, and merges segments where that is due and allowed.
+  void Commit(vantrel::elastic::Index::Merging merging = vantrel::elastic::Index::Merging::kAllowed);
 
   // Leaves what was applied to a later commit.
   void Promise();

@@ -4,11 +4,16 @@
 #include <stdexcept>
 #include <thread>
 
+#include "base/limits.h"
+
 namespace quorelasticd {
 namespace {
 
-// Half of the processors, for searches go on.
-unsigned ThreadsOfACheck() { return std::max(1U, std::thread::hardware_concurrency() / 2); }
+// All checks together take half of the processors, for searches go on.
+unsigned ThreadsOfACheck() {
+  constexpr auto kShares = static_cast<unsigned>(2 * kMostHealthRuns);
+  return std::max(1U, std::thread::hardware_concurrency() / kShares);
+}
 
 }  // namespace
 

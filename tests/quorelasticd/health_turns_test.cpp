@@ -36,7 +36,7 @@ class HealthTurnsTest : public ::testing::Test {
   const Daemon daemon_{registry_,
                        statistics_,
                        {plugins_, searches_, threads_.get_executor(), std::chrono::seconds(1)},
-                       turns_};
+                       {turns_, threads_.get_executor()}};
 };
 
 TEST_F(HealthTurnsTest, AreTakenAsLongAsACheckOrARepairLives) {

@@ -341,7 +341,13 @@ TEST(Lifecycle, MoreIndexesThanMayBeOpenAreAllServedWithFewDescriptors) {
   for (int i = 0; i < kIndexes; ++i) EXPECT_GE(search(client, i), i % 2 == 0 ? 2 : 1) << i;
   most = std::max(most, CountDescriptors(daemon.pid()));
   EXPECT_LT(most, 200U);
-  EXPECT_LT(client.Ask(R"({"command":"status"})")["result"]["open_indexes"], 12);
+  // What has changes is committed in the background, and closed when the next index is opened.
+  const auto give_up = std::chrono::steady_clock::now() + std::chrono::seconds(60);
+  int opened = 0;
+  while (client.Ask(R"({"command":"status"})")["result"]["open_indexes"].asInt() > 5) {
+    ASSERT_LT(std::chrono::steady_clock::now(), give_up);
+    search(client, opened++ % kIndexes);
+  }
   ASSERT_EQ(daemon.Stop(), 0);
   DaemonProcess again(folder.path());
   DaemonClient other(again.socket());

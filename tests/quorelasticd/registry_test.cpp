@@ -180,6 +180,47 @@ TEST_F(RegistryTest, WhatAnotherProcessWritesToIsNotDeleted) {
   registry_.Delete("x");
 }
 
+TEST_F(RegistryTest, WhatIsClosedForARepairIsLockedUntilItsEnd) {
+  registry_.Create("x", Settings());
+  registry_.Create("y", Settings());
+  auto repair = registry_.Close("x");
+  EXPECT_EQ(Failure([&] { registry_.Use("x"); }), ErrorCode::kLocked);
+  EXPECT_EQ(Failure([&] { registry_.Delete("x"); }), ErrorCode::kLocked);
+  EXPECT_EQ(Failure([&] { registry_.Close("x"); }), ErrorCode::kLocked);
+  EXPECT_EQ(Failure([&] { registry_.Create("x", Settings()); }), ErrorCode::kIndexExists);
+  EXPECT_EQ(registry_.Use("y")->name(), "y");
+  repair.reset();
+  EXPECT_EQ(registry_.Use("x")->name(), "x");
+  EXPECT_NE(registry_.Close("x"), nullptr);
+  registry_.Delete("x");
+}
+
+TEST_F(RegistryTest, ALookClosesNothingAndKeepsNothingOpen) {
+  for (const char* name : {"a", "b", "c", "d", "e"}) registry_.Create(name, Settings());
+  std::vector<std::weak_ptr<OpenIndex>> opened;
+  for (const char* name : {"a", "b", "c", "d"}) opened.push_back(registry_.Use(name));
+  EXPECT_EQ(registry_.Look("e")->path(), root_.IndexPath("e"));
+  EXPECT_EQ(registry_.open_count(), kMostOpen);
+  for (const auto& index : opened) EXPECT_FALSE(index.expired());
+  auto look = registry_.Look("a");
+  EXPECT_EQ(look.get(), &registry_.Use("a")->index());
+  EXPECT_EQ(Failure([&] { registry_.Delete("a"); }), ErrorCode::kLocked);
+  look.reset();
+  registry_.Delete("a");
+  EXPECT_EQ(Failure([&] { registry_.Look("a"); }), ErrorCode::kIndexNotFound);
+  const auto repair = registry_.Close("e");
+  EXPECT_EQ(Failure([&] { registry_.Look("e"); }), ErrorCode::kLocked);
+}
+
+TEST_F(RegistryTest, WhatIsUsedIsNotClosedForARepair) {
+  registry_.Create("x", Settings());
+  auto use = registry_.Use("x");
+  EXPECT_EQ(Failure([&] { registry_.Close("x"); }), ErrorCode::kLocked);
+  EXPECT_EQ(registry_.Use("x"), use);
+  use.reset();
+  EXPECT_NE(registry_.Close("x"), nullptr);
+}
+
 TEST_F(RegistryTest, ManyThreadsMakeUseAndDeleteAtOnce) {
   std::vector<std::thread> threads;
   threads.reserve(4);
@@ -306,6 +347,37 @@ TEST_F(ChangesTest, WhatAFailureLostIsNoReasonToRefuseALaterCommit) {
   Add(later);
   EXPECT_NO_THROW(later.Commit());
   EXPECT_EQ(open_->index().CountDocuments().live, 1u);
+}
+
+TEST_F(ChangesTest, ThatCannotBeCommittedBeforeARepairAreToldToBeLost) {
+  {
+    Changes promised(open_);
+    Add(promised);
+    promised.Promise();
+  }
+  open_.reset();
+  {
+    const NoFileGrows full_disk;
+    EXPECT_EQ(Failure([&] { registry_.Close("x"); }), ErrorCode::kIoError);
+  }
+  EXPECT_EQ(registry_.Use("x")->index().CountDocuments().live, 0u);
+  EXPECT_NE(registry_.Close("x"), nullptr);
+}
+
+TEST_F(ChangesTest, ThatAreCommittedAtTheEndWaitForNoMerge) {
+  constexpr uint64_t kCommits = 12;  // more than the segments that are left unmerged
+  for (uint64_t i = 0; i < kCommits; ++i) {
+    Changes changes(open_);
+    Add(changes);
+    changes.Promise();
+    ASSERT_TRUE(registry_.CommitAll());
+  }
+  EXPECT_EQ(open_->index().Statistics().segments, kCommits);
+  Changes last(open_);
+  Add(last);
+  last.Commit();
+  EXPECT_LT(open_->index().Statistics().segments, kCommits);
+  EXPECT_EQ(open_->index().CountDocuments().live, kCommits + 1);
 }
 
 TEST_F(ChangesTest, AKeptPromiseIsNotReported) {

@@ -29,8 +29,8 @@ namespace vantrel::elastic {
 // time, but for openInput and what comes from it.
 class DiskDirectory : public Lucene::SimpleFSDirectory {
  public:
-  // `path` is used byte for byte; PrepareIndexLibrary() must have been called. No lock factory is taken: the writer must hold our own lock, and the library's
-  // keeps nobody out.
+  // `path` is used byte for byte; PrepareIndexLibrary() must have been called. No lock factory is taken: the writer
+  // must hold our own lock, and the library's keeps nobody out.
   explicit DiskDirectory(const std::string& path);
   ~DiskDirectory() override;
 

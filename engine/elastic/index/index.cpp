@@ -139,7 +139,7 @@ class Index::Impl {
   }
 
   // Commits, unless changes of this round are lost already: that is told once, then what came since counts.
-  void Commit() {
+  void Commit(Merging merging) {
     const std::lock_guard guard(write_mutex_);
     if (std::exchange(changes_are_lost_, false)) throw IndexChangesLostError(path_);
     if (!writer_.has_value()) return;
@@ -150,7 +150,7 @@ class Index::Impl {
       throw;
     }
     has_changes_ = false;
-    MergeSegments();
+    if (merging == Merging::kAllowed) MergeSegments();
   }
 
   // Decodes the newest commit within bounds: the library, which trusts its bytes, reads it next.
@@ -271,7 +271,7 @@ void Index::Optimize() {
   impl_->Write([](LibraryWriter& writer) { writer.Optimize(); });
 }
 
-void Index::Commit() { impl_->Commit(); }
+void Index::Commit(Merging merging) { impl_->Commit(merging); }
 
 DocumentCounts Index::CountDocuments() const { return Statistics().documents; }
 

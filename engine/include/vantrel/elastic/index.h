@@ -102,11 +102,14 @@ class VANTREL_ELASTIC_EXPORT Index {
   // disk space, up to the next commit.
   void Optimize();
 
+  enum class Merging { kAllowed, kNone };
+
   // Makes every change durable and visible: once this has returned, a crash or a loss of power does not undo
-  // it. Then merges segments where that is due; what fails of that is left to a later commit, and told nobody.
+  // it. Then merges segments where that is due and `merging` allows it, which may take long; what fails of that, or
+  // is not allowed, is left to a later commit, and told nobody.
   // Without changes it does nothing. Where an earlier failure has lost changes, it commits nothing and throws
   // IndexChangesLostError once; what was changed since then is committed by the next call.
-  void Commit();
+  void Commit(Merging merging = Merging::kAllowed);
 
   // The documents of the newest commit, whoever made it.
   DocumentCounts CountDocuments() const;
