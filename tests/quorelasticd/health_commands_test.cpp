@@ -128,6 +128,7 @@ TEST_F(HealthCommandsTest, WhatIsWrongIsStreamedWithItsPlaceAndGrade) {
   EXPECT_THAT(findings.front()["expected"].asString(), HasSubstr("digest"));
   EXPECT_TRUE(findings.front().isMember("offset") && findings.front().isMember("found"));
   std::vector<std::string> grades;
+  grades.reserve(findings.size());
   for (const Json::Value& finding : findings)
     grades.push_back(finding["file"].asString() + finding["grade"].asString());
   EXPECT_THAT(grades, Contains("_1.tisunsafe"));
