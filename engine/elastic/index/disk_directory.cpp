@@ -108,8 +108,12 @@ void SyncFile(const std::string& path) {
 
 }  // namespace
 
+// The library makes a name for a lock of the path that it is constructed with, and its digest copies over its own
+// bytes for some lengths. Nobody asks for that name: so it is given another path first.
 DiskDirectory::DiskDirectory(const std::string& path)
-    : SimpleFSDirectory(ToWidePath(path), Lucene::NoLockFactory::getNoLockFactory()), path_(path) {}
+    : SimpleFSDirectory(L"/", Lucene::NoLockFactory::getNoLockFactory()), path_(path) {
+  directory = ToWidePath(path);
+}
 
 DiskDirectory::~DiskDirectory() = default;
 

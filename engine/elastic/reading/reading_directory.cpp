@@ -1,5 +1,6 @@
 #include "elastic/reading/reading_directory.h"
 
+#include <lucene++/FileUtils.h>
 #include <lucene++/NoLockFactory.h>
 
 #include <utility>
@@ -10,10 +11,19 @@
 
 namespace vantrel::elastic::reading {
 
+// The library makes a name for a lock of the path that it is constructed with, and its digest copies over its own
+// bytes for some lengths. Nobody asks for that name: so it is given another path first, and what it would have looked
+// for is looked for here.
 ReadingDirectory::ReadingDirectory(const std::string& path, std::optional<WantedTerm> term)
-    : SimpleFSDirectory(ToWidePath(path), Lucene::NoLockFactory::getNoLockFactory()),
+    : SimpleFSDirectory(L"/", Lucene::NoLockFactory::getNoLockFactory()),
       path_(path),
-      check_(std::move(term)) {}
+      check_(std::move(term)) {
+  directory = ToWidePath(path);
+  if (Lucene::FileUtils::fileExists(directory) && !Lucene::FileUtils::isDirectory(directory)) {
+    boost::throw_exception(
+        Lucene::NoSuchDirectoryException(L"File '" + directory + L"' exists but is not a directory"));
+  }
+}
 
 Lucene::IndexInputPtr ReadingDirectory::openInput(const Lucene::String& name) {
   return openInput(name, Lucene::BufferedIndexInput::BUFFER_SIZE);
