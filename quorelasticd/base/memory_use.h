@@ -7,7 +7,7 @@ namespace quorelasticd {
 
 // Gives the memory that a large text took back to the system, which the allocator would keep for the next one. What
 // is made of a text is freed in many small pieces: to find them takes a while, but less than to make them took.
-// That happens once a second at most; what goes meanwhile waits for the next call, of whichever object.
+// That happens every 20 milliseconds at most; what goes meanwhile waits for the next call, of whichever object.
 // A member of this kind stands before the members that hold the text, so that it goes after them.
 class MemoryUse {
  public:
