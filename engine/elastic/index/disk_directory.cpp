@@ -7,7 +7,6 @@
 // Not without the index library's main header.
 #include <lucene++/BufferedIndexInput.h>
 #include <lucene++/BufferedIndexOutput.h>
-#include <lucene++/NoLockFactory.h>
 
 #include <cerrno>
 #include <span>
@@ -17,7 +16,6 @@
 #include "elastic/format/file_names.h"
 #include "elastic/format/folder.h"
 #include "elastic/index/durable_file.h"
-#include "elastic/index/path_codecvt.h"
 
 namespace vantrel::elastic {
 namespace {
@@ -108,12 +106,7 @@ void SyncFile(const std::string& path) {
 
 }  // namespace
 
-// The library makes a name for a lock of the path that it is constructed with, and its digest copies over its own
-// bytes for some lengths. Nobody asks for that name: so it is given another path first.
-DiskDirectory::DiskDirectory(const std::string& path)
-    : SimpleFSDirectory(L"/", Lucene::NoLockFactory::getNoLockFactory()), path_(path) {
-  directory = ToWidePath(path);
-}
+DiskDirectory::DiskDirectory(const std::string& path) : BytePathDirectory(path), path_(path) {}
 
 DiskDirectory::~DiskDirectory() = default;
 

@@ -1,15 +1,11 @@
 #pragma once
 
-#include <lucene++/LuceneHeaders.h>
-
-// Not without the headers above.
-#include <lucene++/SimpleFSDirectory.h>
-
 #include <mutex>
 #include <optional>
 #include <set>
 #include <string>
 
+#include "elastic/index/byte_path_directory.h"
 #include "vantrel/elastic/index_error.h"
 
 namespace vantrel::elastic {
@@ -27,7 +23,7 @@ namespace vantrel::elastic {
 //
 // Exceptions are the library's own (Lucene::IOException), as it tidies up after no other. For one thread at a
 // time, but for openInput and what comes from it.
-class DiskDirectory : public Lucene::SimpleFSDirectory {
+class DiskDirectory : public BytePathDirectory {
  public:
   // `path` is used byte for byte; PrepareIndexLibrary() must have been called. No lock factory is taken: the writer
   // must hold our own lock, and the library's keeps nobody out.

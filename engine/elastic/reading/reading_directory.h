@@ -1,15 +1,11 @@
 #pragma once
 
-#include <lucene++/LuceneHeaders.h>
-
-// Not without the headers above.
-#include <lucene++/SimpleFSDirectory.h>
-
 #include <optional>
 #include <string>
 #include <vector>
 
 #include "elastic/format/folder.h"
+#include "elastic/index/byte_path_directory.h"
 #include "elastic/reading/opened_segment.h"
 #include "elastic/reading/opening_check.h"
 
@@ -18,7 +14,7 @@ namespace vantrel::elastic::reading {
 // The folder of an index as the index library opens it to read: each file is checked when it is asked for, and what
 // the library then reads is the very file that was checked, whatever a writer does meanwhile. Nothing is created,
 // locked or changed. Exceptions are the library's own. For one thread at a time.
-class ReadingDirectory : public Lucene::SimpleFSDirectory {
+class ReadingDirectory : public BytePathDirectory {
  public:
   // `path` is used byte for byte. PrepareIndexLibrary() must have been called.
   ReadingDirectory(const std::string& path, std::optional<WantedTerm> term);
