@@ -4,7 +4,6 @@
 #include <fstream>
 #include <iostream>
 #include <string>
-#include <utility>
 
 #include "elastic/format/commit.h"
 #include "elastic/format/folder.h"
@@ -17,13 +16,8 @@ namespace format = vantrel::elastic::format;
 void MakeManifest(const std::string& path) {
   const format::DiskFolder folder(path);
   format::Manifest manifest;
-  format::UseNewestCommit(folder, [&](const format::Commit& commit) {
-    manifest = {};
-    manifest.generation = commit.generation;
-    for (const std::string& name : format::FilesOf(folder, commit)) {
-      manifest.files.push_back(format::DigestFile(folder, name));
-    }
-  });
+  format::UseNewestCommit(
+      folder, [&](const format::Commit& commit) { manifest = format::MakeManifest(folder, commit); });
   std::ofstream file(format::JoinPath(path, format::kManifestName), std::ios::binary);
   file << format::WriteManifest(manifest);
   if (!file.flush()) throw std::runtime_error("cannot write the manifest");

@@ -6,13 +6,6 @@
 #include <new>
 
 namespace vantrel::elastic::format {
-namespace {
-
-// Small enough to stay in the processor's cache between being read and being digested.
-constexpr size_t kPiece = size_t{256} << 10;
-
-}  // namespace
-
 BlockDigest::BlockDigest() : state_(XXH3_createState(), [](XXH3_state_s* state) { XXH3_freeState(state); }) {
   if (state_ == nullptr) throw std::bad_alloc();
   XXH3_64bits_reset(state_.get());
@@ -32,21 +25,17 @@ std::string DigestText(uint64_t digest) {
   return digits;
 }
 
+uint64_t DigestOfBlock(const ByteSource& file, uint64_t block) {
+  const uint64_t start = block * kDigestBlock;
+  BlockDigest digest;
+  ReadToDigest(file, start, std::min(start + kDigestBlock, file.size()),
+               [&](uint64_t /*offset*/, std::span<const uint8_t> piece) { digest.Add(piece); });
+  return digest.value();
+}
+
 std::vector<uint64_t> DigestBlocks(const ByteSource& file) {
-  std::vector<uint64_t> digests;
-  digests.reserve(CountDigestBlocks(file.size()));
-  std::vector<uint8_t> buffer(std::min<uint64_t>(kPiece, file.size()));
-  for (uint64_t start = 0; start < file.size(); start += kDigestBlock) {
-    const uint64_t end = std::min(start + kDigestBlock, file.size());
-    BlockDigest digest;
-    for (uint64_t at = start; at < end;) {
-      const std::span<uint8_t> piece(buffer.data(), std::min<uint64_t>(buffer.size(), end - at));
-      file.ReadAt(at, piece);
-      digest.Add(piece);
-      at += piece.size();
-    }
-    digests.push_back(digest.value());
-  }
+  std::vector<uint64_t> digests(CountDigestBlocks(file.size()));
+  for (uint64_t block = 0; block < digests.size(); ++block) digests[block] = DigestOfBlock(file, block);
   return digests;
 }
 

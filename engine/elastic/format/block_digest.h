@@ -1,5 +1,6 @@
 #pragma once
 
+#include <algorithm>
 #include <cstddef>
 #include <cstdint>
 #include <memory>
@@ -42,6 +43,23 @@ class BlockDigest {
 // A digest in hexadecimal digits, always as many.
 inline constexpr size_t kDigestDigits = 16;
 std::string DigestText(uint64_t digest);
+
+// Reads a range of a file in pieces that stay in the processor's cache until they are digested: calls
+// take(offset, piece) for each, in order. Throws what reading throws.
+template <typename Take>
+void ReadToDigest(const ByteSource& file, uint64_t from, uint64_t to, Take take) {
+  constexpr uint64_t kPiece = uint64_t{256} << 10;
+  std::vector<uint8_t> buffer(std::min(kPiece, to - from));
+  while (from < to) {
+    const std::span<uint8_t> piece(buffer.data(), std::min<uint64_t>(buffer.size(), to - from));
+    file.ReadAt(from, piece);
+    take(from, std::span<const uint8_t>(piece));
+    from += piece.size();
+  }
+}
+
+// The digest of a block of a file, by its number. Throws what reading throws.
+uint64_t DigestOfBlock(const ByteSource& file, uint64_t block);
 
 // The digests of a whole file. Throws what reading throws.
 std::vector<uint64_t> DigestBlocks(const ByteSource& file);

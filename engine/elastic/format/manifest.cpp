@@ -119,6 +119,12 @@ class RecordingFolder : public Folder {
   mutable std::set<std::string> names_;
 };
 
+// A file's size and digests.
+Manifest::File DigestFile(const Folder& folder, const std::string& name) {
+  const auto source = folder.Open(name);
+  return {.name = name, .size = source->size(), .digests = DigestBlocks(*source)};
+}
+
 }  // namespace
 
 const Manifest::File* Manifest::Find(std::string_view name) const {
@@ -170,17 +176,32 @@ std::optional<Manifest> ReadManifest(const ByteSource& source) {
   return manifest;
 }
 
-Manifest::File DigestFile(const Folder& folder, const std::string& name) {
-  const auto source = folder.Open(name);
-  return {.name = name, .size = source->size(), .digests = DigestBlocks(*source)};
+std::optional<Manifest> FindManifest(const Folder& folder, const Commit& commit) {
+  try {
+    auto manifest = ReadManifest(*folder.Open(kManifestName));
+    if (manifest.has_value() && manifest->BelongsTo(folder, commit)) return manifest;
+  } catch (const IndexError&) {
+    // As if there were none.
+  }
+  return std::nullopt;
 }
 
-std::vector<std::string> FilesOf(const Folder& folder, const Commit& commit) {
+std::set<std::string> FilesOf(const Folder& folder, const SegmentInfo& segment) {
   const RecordingFolder recording(folder);
-  for (const SegmentInfo& segment : commit.segments) WholeSegment(recording, segment);
-  std::set<std::string> names = recording.names();
-  names.insert(CommitFileName(commit.generation));
-  return {names.begin(), names.end()};
+  WholeSegment(recording, segment);
+  return recording.names();
+}
+
+Manifest MakeManifest(const Folder& folder, const Commit& commit, const std::optional<Manifest>& known) {
+  std::set<std::string> names = {CommitFileName(commit.generation)};
+  for (const SegmentInfo& segment : commit.segments) names.merge(FilesOf(folder, segment));
+  Manifest manifest;
+  manifest.generation = commit.generation;
+  for (const std::string& name : names) {
+    const Manifest::File* const file = known.has_value() ? known->Find(name) : nullptr;
+    manifest.files.push_back(file != nullptr ? *file : DigestFile(folder, name));
+  }
+  return manifest;
 }
 
 }  // namespace vantrel::elastic::format

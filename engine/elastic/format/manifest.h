@@ -3,6 +3,7 @@
 #include <cstdint>
 #include <memory>
 #include <optional>
+#include <set>
 #include <string>
 #include <string_view>
 #include <vector>
@@ -58,11 +59,16 @@ std::string WriteManifest(const Manifest& manifest);
 // IndexError for a file larger than any manifest.
 std::optional<Manifest> ReadManifest(const ByteSource& source);
 
-// A file's size and digests. Throws IndexError where it cannot be read.
-Manifest::File DigestFile(const Folder& folder, const std::string& name);
+// The manifest that stands beside a commit, where it is whole and belongs to that very commit; else nothing. Throws
+// nothing about files that cannot be read: there is none then that could be relied on.
+std::optional<Manifest> FindManifest(const Folder& folder, const Commit& commit);
 
-// The names of the files that make up a commit, those of its segments and its own, as far as they are in the folder;
-// sorted. Throws IndexIoError where the system fails.
-std::vector<std::string> FilesOf(const Folder& folder, const Commit& commit);
+// The names of the files that make up a segment, as far as they are in the folder. Throws IndexIoError where the system
+// fails.
+std::set<std::string> FilesOf(const Folder& folder, const SegmentInfo& segment);
+
+// The manifest of a commit. What `known` has of its files, which are written once, is taken from there; the others are
+// read. Throws IndexError where the system does not let them be.
+Manifest MakeManifest(const Folder& folder, const Commit& commit, const std::optional<Manifest>& known = {});
 
 }  // namespace vantrel::elastic::format

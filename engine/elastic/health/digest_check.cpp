@@ -14,9 +14,6 @@ using format::kDigestBlock;
 
 constexpr uint32_t kUnderWay = std::numeric_limits<uint32_t>::max();
 
-// Small enough to stay in the processor's cache between being read and being digested.
-constexpr size_t kPiece = size_t{256} << 10;
-
 // Hands what is read on to the check.
 class CheckedSource : public format::ByteSource {
  public:
@@ -86,22 +83,14 @@ void FileDigestCheck::Return(uint64_t block, uint64_t to, DigestPtr digest) {
   found_ = found;
 }
 
-void FileDigestCheck::FinishBlock(uint64_t block, std::vector<uint8_t>& buffer) {
-  const uint64_t length = LengthOf(block);
-  for (uint64_t at = done_[block]; at < length;) {
-    const std::span<uint8_t> piece(buffer.data(), std::min<uint64_t>(buffer.size(), length - at));
-    const uint64_t offset = block * kDigestBlock + at;
-    source_->ReadAt(offset, piece);
-    Take(offset, piece);
-    at += piece.size();
-  }
-}
-
 void FileDigestCheck::Finish() {
   const std::string& file = source_->name();
   RequireEqual(Grade::kDamaged, file, 0, "the size in the manifest,", expected_.size, source_->size());
-  std::vector<uint8_t> buffer(std::min<uint64_t>(kPiece, expected_.size));
-  for (uint64_t block = 0; block < done_.size(); ++block) FinishBlock(block, buffer);
+  for (uint64_t block = 0; block < done_.size(); ++block) {
+    const uint64_t start = block * kDigestBlock;
+    format::ReadToDigest(*source_, start + done_[block], start + LengthOf(block),
+                         [this](uint64_t offset, std::span<const uint8_t> piece) { Take(offset, piece); });
+  }
   if (differing_ == 0) return;
   std::string found = "digest " + format::DigestText(found_);
   if (differing_ > 1)

@@ -42,7 +42,6 @@ class FileDigestCheck {
   uint64_t LengthOf(uint64_t block) const;
   Claimed Claim(uint64_t block, uint64_t from, uint64_t to);
   void Return(uint64_t block, uint64_t to, DigestPtr digest);
-  void FinishBlock(uint64_t block, std::vector<uint8_t>& buffer);
 
   std::shared_ptr<const format::ByteSource> source_;
   const format::Manifest::File& expected_;

@@ -11,21 +11,18 @@
 namespace vantrel::elastic {
 namespace {
 
-std::optional<format::Manifest> ReadOwnManifest(const format::Folder& folder) {
+std::optional<format::Manifest> FindNewestManifest(const format::Folder& folder) {
   try {
-    auto manifest = format::ReadManifest(*folder.Open(format::kManifestName));
-    if (manifest.has_value() && manifest->BelongsTo(folder, format::ReadNewestCommit(folder)))
-      return manifest;
+    return format::FindManifest(folder, format::ReadNewestCommit(folder));
   } catch (const IndexError&) {
-    // None that could be relied on.
+    return std::nullopt;  // without a commit to belong to
   }
-  return std::nullopt;
 }
 
 }  // namespace
 
 ManifestKeeper::ManifestKeeper(std::string folder)
-    : folder_(std::move(folder)), manifest_(ReadOwnManifest(format::DiskFolder(folder_))) {}
+    : folder_(std::move(folder)), manifest_(FindNewestManifest(format::DiskFolder(folder_))) {}
 
 void ManifestKeeper::Update() {
   try {
@@ -39,12 +36,7 @@ void ManifestKeeper::Write() {
   const format::DiskFolder folder(folder_);
   const format::Commit commit = format::ReadNewestCommit(folder);
   if (manifest_.has_value() && manifest_->generation == commit.generation) return;
-  format::Manifest next;
-  next.generation = commit.generation;
-  for (const std::string& name : format::FilesOf(folder, commit)) {
-    const format::Manifest::File* known = manifest_.has_value() ? manifest_->Find(name) : nullptr;
-    next.files.push_back(known != nullptr ? *known : format::DigestFile(folder, name));
-  }
+  format::Manifest next = format::MakeManifest(folder, commit, manifest_);
   const std::string text = format::WriteManifest(next);
   if (text.size() > format::kLargestManifest) return;
   WriteFileDurably(folder_, format::kManifestName, text);

@@ -15,8 +15,8 @@ class ManifestKeeper {
   // the files of an index are written once. So what decays in them meanwhile stays known.
   explicit ManifestKeeper(std::string folder);
 
-  // Whether the newest commit had a manifest when this was made, or was given one since.
-  bool has_manifest() const { return manifest_.has_value(); }
+  // That of the newest commit, or of the last one that was given one; nothing as long as there is none.
+  const std::optional<format::Manifest>& manifest() const { return manifest_; }
 
   // Gives the newest commit a manifest. Where the system does not let it, the commit stands without one, and a check
   // sees less; what manifest is left then belongs to an earlier commit.

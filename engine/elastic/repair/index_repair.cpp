@@ -147,7 +147,7 @@ RepairReport RepairIndex(const std::string& path) {
   if (report.is_clean) return report;
   ManifestKeeper manifest(path);
   checker.Fix();
-  if (manifest.has_manifest()) manifest.Update();
+  if (manifest.manifest().has_value()) manifest.Update();
   return report;
 }
 

@@ -115,8 +115,8 @@ class OwnManifestTest : public ::testing::Test {
  protected:
   OwnManifestTest() {
     folder_.files["segments_2"] = MemoryFile{.bytes = "the commit"};
-    manifest_.generation = commit_.generation = 2;
-    manifest_.files = {DigestFile(folder_, "segments_2")};
+    commit_.generation = 2;
+    manifest_ = MakeManifest(folder_, commit_);
   }
 
   MemoryFolder folder_;
