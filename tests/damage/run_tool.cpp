@@ -41,7 +41,7 @@ class Capture {
   int descriptor_;
 };
 
-[[noreturn]] void BecomeTool(std::vector<char*> arguments, const Capture& output, const Capture& errors) {
+[[noreturn]] void BecomeProgram(std::vector<char*> arguments, const Capture& output, const Capture& errors) {
   const rlimit no_core = {0, 0};
   setrlimit(RLIMIT_CORE, &no_core);
   const rlimit memory = {kMostMemory, kMostMemory};
@@ -57,17 +57,19 @@ class Capture {
 
 int RunsEvery() { return kIsSanitized ? 10 : 1; }
 
-ToolRun RunTool(const std::vector<std::string>& arguments) {
-  std::string program = QUORELASTIC_TOOL;
-  std::vector<std::string> copies = arguments;
-  std::vector<char*> pointers = {program.data()};
+ToolRun RunTool(const std::vector<std::string>& arguments) { return RunLimited(QUORELASTIC_TOOL, arguments); }
+
+ToolRun RunLimited(const std::string& program, const std::vector<std::string>& arguments) {
+  std::vector<std::string> copies = {program};
+  copies.insert(copies.end(), arguments.begin(), arguments.end());
+  std::vector<char*> pointers;
   for (std::string& argument : copies) pointers.push_back(argument.data());
   pointers.push_back(nullptr);
   const Capture output;
   const Capture errors;
   const pid_t child = fork();
   if (child < 0) throw std::system_error(errno, std::generic_category(), "fork");
-  if (child == 0) BecomeTool(std::move(pointers), output, errors);
+  if (child == 0) BecomeProgram(std::move(pointers), output, errors);
   ToolRun run;
   while (waitpid(child, &run.status, 0) < 0) {
     if (errno != EINTR) throw std::system_error(errno, std::generic_category(), "waitpid");

@@ -11,8 +11,11 @@ struct ToolRun {
   std::string errors;
 };
 
-// Runs the program with at most 2 GiB of address space (not where a sanitizer needs more) and 10 seconds, after
+// Runs a program with at most 2 GiB of address space (not where a sanitizer needs more) and 10 seconds, after
 // which SIGALRM ends it.
+ToolRun RunLimited(const std::string& program, const std::vector<std::string>& arguments);
+
+// The same for the tool.
 ToolRun RunTool(const std::vector<std::string>& arguments);
 
 // A run takes many times as long with a sanitizer: only each so many-th case is run then.

@@ -1,5 +1,6 @@
 // Damages small indexes of every kind, one file at a time, and runs each offline action of the real program on what is
-// left, with 2 GiB of memory and ten seconds: it must end by itself, or by an exception that it did not catch.
+// left, with 2 GiB of memory and ten seconds: it must end by itself, or by an exception that it did not catch. The
+// same for what a daemon does with an index, where no exception but the engine's own may come.
 
 #include <gmock/gmock.h>
 #include <lucene++/LuceneHeaders.h>
@@ -18,6 +19,9 @@
 
 #include "damage/damage.h"
 #include "damage/run_tool.h"
+#include "elastic/format/commit.h"
+#include "elastic/format/folder.h"
+#include "elastic/format/manifest.h"
 #include "engine/health/health_shapes.h"
 #include "run_size.h"
 #include "support/files.h"
@@ -27,6 +31,7 @@
 namespace quorelastic::testing {
 namespace {
 
+using ::testing::AllOf;
 using ::testing::AnyOf;
 using ::testing::HasSubstr;
 using ::testing::Not;
@@ -119,11 +124,38 @@ class ReliabilityDamage : public ::testing::TestWithParam<HealthShape> {
     return RunTool(arguments);
   }
 
-  // A repair changes the folder: it gets one of its own. No file is ever written in place.
-  ToolRun RunOnCopy(const Action& action, const std::vector<std::string>& options) const {
+  // What changes the folder gets one of its own. No file is ever written in place.
+  void MakeCopy() const {
     std::filesystem::remove_all(copy_);
-    std::filesystem::copy(index_, copy_, std::filesystem::copy_options::create_hard_links);
+    using Options = std::filesystem::copy_options;
+    std::filesystem::copy(index_, copy_, Options::create_hard_links | Options::recursive);
+  }
+
+  ToolRun RunOnCopy(const Action& action, const std::vector<std::string>& options) const {
+    MakeCopy();
     return Run(action, copy_, options);
+  }
+
+  // Makes the index one that the engine can search and write: with settings for its fields.
+  void WriteSettings() const {
+    std::string fields;
+    for (const std::string& field : contents_.fields) {
+      fields += R"({"name":")" + field +
+                R"(","type":"text","stored":true,"term_vector":"none","norms":true,"frequencies":true},)";
+    }
+    WriteFile(index_ + "/quorelastic.json",
+              R"({"version":1,"compound_files":true,"id_field":"own_id","fields":[)" + fields +
+                  R"({"name":"own_id","type":"keyword","stored":true,"term_vector":"none","norms":false,)" +
+                  R"("frequencies":false}]})");
+  }
+
+  std::string ManifestOfIndex() const {
+    const vantrel::elastic::format::DiskFolder folder(index_);
+    return WriteManifest(MakeManifest(folder, ReadNewestCommit(folder)));
+  }
+
+  ToolRun UseCopy(const std::pair<std::string, std::string>& term) const {
+    return RunLimited(USE_INDEX, {copy_, term.first, term.second});
   }
 
   ToolRun RunAny(const Action& action, const std::vector<std::string>& options) const {
@@ -194,6 +226,45 @@ TEST_P(ReliabilityDamage, EveryOfflineActionEndsByItselfOrByAnUncaughtException)
   }
   TellTally(damages);
   EXPECT_EQ(Run(kActions[4], index_, {"-f", "body", "-f", "body"}).errors, "clean\n");
+}
+
+// An index without a manifest is checked as a whole before it is used, one with a manifest block by block: then nothing
+// but what was written is ever answered. Without a digest are the settings, and without a checksum older commits.
+TEST_P(ReliabilityDamage, SearchingAndMergingEndsInAnAnswerOrAnErrorOfTheEngine) {
+  const int damages = RunSize("QUORELASTIC_USE_DAMAGES", 8) / RunsEvery();
+  WriteSettings();
+  const std::string manifest = ManifestOfIndex();
+  std::map<size_t, std::string> intact;
+  for (int i = 0; i < damages; ++i) {
+    const size_t number = Below(std::min<size_t>(contents_.terms.size(), 40));
+    const auto& term = contents_.terms[number];
+    if (!intact.contains(number)) {
+      MakeCopy();
+      intact[number] = UseCopy(term).output;
+      ASSERT_THAT(intact[number], AllOf(HasSubstr("*:*: "), Not(HasSubstr("error: open"))));
+    }
+    const std::vector<std::string> files = ListFolder(index_);
+    const Damage damage = RandomDamageTo(index_, files[Below(files.size())], random_);
+    for (const bool has_manifest : {false, true}) {
+      const DamagedFile damaged(index_, damage);
+      MakeCopy();
+      if (has_manifest) WriteFile(copy_ + "/quorelastic.manifest", manifest);
+      SCOPED_TRACE("damage " + std::to_string(i) + (has_manifest ? ", manifest" : "") + ", " + term.first +
+                   ":" + term.second + ": " + damage.Describe());
+      const ToolRun run = UseCopy(term);
+      ++tally_.runs;
+      EXPECT_EQ(run.status, 0) << run.output << run.errors;
+      const bool reported = run.output.find("error: ") != std::string::npos;
+      ++(reported ? tally_.reported : run.output == intact[number] ? tally_.alike : tally_.different);
+      const bool is_unnoticed = damage.file == "quorelastic.json" ||
+                                (GetParam().older_layout != nullptr && damage.file.starts_with("segments"));
+      if (has_manifest && !reported && !is_unnoticed) {
+        EXPECT_EQ(run.output, intact[number]);
+      }
+    }
+    if (HasFailure()) break;
+  }
+  TellTally(damages);
 }
 
 }  // namespace

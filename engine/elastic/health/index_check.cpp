@@ -111,6 +111,12 @@ class CommitRun {
 
   void Run() {
     findings_.Run("", [this] { CheckCommit(folder_, commit_); });
+    CheckSegments();
+    OpenTheRest();
+    FinishDigests();
+  }
+
+  void CheckSegments() {
     meter_.SetSegments(commit_.segments.size());
     for (size_t next = 0; next < commit_.segments.size();) {
       std::vector<std::unique_ptr<SegmentCheck>> batch;
@@ -122,8 +128,6 @@ class CommitRun {
       RunBatch(batch);
       FinishDigests();
     }
-    OpenTheRest();
-    FinishDigests();
   }
 
   Findings& findings() { return findings_; }
@@ -235,6 +239,13 @@ HealthReport CheckFolder(const format::Folder& folder, const HealthOptions& opti
     if (!is_overtaken) return report;
     if (left == 0) throw IndexError(folder.path(), "the index changes faster than it can be checked");
   }
+}
+
+std::vector<HealthFinding> CheckSegments(const format::Folder& folder, const format::Commit& commit) {
+  Meter meter({});
+  CommitRun run(folder, commit, ThreadsFor({}), meter);
+  run.CheckSegments();
+  return run.findings().Take();
 }
 
 }  // namespace vantrel::elastic::health

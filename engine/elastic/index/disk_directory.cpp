@@ -87,7 +87,7 @@ class DiskInput : public Lucene::BufferedIndexInput {
       source_->ReadAt(static_cast<uint64_t>(getFilePointer()),
                       std::span(bytes + offset, static_cast<size_t>(length)));
     } catch (const IndexError& error) {
-      directory_->NoteReadProblem(error);
+      directory_->NoteFailedReading(error);
       boost::throw_exception(Lucene::IOException(StringUtils::toUnicode(error.what())));
     }
   }
@@ -106,7 +106,8 @@ void SyncFile(const std::string& path) {
 
 }  // namespace
 
-DiskDirectory::DiskDirectory(const std::string& path) : BytePathDirectory(path), path_(path) {}
+DiskDirectory::DiskDirectory(const std::string& path, std::shared_ptr<LibraryGuard> guard)
+    : BytePathDirectory(path), path_(path), guard_(std::move(guard)) {}
 
 DiskDirectory::~DiskDirectory() = default;
 
@@ -122,6 +123,11 @@ std::string DiskDirectory::last_read_problem() const {
   return read_problem_;
 }
 
+void DiskDirectory::NoteFailedReading(const IndexError& error) {
+  NoteFailedReading();
+  NoteReadProblem(error);
+}
+
 void DiskDirectory::NoteReadProblem(const IndexError& error) {
   const std::lock_guard lock(read_problem_mutex_);
   read_problem_ = error.what();
@@ -135,6 +141,7 @@ Lucene::IndexOutputPtr DiskDirectory::createOutput(const Lucene::String& name) {
   // Never written over: readers may hold the old file open.
   if (unlink(path.c_str()) != 0 && errno != ENOENT) Fail(IndexIoError(path, "cannot replace file", errno));
   uncommitted_.insert(own_name);
+  if (guard_ != nullptr) guard_->NoteWritten(own_name);
   return newLucene<DiskOutput>(boost::static_pointer_cast<DiskDirectory>(shared_from_this()), path);
 }
 
@@ -144,9 +151,11 @@ Lucene::IndexInputPtr DiskDirectory::openInput(const Lucene::String& name) {
 
 Lucene::IndexInputPtr DiskDirectory::openInput(const Lucene::String& name, int32_t buffer_size) {
   ensureOpen();
+  const std::string own_name = StringUtils::toUTF8(name);
   try {
-    return newLucene<DiskInput>(boost::static_pointer_cast<DiskDirectory>(shared_from_this()),
-                                format::DiskFolder(path_).Open(StringUtils::toUTF8(name)), buffer_size);
+    return newLucene<DiskInput>(
+        boost::static_pointer_cast<DiskDirectory>(shared_from_this()),
+        guard_ != nullptr ? guard_->Open(own_name) : format::DiskFolder(path_).Open(own_name), buffer_size);
   } catch (const IndexError& error) {
     NoteReadProblem(error);
     boost::throw_exception(Lucene::FileNotFoundException(StringUtils::toUnicode(error.what())));
@@ -178,6 +187,7 @@ void DiskDirectory::deleteFile(const Lucene::String& name) {
     boost::throw_exception(Lucene::IOException(StringUtils::toUnicode(error.what())));
   }
   uncommitted_.erase(own_name);
+  if (guard_ != nullptr) guard_->NoteDeleted(own_name);
 }
 
 }  // namespace vantrel::elastic

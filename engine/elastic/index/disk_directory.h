@@ -1,11 +1,14 @@
 #pragma once
 
+#include <atomic>
+#include <memory>
 #include <mutex>
 #include <optional>
 #include <set>
 #include <string>
 
 #include "elastic/index/byte_path_directory.h"
+#include "elastic/index/library_guard.h"
 #include "vantrel/elastic/index_error.h"
 
 namespace vantrel::elastic {
@@ -20,6 +23,7 @@ namespace vantrel::elastic {
 // - It never syncs the folder, so that a new file's name could be lost with the power. Here a commit's folder
 //   is synced with it, before the library deletes the files of the commit before.
 // - It reads endlessly where the medium fails; here that is an error that names the file.
+// - It takes what it reads on trust. Here a guard, if there is one, has files verified.
 //
 // Exceptions are the library's own (Lucene::IOException), as it tidies up after no other. For one thread at a
 // time, but for openInput and what comes from it.
@@ -27,7 +31,7 @@ class DiskDirectory : public BytePathDirectory {
  public:
   // `path` is used byte for byte; PrepareIndexLibrary() must have been called. No lock factory is taken: the writer
   // must hold our own lock, and the library's keeps nobody out.
-  explicit DiskDirectory(const std::string& path);
+  explicit DiskDirectory(const std::string& path, std::shared_ptr<LibraryGuard> guard = nullptr);
   ~DiskDirectory() override;
 
   // The first failure; nothing as long as all went well. To be asked after each operation of the library that
@@ -38,11 +42,17 @@ class DiskDirectory : public BytePathDirectory {
   // be harmless, but where the library fails without a reason, this is it.
   std::string last_read_problem() const;
 
+  // Whether something has failed that read through this directory. The library keeps for good what it has half read,
+  // and crashes when it closes a reader that has failed on norms: so its readers are then not to be used again, and
+  // not to be closed, but dropped.
+  bool has_failed_reading() const { return has_failed_reading_; }
+
   // Takes note of a failed write and throws it as the library's exception.
   [[noreturn]] void Fail(const IndexIoError& error);
 
-  // The same for a failed read, which does not stick. For any thread.
-  void NoteReadProblem(const IndexError& error);
+  // Takes note of a failure to read, with what is known of it. For any thread.
+  void NoteFailedReading() { has_failed_reading_ = true; }
+  void NoteFailedReading(const IndexError& error);
 
   Lucene::IndexOutputPtr createOutput(const Lucene::String& name) override;
   Lucene::IndexInputPtr openInput(const Lucene::String& name) override;
@@ -51,11 +61,16 @@ class DiskDirectory : public BytePathDirectory {
   void deleteFile(const Lucene::String& name) override;
 
  private:
+  void NoteReadProblem(const IndexError& error);
+
   std::string path_;
+  std::shared_ptr<LibraryGuard>
+      guard_;  // may be shared with other directories of the same folder; may be empty
   std::set<std::string> uncommitted_;  // names created since the last commit
   std::optional<IndexIoError> failure_;
   mutable std::mutex read_problem_mutex_;
   std::string read_problem_;
+  std::atomic<bool> has_failed_reading_ = false;
 };
 
 }  // namespace vantrel::elastic

@@ -19,6 +19,7 @@
 #include "elastic/index/durable_file.h"
 #include "elastic/index/index_statistics.h"
 #include "elastic/index/index_text.h"
+#include "elastic/index/library_guard.h"
 #include "elastic/index/library_warm_up.h"
 #include "elastic/index/library_writer.h"
 #include "elastic/index/settings_file.h"
@@ -93,7 +94,7 @@ IndexSettings WithIdField(IndexSettings settings) {
 
 class Index::Impl {
  public:
-  explicit Impl(std::string path) : path_(std::move(path)), snapshots_(path_) {}
+  explicit Impl(std::string path) : path_(std::move(path)), snapshots_(path_, guard_) {}
 
   const std::string& path() const { return path_; }
   const IndexSettings& settings() { return Opened().settings; }
@@ -112,7 +113,7 @@ class Index::Impl {
 
   void StartWriting(WriteLock lock, LibraryWriter::Start start) {
     lock_ = std::move(lock);
-    writer_.emplace(path_, *lock_, settings(), start);
+    writer_.emplace(path_, *lock_, settings(), start, guard_);
   }
 
   // Runs `operation` on the writer, which is opened first where need be. A writer that failed is given up. One
@@ -123,8 +124,9 @@ class Index::Impl {
     const std::lock_guard guard(write_mutex_);
     if (!lock_.has_value()) lock_.emplace(path_);
     if (!writer_.has_value()) {
-      CheckCommit();
-      writer_.emplace(path_, *lock_, settings(), LibraryWriter::Start::kExistingIndex);
+      format::UseNewestCommit(format::DiskFolder(path_),
+                              [this](const format::Commit& commit) { guard_->Admit(commit); });
+      writer_.emplace(path_, *lock_, settings(), LibraryWriter::Start::kExistingIndex, guard_);
     }
     RunWriter(operation);
   }
@@ -153,11 +155,6 @@ class Index::Impl {
     if (merging == Merging::kAllowed) MergeSegments();
   }
 
-  // Decodes the newest commit within bounds: the library, which trusts its bytes, reads it next.
-  void CheckCommit() const {
-    format::UseNewestCommit(format::DiskFolder(path_), [](const format::Commit&) {});
-  }
-
  private:
   struct OpenedIndex {
     OpenedIndex(const std::string& path, const IndexSettings& read)
@@ -173,7 +170,7 @@ class Index::Impl {
       PrepareIndexLibrary();
       WarmUpIndexLibrary();
       CheckPath(path_);
-      CheckCommit();
+      format::ReadNewestCommit(format::DiskFolder(path_));  // is there
       open_.emplace(path_, ReadSettings(path_));
     }
     return *open_;
@@ -201,6 +198,7 @@ class Index::Impl {
   }
 
   const std::string path_;
+  const std::shared_ptr<LibraryGuard> guard_ = std::make_shared<LibraryGuard>(path_);
   SnapshotKeeper snapshots_;
   std::mutex open_mutex_;
   std::optional<OpenedIndex> open_;  // once it is there, it stays

@@ -34,16 +34,16 @@ class DeferrableMerges : public Lucene::SerialMergeScheduler {
 };
 
 LibraryWriter::LibraryWriter(std::string folder, const WriteLock& /*lock*/, const IndexSettings& settings,
-                             Start start)
-    : folder_(std::move(folder)), manifest_(folder_) {
+                             Start start, std::shared_ptr<LibraryGuard> guard)
+    : folder_(std::move(folder)), guard_(std::move(guard)), manifest_(folder_) {
   Run("cannot open the index for writing", [&] { Open(settings, start); });
-  if (start == Start::kEmptyIndex) manifest_.Update();
+  if (start == Start::kEmptyIndex) UpdateManifest();
 }
 
 LibraryWriter::~LibraryWriter() { RollBack(); }
 
 void LibraryWriter::Open(const IndexSettings& settings, Start start) {
-  directory_ = newLucene<DiskDirectory>(folder_);
+  directory_ = newLucene<DiskDirectory>(folder_, guard_);
   writer_ =
       newLucene<Lucene::IndexWriter>(directory_, NewFieldAnalyzer(settings), start == Start::kEmptyIndex,
                                      Lucene::IndexWriter::MaxFieldLengthUNLIMITED);
@@ -77,7 +77,7 @@ void LibraryWriter::Commit() {
   merges_->set_deferred(true);
   Run("cannot commit", [&] { writer_->commit(); });
   merges_->set_deferred(false);
-  manifest_.Update();
+  UpdateManifest();
 }
 
 void LibraryWriter::MergeSegments() {
@@ -85,7 +85,12 @@ void LibraryWriter::MergeSegments() {
     writer_->maybeMerge();
     writer_->commit();
   });
+  UpdateManifest();
+}
+
+void LibraryWriter::UpdateManifest() {
   manifest_.Update();
+  if (manifest_.manifest().has_value()) guard_->Take(*manifest_.manifest());
 }
 
 void LibraryWriter::Run(const char* purpose, const std::function<void()>& operation) {

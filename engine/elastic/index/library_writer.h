@@ -3,9 +3,11 @@
 #include <lucene++/LuceneHeaders.h>
 
 #include <functional>
+#include <memory>
 #include <string>
 
 #include "elastic/index/disk_directory.h"
+#include "elastic/index/library_guard.h"
 #include "elastic/index/manifest_keeper.h"
 #include "vantrel/elastic/index_settings.h"
 #include "vantrel/elastic/write_lock.h"
@@ -22,9 +24,11 @@ class LibraryWriter {
   enum class Start { kEmptyIndex, kExistingIndex };
 
   // `lock` stands on `folder` as long as the writer lives. With kEmptyIndex, an empty commit is made at once. Every
-  // commit is given a manifest, if the system lets it have one.
+  // commit is given a manifest, if the system lets it have one. What an existing index holds is read through `guard`,
+  // which is told of what is written.
   // Throws IndexError.
-  LibraryWriter(std::string folder, const WriteLock& lock, const IndexSettings& settings, Start start);
+  LibraryWriter(std::string folder, const WriteLock& lock, const IndexSettings& settings, Start start,
+                std::shared_ptr<LibraryGuard> guard);
   LibraryWriter(const LibraryWriter&) = delete;
   LibraryWriter& operator=(const LibraryWriter&) = delete;
   ~LibraryWriter();
@@ -44,9 +48,11 @@ class LibraryWriter {
   // Runs an operation of the library; `purpose` says what cannot be done where it fails.
   void Run(const char* purpose, const std::function<void()>& operation);
   void Open(const IndexSettings& settings, Start start);
+  void UpdateManifest();
   void RollBack();
 
   std::string folder_;
+  std::shared_ptr<LibraryGuard> guard_;
   boost::shared_ptr<DiskDirectory> directory_;
   boost::shared_ptr<DeferrableMerges> merges_;
   Lucene::IndexWriterPtr writer_;

@@ -14,9 +14,9 @@ namespace vantrel::elastic::reading {
 // it, before it does: the commit, the tables of compound files, field names, the dictionary's header, the whole index
 // over it, and deleted documents. Nothing else is read then.
 //
-// Only what the library could crash on, run astray on or take gigabytes for is refused. Where it finds out by itself
-// (a version that is too new, a wrong checksum, a file that is too short, a missing one), it is left to it. For one
-// thread at a time.
+// Refused is what the library could crash on, run astray on or take gigabytes for, and what contradicts itself, such as
+// deleted documents counted wrongly. Where the library finds out by itself (a version that is too new, a wrong
+// checksum, a file that is too short, a missing one), it is left to it. For one thread at a time.
 class OpeningCheck {
  public:
   // The place of `term` in the dictionaries is noted on the way.

@@ -117,12 +117,21 @@ class SearchRun {
   }
 
   static void Read(const SearchedIndex& index, const char* purpose, const std::function<void()>& operation) {
-    RunReading(index.path, index.snapshot->directory(), purpose, [&] {
+    const auto& directory = index.snapshot->directory();
+    RunReading(index.path, directory, purpose, [&] {
       try {
         operation();
       } catch (const Lucene::TimeExceededException&) {
         throw SearchTimeoutError();
+      } catch (const SearchError&) {
+        throw;
+      } catch (...) {
+        directory->NoteFailedReading();
+        throw;
       }
+      // In another search on the same snapshot, which left behind what is not whole.
+      if (directory->has_failed_reading())
+        throw IndexError(index.path, std::string(purpose) + ": " + directory->last_read_problem());
     });
   }
 

@@ -5,9 +5,7 @@
 #include <utility>
 
 #include "elastic/format/commit.h"
-#include "elastic/format/deletions.h"
 #include "elastic/format/folder.h"
-#include "elastic/format/segment_files.h"
 #include "elastic/search/library_failure.h"
 #include "vantrel/elastic/index_error.h"
 
@@ -17,28 +15,13 @@ namespace {
 // Longer than the steps of any file system's clock.
 constexpr time_t kSettledSeconds = 3;
 
-// The newest commit's generation, when all of it has been decoded that is decoded at all. Of one that is known
-// already, just the commit itself.
-int64_t CheckNewestCommit(const std::string& folder_path, int64_t known_generation) {
-  const format::DiskFolder folder(folder_path);
-  int64_t generation = 0;
-  format::UseNewestCommit(folder, [&](format::Commit commit) {
-    generation = commit.generation;
-    if (generation == known_generation) return;
-    for (format::SegmentInfo& segment : commit.segments) {
-      const format::SegmentFiles files = format::OpenSegment(folder, std::move(segment));
-      if (files.deletions != nullptr) format::Deletions(files.deletions, files.info.document_count);
-    }
-  });
-  return generation;
-}
-
 }  // namespace
 
 Snapshot::Snapshot(boost::shared_ptr<DiskDirectory> directory, Lucene::IndexReaderPtr reader)
     : directory_(std::move(directory)), reader_(std::move(reader)) {}
 
 Snapshot::~Snapshot() {
+  if (directory_->has_failed_reading()) return;
   try {
     reader_->close();
   } catch (...) {
@@ -46,17 +29,22 @@ Snapshot::~Snapshot() {
   }
 }
 
-SnapshotKeeper::SnapshotKeeper(std::string folder) : folder_(std::move(folder)) {}
+SnapshotKeeper::SnapshotKeeper(std::string folder, std::shared_ptr<LibraryGuard> guard)
+    : folder_(std::move(folder)), guard_(std::move(guard)) {}
 
 std::shared_ptr<const Snapshot> SnapshotKeeper::Newest() {
   const std::lock_guard lock(mutex_);
+  if (snapshot_ != nullptr && snapshot_->directory()->has_failed_reading()) snapshot_.reset();
   const FolderState state = Look();
   const bool same_folder = state.device == state_.device && state.inode == state_.inode;
   const bool unchanged = same_folder && state_.settled && state.changed.tv_sec == state_.changed.tv_sec &&
                          state.changed.tv_nsec == state_.changed.tv_nsec;
   if (snapshot_ != nullptr && unchanged) return snapshot_;
-  if (!same_folder) snapshot_.reset();
-  const int64_t generation = CheckNewestCommit(folder_, snapshot_ == nullptr ? 0 : generation_);
+  if (!same_folder && snapshot_ != nullptr) {
+    snapshot_.reset();
+    guard_->Forget();
+  }
+  const int64_t generation = AdmitNewestCommit();
   if (snapshot_ == nullptr || generation != generation_) Open(generation);
   state_ = state;
   return snapshot_;
@@ -69,10 +57,21 @@ SnapshotKeeper::FolderState SnapshotKeeper::Look() const {
   return {status.st_dev, status.st_ino, status.st_mtim, age >= kSettledSeconds};
 }
 
+// Returns its generation.
+int64_t SnapshotKeeper::AdmitNewestCommit() {
+  int64_t generation = 0;
+  format::UseNewestCommit(format::DiskFolder(folder_), [&](const format::Commit& commit) {
+    if (snapshot_ == nullptr || commit.generation != generation_) guard_->Admit(commit);
+    generation = commit.generation;
+  });
+  return generation;
+}
+
 void SnapshotKeeper::Open(int64_t generation) {
   // An older commit than the one at hand is that of another index, put in its place.
   const auto before = generation > generation_ ? snapshot_ : nullptr;
-  const auto directory = before == nullptr ? Lucene::newLucene<DiskDirectory>(folder_) : before->directory();
+  const auto directory =
+      before == nullptr ? Lucene::newLucene<DiskDirectory>(folder_, guard_) : before->directory();
   RunReading(folder_, directory, "cannot open the index for searching", [&] {
     const Lucene::IndexReaderPtr reader =
         before == nullptr ? Lucene::IndexReader::open(directory, true) : before->reader()->reopen(true);

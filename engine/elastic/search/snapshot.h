@@ -9,6 +9,7 @@
 #include <string>
 
 #include "elastic/index/disk_directory.h"
+#include "elastic/index/library_guard.h"
 
 namespace vantrel::elastic {
 
@@ -32,12 +33,11 @@ class Snapshot {
 // Has the newest commit of a folder at hand. For any thread.
 class SnapshotKeeper {
  public:
-  explicit SnapshotKeeper(std::string folder);
+  // The index library reads through `guard`.
+  SnapshotKeeper(std::string folder, std::shared_ptr<LibraryGuard> guard);
 
   // The newest commit when this was called, or a later one. While the folder is as it was, that costs one look
-  // at its status; after a new commit, just the new segments are opened. The commit and what it says of
-  // deleted documents are decoded within bounds before the library, which trusts its bytes, reads them. Throws
-  // IndexError.
+  // at its status; after a new commit, just the new segments are opened. Throws IndexError.
   std::shared_ptr<const Snapshot> Newest();
 
  private:
@@ -50,9 +50,11 @@ class SnapshotKeeper {
   };
 
   FolderState Look() const;
+  int64_t AdmitNewestCommit();
   void Open(int64_t generation);
 
   std::string folder_;
+  std::shared_ptr<LibraryGuard> guard_;
   std::mutex mutex_;
   FolderState state_;
   int64_t generation_ = 0;

@@ -14,9 +14,10 @@ namespace vantrel::elastic {
 // trust; so all that it is going to read is checked first: while it opens the index, and before the lookup. It takes
 // about as long as the library's own reading, whatever else is in the index.
 //
-// What the library could crash on, run astray on or take gigabytes for is thrown as Lucene::CorruptIndexException,
-// with the file and the offset; what it finds out itself it says in its own words. Nothing in the folder is created,
-// locked or changed, and a writer may go on beside it. For one thread at a time.
+// What the library could crash on, run astray on or take gigabytes for, and what contradicts itself on the way there,
+// is thrown as Lucene::CorruptIndexException, with the file and the offset; what the library finds out itself it says
+// in its own words. Nothing in the folder is created, locked or changed, and a writer may go on beside it. For one
+// thread at a time.
 class VANTREL_ELASTIC_EXPORT CheckedReader {
  public:
   // For positions of a term, or for a term vector. `path` is used byte for byte. Throws what the library throws.

@@ -58,8 +58,11 @@ struct AnalyzedToken {
 //   any other         disk, memory or files failed; where a change was under way, every change since the last
 //                     commit is lost, and the next one starts anew from that commit
 //
-// Before it writes, the commit is checked, but not yet the segments: the index library may crash over damage in
-// one that it has to merge or to delete from.
+// Nothing damaged reaches the index library, which could crash on it. Files that the commit's manifest knows are
+// compared with it, each block of 1 MiB when it is first read; what differs is an error that names the file, and
+// whatever does not read that block goes on. A commit without a manifest is checked as a whole when it is first
+// searched or written to (CheckIndexHealth, about a second for each GB), and refused where it is unsafe; for a minute
+// then, it is not checked again.
 class VANTREL_ELASTIC_EXPORT Index {
  public:
   // Makes an empty index in the folder `path`, taken byte for byte, which is created where it is missing; its

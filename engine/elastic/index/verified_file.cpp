@@ -1,0 +1,65 @@
+#include "elastic/index/verified_file.h"
+
+#include <algorithm>
+#include <utility>
+
+#include "elastic/format/block_digest.h"
+#include "vantrel/elastic/index_error.h"
+
+namespace vantrel::elastic {
+
+namespace {
+
+using format::kDigestBlock;
+
+void VerifyBlock(const format::ByteSource& file, const format::Manifest::File& expected, uint64_t block) {
+  const uint64_t digest = format::DigestOfBlock(file, block);
+  if (digest == expected.digests[block]) return;
+  throw IndexDamagedError(file.name(), block * kDigestBlock,
+                          "the block that begins here is not what was written: its digest is " +
+                              format::DigestText(digest) + ", not " +
+                              format::DigestText(expected.digests[block]));
+}
+
+}  // namespace
+
+void FileVerification::Expect(const format::Manifest::File& expected) {
+  const std::lock_guard lock(mutex_);
+  if (expected_ != nullptr) return;
+  is_verified_ = std::make_unique<std::atomic<bool>[]>(expected.digests.size());
+  expected_ = std::make_unique<const format::Manifest::File>(expected);
+  known_.store(expected_.get(), std::memory_order_release);
+}
+
+void FileVerification::VerifySize(const format::ByteSource& file) const {
+  const format::Manifest::File* const expected = this->expected();
+  if (expected == nullptr || file.size() == expected->size) return;
+  throw IndexDamagedError(file.name(), std::min(file.size(), expected->size),
+                          "the file is not what was written: it has " + std::to_string(file.size()) +
+                              " bytes, not " + std::to_string(expected->size));
+}
+
+void FileVerification::Verify(const format::ByteSource& file, uint64_t offset, uint64_t length) {
+  const format::Manifest::File* const expected = this->expected();
+  if (expected == nullptr || length == 0) return;
+  VerifySize(file);
+  const uint64_t last = (offset + length - 1) / kDigestBlock;
+  for (uint64_t block = offset / kDigestBlock; block <= last; ++block) {
+    if (is_verified_[block].load(std::memory_order_relaxed)) continue;
+    VerifyBlock(file, *expected, block);
+    is_verified_[block].store(true, std::memory_order_relaxed);
+  }
+}
+
+VerifiedFile::VerifiedFile(std::shared_ptr<const format::ByteSource> file,
+                           std::shared_ptr<FileVerification> verification)
+    : file_(std::move(file)), verification_(std::move(verification)) {
+  verification_->VerifySize(*file_);
+}
+
+void VerifiedFile::ReadAt(uint64_t offset, std::span<uint8_t> out) const {
+  verification_->Verify(*file_, offset, out.size());
+  file_->ReadAt(offset, out);
+}
+
+}  // namespace vantrel::elastic
