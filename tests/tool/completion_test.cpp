@@ -162,8 +162,11 @@ TEST_F(IndexCompletionTest, OffersTheIndexesOfTheDaemon) {
 }
 
 TEST_F(IndexCompletionTest, OffersNoneWhereTheFolderCannotBeRead) {
-  fs::remove_all(sandbox_.data_root() + "/books");
+  fs::create_directory(sandbox_.data_root() + "/books");
+  EXPECT_THAT(Complete({"--Index", ""}), ElementsAre("books"));
+  fs::permissions(sandbox_.data_root(), fs::perms::none);
   EXPECT_THAT(Complete({"--Index", ""}), IsEmpty());
+  fs::permissions(sandbox_.data_root(), fs::perms::owner_all);
 }
 
 }  // namespace
