@@ -63,6 +63,7 @@ TEST_F(ProtocolManual, DescribesTheCommandsInTheirOrderAndNoOther) {
 
 TEST_F(ProtocolManual, ListsEveryErrorCodeAsItIs) {
   std::vector<Entry> codes;
+  codes.reserve(kErrorTable.size());
   for (const ErrorEntry& entry : kErrorTable) codes.emplace_back(entry.text, entry.meaning);
   EXPECT_EQ(Entries(page_.Find("ERROR CODES")), codes);
 }
