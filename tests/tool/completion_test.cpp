@@ -61,6 +61,12 @@ Strings WithDashes(const std::string& dashes, Strings names) {
   return names;
 }
 
+TEST(CompletionTest, IsForTheTool) {
+  const RunResult run = RunCommand({"bash", "--norc", "-c", "source \"$1\"; complete -p quorelastic", "bash",
+                                    RepositoryPath("packaging/completion/quorelastic")});
+  EXPECT_EQ(run.out, "complete -F _quorelastic quorelastic\n") << run;
+}
+
 TEST(CompletionTest, OffersEveryOptionOfTheTool) {
   const Strings all = WithDashes("--", ReadOptionTable());
   EXPECT_EQ(Complete({""}), all);
