@@ -7,7 +7,6 @@
 #include <csignal>
 #include <filesystem>
 #include <optional>
-#include <regex>
 #include <string>
 #include <thread>
 #include <vector>
@@ -15,6 +14,7 @@
 #include "support/files.h"
 #include "support/manual_page.h"
 #include "support/sandbox_test.h"
+#include "support/text_search.h"
 #include "support/tool_run.h"
 #include "tool/inspection.h"
 
@@ -37,19 +37,12 @@ std::vector<Example> ReadExamples(const ManualPage::Section& section) {
     } else if (examples.empty()) {
       continue;
     } else if (line.starts_with("> ")) {
-      examples.back().command += "\n" + line.substr(2);
+      examples.back().command.append("\n").append(line, 2);
     } else {
       examples.back().output.push_back(line);
     }
   }
   return examples;
-}
-
-// Three dots stand for anything.
-std::string ToPattern(const std::string& line) {
-  static const std::regex marks(R"([.^$|()\[\]{}*+?\\])");
-  static const std::regex dots(R"(\\\.\\\.\\\.)");
-  return std::regex_replace(std::regex_replace(line, marks, R"(\$&)"), dots, ".*");
 }
 
 void ReplaceAll(std::string& text, const std::string& what, const std::string& with) {
@@ -112,7 +105,7 @@ class ManualExamplesTest : public SandboxTest {
     EXPECT_EQ(example.output.size(), actual.size()) << example.command << "\n"
                                                     << ::testing::PrintToString(actual);
     for (size_t i = 0; i < std::min(example.output.size(), actual.size()); ++i) {
-      EXPECT_TRUE(std::regex_match(actual[i], std::regex(ToPattern(example.output[i]))))
+      EXPECT_TRUE(IsAsShown(actual[i], example.output[i]))
           << example.command << "\nthe manual: " << example.output[i] << "\nthe tool:   " << actual[i];
     }
   }
