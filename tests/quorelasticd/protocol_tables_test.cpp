@@ -9,6 +9,7 @@
 #include "base/limits.h"
 #include "commands/command_table.h"
 #include "errors/error_code.h"
+#include "member_rows.h"
 #include "options.h"
 #include "protocol_document.h"
 #include "quordaemon/wire.h"
@@ -23,15 +24,6 @@ using Row = std::vector<std::string>;
 
 std::string Code(const std::string& text) { return "`" + text + "`"; }
 
-void AddRows(const Shape& shape, const std::string& prefix, std::vector<Row>& rows) {
-  for (const Member& member : shape.members) {
-    const std::string name = prefix + member.name;
-    rows.push_back({Code(name), Describe(member.shape), member.is_required ? "yes" : "no", member.meaning});
-    if (member.shape.kind == Shape::Kind::kArray) AddRows(member.shape.of.front(), name + "[].", rows);
-    AddRows(member.shape, name + ".", rows);
-  }
-}
-
 class ProtocolTables : public ::testing::Test {
  protected:
   const ProtocolDocument document_ = ReadProtocolDocument();
@@ -43,7 +35,9 @@ TEST_F(ProtocolTables, EveryCommandIsDocumentedAsItIs) {
     ASSERT_NE(section, document_.sections.end()) << command.name;
     EXPECT_EQ(section->second.paragraph, std::vector<std::string>{command.summary});
     std::vector<Row> rows;
-    AddRows(command.data, "", rows);
+    for (const MemberRow& row : MemberRows(command.data)) {
+      rows.push_back({Code(row.name), row.type, row.is_required ? "yes" : "no", row.meaning});
+    }
     EXPECT_EQ(section->second.table, rows) << command.name;
   }
 }
