@@ -12,3 +12,7 @@ if(CMAKE_BUILD_TYPE STREQUAL "Release" AND NOT QUORELASTIC_SANITIZE)
   # Of two maps that fit, the last one holds.
   add_compile_options("-ffile-prefix-map=${PROJECT_SOURCE_DIR}=." "-ffile-prefix-map=${PROJECT_BINARY_DIR}=./build")
 endif()
+
+# Programs find the build's own libraries from where they stand themselves: the length of another path would be left in
+# them when they are installed.
+set(CMAKE_BUILD_RPATH_USE_ORIGIN ON)
