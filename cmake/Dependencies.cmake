@@ -12,6 +12,9 @@ find_package(Threads REQUIRED)
 add_library(quorelastic_lucene INTERFACE)
 target_include_directories(quorelastic_lucene SYSTEM INTERFACE ${LUCENE_INCLUDE_DIRS})
 target_link_libraries(quorelastic_lucene INTERFACE PkgConfig::LUCENE Boost::filesystem Boost::system Boost::thread)
+# Our public headers include its own.
+set_property(TARGET quorelastic_lucene PROPERTY EXPORT_NAME lucene)
+install(TARGETS quorelastic_lucene EXPORT quorelastic)
 
 # The daemon's.
 find_package(Boost 1.74 REQUIRED COMPONENTS program_options)

@@ -8,6 +8,7 @@
 #include <boost/asio/thread_pool.hpp>
 #include <chrono>
 #include <csignal>
+#include <cstdint>
 #include <exception>
 #include <iostream>
 #include <optional>
@@ -57,6 +58,13 @@ void TellReady(const std::string& socket) {
   sd_notifyf(0, "READY=1\nSTATUS=Serving on %s", socket.c_str());
 }
 
+// Where the service manager wants to be told, it ends a daemon that does not tell.
+void TellAlive(Server& server) {
+  uint64_t most = 0;  // microseconds between two times
+  if (sd_watchdog_enabled(0, &most) <= 0) return;
+  server.BeatEvery(std::chrono::microseconds(most / 3), [] { sd_notify(0, "WATCHDOG=1"); });
+}
+
 void TellStopping() { sd_notify(0, "STOPPING=1\nSTATUS=Finishing what is running"); }
 
 // An index takes several descriptors; the usual soft limit is there for programs that cannot count beyond it.
@@ -88,7 +96,8 @@ int Serve(const Options& options) {
   CommandService service(daemon);
   Server server(listener.Release(), service, LimitsOf(options), statistics.connections);
   ShutdownWatch watch(std::chrono::seconds(options.shutdown_timeout) + kGrace);
-  TellReady(options.socket);
+  TellAlive(server);
+  TellReady(listener.path());
   server.Run([&] {
     TellStopping();
     watch.Start();

@@ -36,6 +36,13 @@ int ActivatedSocket() {
   return SD_LISTEN_FDS_START;
 }
 
+std::string PathOf(int sock) {
+  sockaddr_un address{};
+  socklen_t length = sizeof address;
+  if (getsockname(sock, reinterpret_cast<sockaddr*>(&address), &length) != 0) return "";
+  return {address.sun_path, strnlen(address.sun_path, sizeof address.sun_path)};
+}
+
 sockaddr_un AddressOf(const std::string& path) {
   sockaddr_un address{};
   address.sun_family = AF_UNIX;
@@ -74,9 +81,13 @@ int Bind(const std::string& path) {
 }  // namespace
 
 Listener::Listener(const std::string& path) : sock_(ActivatedSocket()) {
-  if (sock_ != -1) return;
+  if (sock_ != -1) {
+    path_ = PathOf(sock_);
+    return;
+  }
   sock_ = Bind(path);
-  bound_path_ = path;
+  path_ = path;
+  is_bound_here_ = true;
   lstat(path.c_str(), &bound_file_);
 }
 
@@ -84,8 +95,8 @@ Listener::~Listener() {
   if (sock_ != -1) close(sock_);
   // Another daemon may have taken the place over since this one stopped to listen.
   struct stat status {};
-  if (bound_path_.empty() || lstat(bound_path_.c_str(), &status) != 0) return;
-  if (status.st_dev == bound_file_.st_dev && status.st_ino == bound_file_.st_ino) unlink(bound_path_.c_str());
+  if (!is_bound_here_ || lstat(path_.c_str(), &status) != 0) return;
+  if (status.st_dev == bound_file_.st_dev && status.st_ino == bound_file_.st_ino) unlink(path_.c_str());
 }
 
 int Listener::Release() { return std::exchange(sock_, -1); }

@@ -19,11 +19,15 @@ class Listener {
   // Removes the file of a socket that we bound ourselves. What Release() gave away stays open.
   ~Listener();
 
+  // Where the socket is; empty where the service manager's has no path.
+  const std::string& path() const { return path_; }
+
   // Gives the listening descriptor away.
   int Release();
 
  private:
-  std::string bound_path_;  // empty when the service manager owns the file
+  std::string path_;
+  bool is_bound_here_ = false;  // else the service manager owns the file
   struct stat bound_file_ {};
   int sock_ = -1;
 };

@@ -32,10 +32,25 @@ Server::Server(int listener, Service& service, const ServerLimits& limits,
       strand_(asio::make_strand(io_)),
       acceptor_(strand_, asio::local::stream_protocol(), listener),
       signals_(strand_, SIGTERM, SIGINT),
+      heart_(strand_),
       pause_(strand_),
       deadline_(strand_) {}
 
 Server::~Server() = default;
+
+void Server::BeatEvery(std::chrono::microseconds interval, std::function<void()> beat) {
+  beat_interval_ = interval;
+  beat_ = std::move(beat);
+}
+
+void Server::Beat() {
+  if (!beat_ || stopping_) return;
+  beat_();
+  heart_.expires_after(beat_interval_);
+  heart_.async_wait([this](error_code error) {
+    if (!error) Beat();
+  });
+}
 
 void Server::Run(const std::function<void()>& on_stop) {
   on_stop_ = on_stop;
@@ -44,7 +59,10 @@ void Server::Run(const std::function<void()>& on_stop) {
     spdlog::info("signal {}: finishing what is running", signal);
     BeginStop();
   });
-  asio::post(strand_, [this] { Accept(); });
+  asio::post(strand_, [this] {
+    Accept();
+    Beat();
+  });
   std::vector<std::thread> threads;
   for (size_t i = 1; i < limits_.threads; ++i) threads.emplace_back([this] { RunThread(); });
   RunThread();
@@ -121,6 +139,7 @@ void Server::BeginStop() {
   acceptor_.close(ignored);
   signals_.clear(ignored);  // a second signal ends the process at once
   pause_.cancel();
+  heart_.cancel();
   for (const auto& connection : LiveConnections()) connection->Finish();
   deadline_.expires_after(limits_.shutdown);
   deadline_.async_wait([this](error_code error) {

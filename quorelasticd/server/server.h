@@ -6,6 +6,7 @@
 #include <boost/asio/signal_set.hpp>
 #include <boost/asio/steady_timer.hpp>
 #include <boost/asio/strand.hpp>
+#include <chrono>
 #include <cstddef>
 #include <functional>
 #include <memory>
@@ -33,6 +34,10 @@ class Server {
   Server& operator=(const Server&) = delete;
   ~Server();
 
+  // Calls `beat` every `interval`, as long as Run() serves and takes clients: it tells that the server is alive. To be
+  // called before Run(). `beat` must neither throw nor block.
+  void BeatEvery(std::chrono::microseconds interval, std::function<void()> beat);
+
   // Serves; returns when Stop() was called, or SIGTERM or SIGINT came, and the last request is done.
   // `on_stop` is called once, when the stopping begins. It must not throw.
   void Run(const std::function<void()>& on_stop);
@@ -43,6 +48,7 @@ class Server {
  private:
   void Accept();
   void Admit(Connection::Socket socket);
+  void Beat();
   void BeginStop();
   void CancelDeadlineIfIdle();
   std::vector<std::shared_ptr<Connection>> LiveConnections();
@@ -53,14 +59,17 @@ class Server {
   std::atomic<size_t>& connection_count_;  // of clients served
   std::atomic<size_t> refusal_count_{0};   // of clients told that there are too many
   boost::asio::io_context io_;
-  // The acceptor, its list of connections, the signals and the deadline share one strand.
+  // The acceptor, its list of connections, the signals and the timers share one strand.
   boost::asio::strand<boost::asio::io_context::executor_type> strand_;
   boost::asio::local::stream_protocol::acceptor acceptor_;
   boost::asio::signal_set signals_;
+  boost::asio::steady_timer heart_;     // until the next beat
   boost::asio::steady_timer pause_;     // before accepting again when descriptors have run out
   boost::asio::steady_timer deadline_;  // for the last requests, while stopping
   std::vector<std::weak_ptr<Connection>> connections_;
   std::function<void()> on_stop_;
+  std::function<void()> beat_;  // may be empty
+  std::chrono::microseconds beat_interval_{0};
   bool stopping_ = false;
 };
 

@@ -53,6 +53,27 @@ TEST(Lifecycle, ItTellsTheServiceManagerWhatItDoes) {
   EXPECT_EQ(said[1], "STOPPING=1\nSTATUS=Finishing what is running");
 }
 
+TEST(Lifecycle, AServiceManagerThatWatchesItIsToldThatItIsAliveUntilItStops) {
+  const TemporaryFolder folder;
+  setenv("WATCHDOG_USEC", "1500000", 1);
+  DaemonProcess daemon(folder.path());
+  unsetenv("WATCHDOG_USEC");
+  const auto beats = [&] {
+    const auto said = daemon.Notifications();
+    return std::count(said.begin(), said.end(), "WATCHDOG=1");
+  };
+  const auto earlier = beats();
+  const auto start = std::chrono::steady_clock::now();
+  while (beats() < earlier + 3) {
+    ASSERT_LT(std::chrono::steady_clock::now() - start, 3 * std::chrono::milliseconds(1500)) << "it is ended";
+    std::this_thread::sleep_for(std::chrono::milliseconds(5));
+  }
+  // A third of the time that was given lies between two of them; not as often as it can.
+  EXPECT_GE(std::chrono::steady_clock::now() - start, std::chrono::milliseconds(900));
+  EXPECT_EQ(daemon.Stop(), 0);
+  EXPECT_EQ(daemon.Notifications().back(), "STOPPING=1\nSTATUS=Finishing what is running");
+}
+
 TEST(Lifecycle, TheSocketIsForOwnerAndGroupAndGoesWithTheDaemon) {
   const TemporaryFolder folder;
   DaemonProcess daemon(folder.path());
@@ -138,6 +159,7 @@ TEST(Lifecycle, TheServiceManagersSocketIsServedAndLeftThere) {
   ASSERT_EQ(listen(listener, 8), 0);
   DaemonProcess daemon(folder.path(), {}, listener);
   ASSERT_TRUE(daemon.is_ready()) << daemon.Log();
+  EXPECT_EQ(daemon.Notifications()[0], "READY=1\nSTATUS=Serving on " + path);
   EXPECT_FALSE(fs::exists(daemon.socket()));
   EXPECT_EQ(DaemonClient(path).AskForError(R"({"command":"status"})"), "");
   EXPECT_EQ(daemon.Stop(), 0);

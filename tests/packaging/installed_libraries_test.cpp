@@ -1,0 +1,94 @@
+// The development packages as their users have them: the examples are built in a folder of their own, against what the
+// two components of a library install and nothing else of this project.
+
+#include <gmock/gmock.h>
+
+#include <filesystem>
+#include <string>
+#include <vector>
+
+#include "daemon_process.h"
+#include "packaging/lines.h"
+#include "support/files.h"
+#include "support/temporary_folder.h"
+
+namespace quorelastic::testing {
+namespace {
+
+using ::testing::HasSubstr;
+
+class InstalledLibrary : public ::testing::Test {
+ protected:
+  explicit InstalledLibrary(const std::string& name) {
+    for (const std::string& component : {"lib" + name + "0", "lib" + name + "-dev"}) {
+      OutputOf({"cmake", "--install", BUILD_FOLDER, "--prefix", prefix_.path(), "--component", component});
+    }
+    CopyFolder(prefix_ / ("share/doc/lib" + name + "-dev/examples"), source_);
+  }
+
+  // Both ways give the path of the program.
+  std::string BuildWithCMake(const std::string& program) const {
+    const std::string build = work_ / "build";
+    OutputOf({"cmake", "-S", source_, "-B", build, "-DCMAKE_PREFIX_PATH=" + prefix_.path(),
+              std::string("-DCMAKE_CXX_COMPILER=") + CXX_COMPILER,
+              "-DCMAKE_CXX_FLAGS=-Wall -Wextra -Werror"});
+    OutputOf({"cmake", "--build", build}, {.time_limit = kBuildTime});
+    return build + "/" + program;
+  }
+  std::string BuildWithPkgConfig(const std::string& name, const std::string& program) const {
+    const std::string script = "\"$0\" -std=c++20 -Wall -Wextra -Werror " + program + ".cpp -o " + program +
+                               " $(pkg-config --cflags --libs " + name + ")";
+    OutputOf({"sh", "-ec", script, CXX_COMPILER},
+             {.environment = {"PKG_CONFIG_PATH=" + prefix_.path() + "/" + LIBRARY_FOLDER + "/pkgconfig"},
+              .folder = source_,
+              .time_limit = kBuildTime});
+    return source_ + "/" + program;
+  }
+
+  std::string Run(const std::vector<std::string>& command, const std::string& input = "") const {
+    return OutputOf(command, {.environment = {"LD_LIBRARY_PATH=" + prefix_.path() + "/" + LIBRARY_FOLDER},
+                              .input = input});
+  }
+
+  static constexpr std::chrono::seconds kBuildTime{240};
+  TemporaryFolder prefix_;
+  TemporaryFolder work_;
+  std::string source_ = work_ / "example";
+};
+
+class InstalledEngine : public InstalledLibrary {
+ protected:
+  InstalledEngine() : InstalledLibrary("quorelastic") {}
+
+  void ExpectToFindLines(const std::string& program) {
+    EXPECT_EQ(Run({program, work_ / "index", "sea"}, "The old man\nand the sea\nby the sea, the sea\n"),
+              "3: by the sea, the sea\n2: and the sea\n2 found\n");
+  }
+};
+
+TEST_F(InstalledEngine, IsFoundByCMake) { ExpectToFindLines(BuildWithCMake("line_search")); }
+
+TEST_F(InstalledEngine, IsFoundByPkgConfig) {
+  ExpectToFindLines(BuildWithPkgConfig("quorelastic", "line_search"));
+}
+
+class InstalledConnection : public InstalledLibrary {
+ protected:
+  InstalledConnection() : InstalledLibrary("quordaemon") {}
+
+  void ExpectToAskADaemon(const std::string& program) {
+    const TemporaryFolder folder;
+    DaemonProcess daemon(folder.path());
+    ASSERT_TRUE(daemon.is_ready()) << daemon.Log();
+    EXPECT_THAT(Run({program, daemon.socket(), R"({"command":"status"})"}), HasSubstr(R"("success":true)"));
+  }
+};
+
+TEST_F(InstalledConnection, IsFoundByCMake) { ExpectToAskADaemon(BuildWithCMake("ask")); }
+
+TEST_F(InstalledConnection, IsFoundByPkgConfig) {
+  ExpectToAskADaemon(BuildWithPkgConfig("quordaemon", "ask"));
+}
+
+}  // namespace
+}  // namespace quorelastic::testing

@@ -1,0 +1,89 @@
+// The units that systemd runs the daemon by, as they are installed under /usr.
+
+#include <gmock/gmock.h>
+
+#include <cstdlib>
+#include <filesystem>
+#include <string>
+
+#include "packaging/lines.h"
+#include "support/files.h"
+#include "support/temporary_folder.h"
+
+namespace quorelastic::testing {
+namespace {
+
+using ::testing::HasSubstr;
+using ::testing::MatchesRegex;
+using ::testing::SizeIs;
+
+class ServiceUnits : public ::testing::Test {
+ protected:
+  void SetUp() override {
+    OutputOf({"cmake", "--install", BUILD_FOLDER, "--prefix", "/usr", "--component", "quorelasticd"},
+             {.environment = {"DESTDIR=" + root_.path()}});
+  }
+
+  std::string Installed(const std::string& path) const { return ReadFile(root_ / path); }
+
+  TemporaryFolder root_;
+};
+
+TEST_F(ServiceUnits, AreUnderstoodWholly) {
+  // A program that is there, in the place of the one that is not installed on this machine.
+  const std::string service = root_ / "quorelasticd.service";
+  std::string text = Installed("usr/lib/systemd/system/quorelasticd.service");
+  const size_t program = text.find("/usr/sbin/quorelasticd ");
+  ASSERT_NE(program, std::string::npos) << text;
+  text.replace(program, std::string("/usr/sbin/quorelasticd").size(), "/bin/true");
+  WriteFile(service, text);
+  const std::string socket = root_ / "quorelasticd.socket";
+  WriteFile(socket, Installed("usr/lib/systemd/system/quorelasticd.socket"));
+  const RunResult run = RunCommand({"systemd-analyze", "verify", "--man=no", service, socket});
+  EXPECT_EQ(run.status, 0) << run;
+  EXPECT_EQ(run.err, "");
+}
+
+TEST_F(ServiceUnits, LeaveTheDaemonLittleToDoHarmWith) {
+  // From 0, locked up, to 10, at large; the threshold is in tenths. What is left is a group that may read the files,
+  // and the socket itself.
+  const RunResult run = RunCommand({"systemd-analyze", "security", "--offline=true", "--threshold=5",
+                                    "--no-pager", root_ / "usr/lib/systemd/system/quorelasticd.service"});
+  EXPECT_EQ(run.status, 0) << run;
+  EXPECT_THAT(run.out, HasSubstr("Overall exposure level for quorelasticd.service: 0."));
+}
+
+TEST_F(ServiceUnits, ListenWhereTheToolConnectsAndForTheGroupAlone) {
+  const auto lines = Lines(Installed("usr/lib/systemd/system/quorelasticd.socket"));
+  for (const char* line :
+       {"ListenStream=/run/quorelasticd.sock", "SocketMode=0660", "SocketGroup=quorelastic"}) {
+    EXPECT_THAT(lines, ::testing::Contains(line));
+  }
+}
+
+TEST_F(ServiceUnits, RunTheDaemonThatIsInstalledBesideThem) {
+  const TemporaryFolder prefix;
+  // Configuration goes to /etc whatever the prefix is; here that is kept within the test's folder.
+  OutputOf({"cmake", "--install", BUILD_FOLDER, "--prefix", "/opt/search", "--component", "quorelasticd"},
+           {.environment = {"DESTDIR=" + prefix.path()}});
+  EXPECT_THAT(ReadFile(prefix / "opt/search/lib/systemd/system/quorelasticd.service"),
+              HasSubstr("\nExecStart=/opt/search/sbin/quorelasticd $QUORELASTICD_OPTIONS\n"));
+}
+
+TEST_F(ServiceUnits, TheUserIsASystemUserWithoutALogin) {
+  const TemporaryFolder machine;
+  std::filesystem::create_directory(machine / "etc");
+  const RunResult run = RunCommand(
+      {"systemd-sysusers", "--root=" + machine.path(), root_ / "usr/lib/sysusers.d/quorelasticd.conf"});
+  ASSERT_EQ(run.status, 0) << run;
+  const auto users = Lines(ReadFile(machine / "etc/passwd"));
+  ASSERT_THAT(users, SizeIs(1));
+  EXPECT_THAT(users[0],
+              MatchesRegex("quorelastic:[^:]*:[0-9]+:[0-9]+:Full-text search daemon:/var/lib/quorelastic:.*"
+                           "/nologin"));
+  EXPECT_LT(std::atoi(users[0].substr(users[0].find(':', 12) + 1).c_str()), 1000);
+  EXPECT_THAT(ReadFile(machine / "etc/group"), HasSubstr("quorelastic:"));
+}
+
+}  // namespace
+}  // namespace quorelastic::testing
