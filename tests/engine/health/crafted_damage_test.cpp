@@ -12,7 +12,7 @@
 #include "damage/run_tool.h"
 #include "support/byte_writer.h"
 #include "support/files.h"
-#include "support/library_index.h"
+#include "support/small_index.h"
 #include "support/temporary_folder.h"
 #include "vantrel/elastic/index_health.h"
 
@@ -22,39 +22,15 @@ namespace {
 using ::quorelastic::testing::ByteWriter;
 using ::quorelastic::testing::CopyFolder;
 using ::quorelastic::testing::FindFile;
-using ::quorelastic::testing::LibraryField;
-using ::quorelastic::testing::LibraryIndex;
 using ::quorelastic::testing::ListFolder;
 using ::quorelastic::testing::ReadFile;
 using ::quorelastic::testing::RunTool;
 using ::quorelastic::testing::TemporaryFolder;
 using ::quorelastic::testing::ToolRun;
 using ::quorelastic::testing::WriteFile;
+using ::quorelastic::testing::WriteSkippingIndex;
+using ::quorelastic::testing::WriteSmallIndex;
 using Grade = HealthFinding::Grade;
-
-// Three documents of one field, whose files are short enough to be known by heart:
-//
-//   .fnm  VInt -2 (5 bytes), 1 field; at 6 the name "body", at 11 the flags
-//   .tis  24 bytes of header; at 24 "alpha", at 35 "beta", at 45 "gamma"
-//   .tii  24 bytes of header; at 24 the first entry, its field number -1 at 26, its pointer 24 at 34
-//   .frq  at 0 "alpha", twice in each of three documents; at 6 "beta", once in each; at 9 "gamma" in the last
-//   .fdt  4 bytes of header; at 4 the count of fields, then number, flags, length, text
-//   .tvf  4 bytes of header; at 4 the count of terms, flags, then "alpha": prefix 6, suffix 7, text, frequency 13
-void WriteSmall(const std::string& path, bool compound) {
-  LibraryIndex index(path, {.compound = compound});
-  for (const char* text : {"alpha beta alpha", "alpha beta alpha", "alpha beta alpha gamma"}) {
-    index.Add({{.name = "body", .value = text, .vector = LibraryField::Vector::kPositionsAndOffsets}});
-  }
-  index.Commit();
-  index.Delete("body", "gamma");
-}
-
-// 300 documents that hold one word: two levels of skip data stand at 301 in .frq, the upper one in 1 + 6 bytes.
-void WriteSkips(const std::string& path) {
-  LibraryIndex index(path, {.compound = false});
-  for (int number = 0; number < 300; ++number)
-    index.Add({{.name = "body", .value = "often", .stored = false}});
-}
 
 // The lookups of the real program in such an index, each of which must end in an answer or a report.
 void ExpectLookupsToEnd(const std::string& path) {
@@ -219,9 +195,9 @@ class CraftedDamageTest : public ::testing::TestWithParam<Craft> {
   // Written once: that takes longer than all of the tests.
   static void SetUpTestSuite() {
     originals_ = std::make_unique<TemporaryFolder>();
-    WriteSmall(Original(Index::kSmall), false);
-    WriteSmall(Original(Index::kCompound), true);
-    WriteSkips(Original(Index::kSkips));
+    WriteSmallIndex(Original(Index::kSmall), false);
+    WriteSmallIndex(Original(Index::kCompound), true);
+    WriteSkippingIndex(Original(Index::kSkips));
   }
   static void TearDownTestSuite() { originals_.reset(); }
 
@@ -276,7 +252,7 @@ TEST_P(CraftedDamageTest, LetsLookupsEnd) {
 class CraftedCommitTest : public ::testing::Test {
  protected:
   void SetUp() override {
-    WriteSmall(folder_.path(), false);
+    WriteSmallIndex(folder_.path(), false);
     for (const std::string& name : ListFolder(folder_.path())) {
       if (name.starts_with("segments_")) name_ = folder_ / name;
     }

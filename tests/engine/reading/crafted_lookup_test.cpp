@@ -15,7 +15,7 @@
 
 #include "support/byte_writer.h"
 #include "support/files.h"
-#include "support/library_index.h"
+#include "support/small_index.h"
 #include "support/temporary_folder.h"
 #include "vantrel/elastic/checked_reader.h"
 
@@ -27,29 +27,7 @@ using Lucene::StringUtils;
 using ::testing::StartsWith;
 using vantrel::elastic::CheckedReader;
 
-// Three documents of one field:
-//
-//   .tis  24 bytes of header; at 24 "alpha" (its field number at 31), at 35 "beta", at 45 "gamma"
-//   .tii  24 bytes of header; at 24 the first entry, its field number -1 at 26
-//   .frq  at 0 "alpha", twice in each of three documents; at 6 "beta", once in each; at 9 "gamma" in the last
-//   .tvd  4 bytes of header; for each document a count of fields and a field number
-//   .tvf  4 bytes of header; at 4 the count of terms, flags, then "alpha": prefix 6, suffix 7, text, frequency 13
-void WriteSmall(const std::string& path) {
-  LibraryIndex index(path, {.compound = false});
-  for (const char* text : {"alpha beta alpha", "alpha beta alpha", "alpha beta alpha gamma"}) {
-    index.Add({{.name = "body", .value = text, .vector = LibraryField::Vector::kPositionsAndOffsets}});
-  }
-  index.Commit();
-  index.Delete("body", "gamma");
-}
-
-// 300 documents that hold one word. Skip data stand at 300 in .frq: the length of the upper level, its one
-// entry at 301, the lower level from 308 on, three bytes an entry.
-void WriteSkips(const std::string& path) {
-  LibraryIndex index(path, {.compound = false});
-  for (int number = 0; number < 300; ++number)
-    index.Add({{.name = "body", .value = "often", .stored = false}});
-}
+void WriteSmall(const std::string& path) { WriteSmallIndex(path, false); }
 
 struct Craft {
   const char* name;
@@ -89,11 +67,11 @@ const Craft kCrafts[] = {
     {"TermField", WriteSmall, ".tis", 31, "\x01", "beta", 0, "offset 24: term bears field number 1 of 1"},
     {"TermDocuments", WriteSmall, ".tis", 32, "\x04", "alpha", 0, "offset 24: term is in 4 documents of 3"},
     {"TermPostings", WriteSmall, ".tis", 43, "\x7f", "beta", 0, "", -1, ".frq"},
-    {"SkipInterval", WriteSkips, ".tis", 16, Int(1), "often", 99,
+    {"SkipInterval", WriteSkippingIndex, ".tis", 16, Int(1), "often", 99,
      "offset 0: skip interval 1 and 10 skip levels"},
-    {"SkipLevels", WriteSkips, ".tis", 20, Int(0), "often", 99,
+    {"SkipLevels", WriteSkippingIndex, ".tis", 20, Int(0), "often", 99,
      "offset 0: skip interval 16 and 0 skip levels"},
-    {"SkipLevelsHuge", WriteSkips, ".tis", 20, Int(1 << 28), "often", 99,
+    {"SkipLevelsHuge", WriteSkippingIndex, ".tis", 20, Int(1 << 28), "often", 99,
      "offset 0: skip interval 16 and 268435456 skip levels"},
     // Postings and positions.
     {"Document", WriteSmall, ".frq", 2, "\x0a", "alpha", 1, "offset 2: posting lies 5 after document 0 of 3",
@@ -102,17 +80,17 @@ const Craft kCrafts[] = {
      "offset 0: posting has frequency 0"},
     {"Position", WriteSmall, ".prx", 1, VInt(-7), "alpha", 0, "offset 1: position -7 follows 0"},
     // Skip data: what lies on the way to a document far behind, but not on that to the first.
-    {"SkipOffset", WriteSkips, ".tis", 37, VInt(400), "often", 250, "", -1, ".frq"},
-    {"SkipLevelLength", WriteSkips, ".frq", 300, VInt(1 << 28), "often", 250,
+    {"SkipOffset", WriteSkippingIndex, ".tis", 37, VInt(400), "often", 250, "", -1, ".frq"},
+    {"SkipLevelLength", WriteSkippingIndex, ".frq", 300, VInt(1 << 28), "often", 250,
      "offset 300: level 1 of skip data takes"},
-    {"SkipLevelEmpty", WriteSkips, ".frq", 300, std::string(1, '\0'), "often", 250,
+    {"SkipLevelEmpty", WriteSkippingIndex, ".frq", 300, std::string(1, '\0'), "often", 250,
      "offset 301: level 1 is empty", 0},
-    {"SkipLevelShort", WriteSkips, ".frq", 300, "\x02", "often", 250, "offset 301: skip entry reaches past",
-     0},
-    {"SkipPostings", WriteSkips, ".frq", 309, VInt(-16), "often", 40, "offset", 0},
-    {"SkipDocument", WriteSkips, ".frq", 308, VInt(400), "often", 40,
+    {"SkipLevelShort", WriteSkippingIndex, ".frq", 300, "\x02", "often", 250,
+     "offset 301: skip entry reaches past", 0},
+    {"SkipPostings", WriteSkippingIndex, ".frq", 309, VInt(-16), "often", 40, "offset", 0},
+    {"SkipDocument", WriteSkippingIndex, ".frq", 308, VInt(400), "often", 40,
      "offset 308: skip entry leads from document 0 to 400 of 300", 0},
-    {"SkipDocumentHuge", WriteSkips, ".frq", 308, VInt(-16), "often", 40,
+    {"SkipDocumentHuge", WriteSkippingIndex, ".frq", 308, VInt(-16), "often", 40,
      "offset 308: skip entry leads from document 0 to", 0},
     // Term vectors.
     {"VectorPointer", WriteSmall, ".tvx", 4, Long(-1), nullptr, 0, "offset 4: pointer is -1", 1},
