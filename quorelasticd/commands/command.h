@@ -6,6 +6,7 @@
 #include <memory>
 #include <optional>
 #include <string>
+#include <utility>
 #include <vector>
 
 #include "commands/shape.h"
@@ -55,5 +56,11 @@ struct Command {
   // Begins one. `data` is of the shape above. Throws like Step().
   std::unique_ptr<RunningCommand> (*begin)(const Daemon& daemon, Json::Value&& data);
 };
+
+// Begins a command whose requests are objects of class T.
+template <typename T>
+std::unique_ptr<RunningCommand> Begin(const Daemon& daemon, Json::Value&& data) {
+  return std::make_unique<T>(daemon, std::move(data));
+}
 
 }  // namespace quorelasticd

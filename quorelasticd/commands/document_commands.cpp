@@ -156,11 +156,6 @@ class DocumentDelete : public RunningCommand {
   Json::ArrayIndex next_ = 0;
 };
 
-template <typename T>
-std::unique_ptr<RunningCommand> Begin(const Daemon& daemon, Json::Value&& data) {
-  return std::make_unique<T>(daemon, std::move(data));
-}
-
 constexpr const char* kCommitMeaning = "Whether to commit at the end; true by default.";
 
 }  // namespace

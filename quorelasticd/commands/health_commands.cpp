@@ -176,11 +176,6 @@ class Repair : public RunningCommand {
   std::optional<RepairWorker> worker_;
 };
 
-template <typename T>
-std::unique_ptr<RunningCommand> Begin(const Daemon& daemon, Json::Value&& data) {
-  return std::make_unique<T>(daemon, data);
-}
-
 }  // namespace
 
 Command CheckCommand() {

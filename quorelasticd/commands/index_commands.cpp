@@ -143,11 +143,6 @@ class Optimize : public Commit {
   }
 };
 
-template <typename T>
-std::unique_ptr<RunningCommand> Begin(const Daemon& daemon, Json::Value&& data) {
-  return std::make_unique<T>(daemon, data);
-}
-
 }  // namespace
 
 Command IndexCreateCommand() {
