@@ -57,7 +57,9 @@ class Capture {
 
 int RunsEvery() { return kIsSanitized ? 10 : 1; }
 
-ToolRun RunTool(const std::vector<std::string>& arguments) { return RunLimited(QUORELASTIC_TOOL, arguments); }
+ToolRun RunToolLimited(const std::vector<std::string>& arguments) {
+  return RunLimited(QUORELASTIC_TOOL, arguments);
+}
 
 ToolRun RunLimited(const std::string& program, const std::vector<std::string>& arguments) {
   std::vector<std::string> copies = {program};

@@ -16,7 +16,7 @@ struct ToolRun {
 ToolRun RunLimited(const std::string& program, const std::vector<std::string>& arguments);
 
 // The same for the tool.
-ToolRun RunTool(const std::vector<std::string>& arguments);
+ToolRun RunToolLimited(const std::vector<std::string>& arguments);
 
 // A run takes many times as long with a sanitizer: only each so many-th case is run then.
 int RunsEvery();

@@ -121,7 +121,7 @@ class ReliabilityDamage : public ::testing::TestWithParam<HealthShape> {
     // The last --field counts, which is the one for vectors.
     if (word != "doc_term") arguments.resize(arguments.size() - 2);
     if (word == "allterm" || word == "term") arguments.insert(arguments.end(), {"-f", ""});
-    return RunTool(arguments);
+    return RunToolLimited(arguments);
   }
 
   // What changes the folder gets one of its own. No file is ever written in place.

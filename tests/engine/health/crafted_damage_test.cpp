@@ -24,7 +24,7 @@ using ::quorelastic::testing::CopyFolder;
 using ::quorelastic::testing::FindFile;
 using ::quorelastic::testing::ListFolder;
 using ::quorelastic::testing::ReadFile;
-using ::quorelastic::testing::RunTool;
+using ::quorelastic::testing::RunToolLimited;
 using ::quorelastic::testing::TemporaryFolder;
 using ::quorelastic::testing::ToolRun;
 using ::quorelastic::testing::WriteFile;
@@ -36,7 +36,7 @@ using Grade = HealthFinding::Grade;
 void ExpectLookupsToEnd(const std::string& path) {
   const auto expect_end = [&](const std::string& action, const std::string& token,
                               const std::string& document) {
-    const ToolRun run = RunTool({"-a", action, "-d", path, "-f", "body", "-t", token, "-n", document});
+    const ToolRun run = RunToolLimited({"-a", action, "-d", path, "-f", "body", "-t", token, "-n", document});
     EXPECT_TRUE(WIFEXITED(run.status) && WEXITSTATUS(run.status) == 0)
         << action << " of " << token << " from " << document << " ends in signal " << WTERMSIG(run.status)
         << "\n"
