@@ -231,7 +231,7 @@ TEST_P(ReliabilityDamage, EveryOfflineActionEndsByItselfOrByAnUncaughtException)
 // An index without a manifest is checked as a whole before it is used, one with a manifest block by block: then nothing
 // but what was written is ever answered. Without a digest are the settings, and without a checksum older commits.
 TEST_P(ReliabilityDamage, SearchingAndMergingEndsInAnAnswerOrAnErrorOfTheEngine) {
-  const int damages = RunSize("QUORELASTIC_USE_DAMAGES", 8) / RunsEvery();
+  const int damages = std::max(1, RunSize("QUORELASTIC_USE_DAMAGES", 8) / RunsEvery());
   WriteSettings();
   const std::string manifest = ManifestOfIndex();
   std::map<size_t, std::string> intact;

@@ -49,9 +49,9 @@ std::string DigestText(uint64_t digest);
 template <typename Take>
 void ReadToDigest(const ByteSource& file, uint64_t from, uint64_t to, Take take) {
   constexpr uint64_t kPiece = uint64_t{256} << 10;
-  std::vector<uint8_t> buffer(std::min(kPiece, to - from));
+  const auto buffer = std::make_unique_for_overwrite<uint8_t[]>(std::min(kPiece, to - from));
   while (from < to) {
-    const std::span<uint8_t> piece(buffer.data(), std::min<uint64_t>(buffer.size(), to - from));
+    const std::span<uint8_t> piece(buffer.get(), std::min(kPiece, to - from));
     file.ReadAt(from, piece);
     take(from, std::span<const uint8_t>(piece));
     from += piece.size();

@@ -180,6 +180,8 @@ std::optional<Manifest> FindManifest(const Folder& folder, const Commit& commit)
   try {
     auto manifest = ReadManifest(*folder.Open(kManifestName));
     if (manifest.has_value() && manifest->BelongsTo(folder, commit)) return manifest;
+  } catch (const IndexIoError& error) {
+    if (!IsMissingError(error)) throw;
   } catch (const IndexError&) {
     // As if there were none.
   }

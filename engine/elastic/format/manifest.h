@@ -60,7 +60,7 @@ std::string WriteManifest(const Manifest& manifest);
 std::optional<Manifest> ReadManifest(const ByteSource& source);
 
 // The manifest that stands beside a commit, where it is whole and belongs to that very commit; else nothing. Throws
-// nothing about files that cannot be read: there is none then that could be relied on.
+// IndexIoError where the system fails.
 std::optional<Manifest> FindManifest(const Folder& folder, const Commit& commit);
 
 // The names of the files that make up a segment, as far as they are in the folder. Throws IndexIoError where the system

@@ -124,8 +124,10 @@ std::string DiskDirectory::last_read_problem() const {
 }
 
 void DiskDirectory::NoteFailedReading(const IndexError& error) {
-  NoteFailedReading();
   NoteReadProblem(error);
+  // The library does well without segments.gen, and without a commit that is not whole.
+  const bool harmless = error.path().starts_with(format::JoinPath(path_, std::string(format::kSegments)));
+  if (!harmless) NoteFailedReading();
 }
 
 void DiskDirectory::NoteReadProblem(const IndexError& error) {

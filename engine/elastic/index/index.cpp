@@ -124,8 +124,7 @@ class Index::Impl {
     const std::lock_guard guard(write_mutex_);
     if (!lock_.has_value()) lock_.emplace(path_);
     if (!writer_.has_value()) {
-      format::UseNewestCommit(format::DiskFolder(path_),
-                              [this](const format::Commit& commit) { guard_->Admit(commit); });
+      guard_->AdmitNewestCommit();
       writer_.emplace(path_, *lock_, settings(), LibraryWriter::Start::kExistingIndex, guard_);
     }
     RunWriter(operation);
@@ -287,7 +286,11 @@ std::vector<AnalyzedToken> Index::Analyze(std::string_view field, std::string_vi
 
 SearchResult Index::Search(const SearchRequest& request, const SearchPluginRegistry& plugins,
                            const SearchLimits& limits) const {
-  return RunSearch({{path(), settings(), NewestSnapshot()}}, request, plugins, limits);
+  return RunSearch(
+      [this] {
+        return std::vector<SearchedIndex>{{path(), settings(), NewestSnapshot()}};
+      },
+      request, plugins, limits);
 }
 
 std::shared_ptr<const Snapshot> Index::NewestSnapshot() const { return impl_->NewestSnapshot(); }

@@ -1,6 +1,7 @@
 #include "elastic/index/library_guard.h"
 
 #include <algorithm>
+#include <cerrno>
 #include <utility>
 #include <vector>
 
@@ -11,8 +12,10 @@
 namespace vantrel::elastic {
 namespace {
 
-// A check of whole segments is not repeated for every search that would need it.
+// A check of whole segments that found something is not repeated for every search that would need it: not for so long,
+// nor for so many times what it took.
 constexpr std::chrono::minutes kRefusalHolds{1};
+constexpr int kRefusalHoldsTimes = 10;
 
 void RequireSafe(const std::vector<HealthFinding>& findings) {
   for (const HealthFinding& finding : findings) {
@@ -26,45 +29,87 @@ void RequireSafe(const std::vector<HealthFinding>& findings) {
 
 LibraryGuard::LibraryGuard(std::string folder) : folder_(std::move(folder)) {}
 
-void LibraryGuard::Admit(const format::Commit& commit) {
+bool LibraryGuard::Identity::operator==(const Identity& other) const {
+  return device == other.device && inode == other.inode && size == other.size &&
+         changed.tv_sec == other.changed.tv_sec && changed.tv_nsec == other.changed.tv_nsec;
+}
+
+int64_t LibraryGuard::AdmitNewestCommit() {
   const std::lock_guard lock(admission_mutex_);
   const format::DiskFolder folder(folder_);
-  if (commit.generation < generation_) ForgetFiles();  // the index was put back to what it was
-  generation_ = commit.generation;
-  if (manifest_.has_value() && manifest_->BelongsTo(folder, commit)) return;
-  manifest_.reset();
-  std::optional<format::Manifest> manifest = format::FindManifest(folder, commit);
-  if (!manifest.has_value()) return AdmitUnknownSegments(folder, commit);
-  Take(*manifest);
-  // The library takes some files for such as were never written where they are missing.
-  for (const format::Manifest::File& file : manifest->files) {
-    Find(file.name)->VerifySize(*folder.Open(file.name));
+  std::optional<IndexDamagedError> refusal;
+  format::UseNewestCommit(folder, [&](const format::Commit& commit) {
+    refusal.reset();
+    try {
+      Admit(folder, commit);
+      generation_ = commit.generation;
+    } catch (const IndexDamagedError& error) {
+      refusal = error;  // the commit before is no way out: it is this one that the library would open
+    }
+  });
+  if (refusal.has_value()) throw IndexDamagedError(*refusal);
+  return generation_;
+}
+
+void LibraryGuard::Admit(const format::Folder& folder, const format::Commit& commit) {
+  if (commit.generation < generation_ && !folder.Exists(format::CommitFileName(generation_))) {
+    ForgetFiles();  // the index was put back to what it was
   }
+  if (!AdmitByManifest(folder, commit)) AdmitUnknownSegments(folder, commit);
+  std::erase_if(refusals_, [&](const auto& refusal) { return refusal.first <= commit.generation; });
+}
+
+bool LibraryGuard::AdmitByManifest(const format::Folder& folder, const format::Commit& commit) {
+  if (manifest_.has_value() && manifest_->BelongsTo(folder, commit)) return true;
+  std::optional<format::Manifest> manifest = format::FindManifest(folder, commit);
+  if (!manifest.has_value()) return false;
+  // The library takes some files for such as were never written where they are missing.
+  for (const format::Manifest::File& file : manifest->files) RequireSize(*folder.Open(file.name), file);
+  Take(*manifest);
   manifest_ = std::move(manifest);
+  const std::lock_guard lock(files_mutex_);
+  std::erase_if(files_, [this](const auto& entry) {
+    return !entry.second.is_written_here && manifest_->Find(entry.first) == nullptr;
+  });
+  return true;
 }
 
 void LibraryGuard::AdmitUnknownSegments(const format::Folder& folder, const format::Commit& commit) {
+  manifest_.reset();
   format::Commit unknown = commit;
   unknown.segments.clear();
-  std::set<std::string> names;
+  std::map<std::string, Identity> files;
   for (const format::SegmentInfo& segment : commit.segments) {
-    std::set<std::string> files = format::FilesOf(folder, segment);
-    if (Knows(files)) continue;
+    // As they are before the check: who changes one meanwhile makes it unknown.
+    std::map<std::string, Identity> of_segment = IdentifyAll(format::FilesOf(folder, segment));
+    if (Knows(of_segment)) continue;
     unknown.segments.push_back(segment);
-    names.merge(files);
+    files.merge(of_segment);
   }
   if (unknown.segments.empty()) return;
-  const auto now = std::chrono::steady_clock::now();
-  if (refusal_.generation == commit.generation && now < refusal_.until)
-    throw IndexDamagedError(refusal_.error);
+  CheckSegments(folder, unknown);
+  {
+    const std::lock_guard lock(files_mutex_);
+    for (const auto& [name, identity] : files) files_.try_emplace(name, KnownFile{.identity = identity});
+  }
+  // It may have come meanwhile.
+  AdmitByManifest(folder, commit);
+}
+
+void LibraryGuard::CheckSegments(const format::Folder& folder, const format::Commit& commit) {
+  using Clock = std::chrono::steady_clock;
+  const auto start = Clock::now();
+  const auto refusal = refusals_.find(commit.generation);
+  if (refusal != refusals_.end() && start < refusal->second.until)
+    throw IndexDamagedError(refusal->second.error);
   try {
-    RequireSafe(health::CheckSegments(folder, unknown));
+    RequireSafe(health::CheckSegments(folder, commit));
   } catch (const IndexDamagedError& error) {
-    refusal_ = {.generation = commit.generation, .until = now + kRefusalHolds, .error = error};
+    const auto end = Clock::now();
+    const Clock::duration hold = std::max<Clock::duration>(kRefusalHolds, kRefusalHoldsTimes * (end - start));
+    refusals_.insert_or_assign(commit.generation, Refusal{.until = end + hold, .error = error});
     throw;
   }
-  const std::lock_guard lock(files_mutex_);
-  for (const std::string& name : names) files_.try_emplace(name);
 }
 
 std::shared_ptr<const format::ByteSource> LibraryGuard::Open(const std::string& name) {
@@ -73,26 +118,60 @@ std::shared_ptr<const format::ByteSource> LibraryGuard::Open(const std::string& 
   if (name.starts_with('_')) {
     auto verification = Find(name);
     if (verification == nullptr) {
-      format::UseNewestCommit(folder, [this](const format::Commit& commit) { Admit(commit); });
+      AdmitNewestCommit();
       verification = Find(name);
     }
-    if (verification == nullptr) throw IndexError(file->name(), "no file of the newest commit");
+    if (verification == nullptr)
+      throw IndexError(file->name(), "neither of the newest commit nor of its manifest");
     return std::make_shared<VerifiedFile>(std::move(file), std::move(verification));
   }
   if (const auto generation = format::CommitGeneration(name)) format::ReadCommit(file, *generation);
   return file;
 }
 
-bool LibraryGuard::Knows(const std::set<std::string>& names) const {
-  const std::lock_guard lock(files_mutex_);
-  return std::all_of(names.begin(), names.end(),
-                     [this](const std::string& name) { return files_.contains(name); });
+LibraryGuard::Identity LibraryGuard::Identify(const std::string& name) const {
+  struct stat status {};
+  const std::string path = format::JoinPath(folder_, name);
+  if (stat(path.c_str(), &status) != 0) throw IndexIoError(path, "cannot examine file", errno);
+  return {status.st_dev, status.st_ino, status.st_size, status.st_mtim};
 }
 
-std::shared_ptr<FileVerification> LibraryGuard::Find(const std::string& name) const {
+std::map<std::string, LibraryGuard::Identity> LibraryGuard::IdentifyAll(
+    const std::set<std::string>& names) const {
+  std::map<std::string, Identity> files;
+  for (const std::string& name : names) files.emplace(name, Identify(name));
+  return files;
+}
+
+bool LibraryGuard::Knows(const std::map<std::string, Identity>& files) const {
+  const std::lock_guard lock(files_mutex_);
+  return std::all_of(files.begin(), files.end(), [this](const auto& file) {
+    const auto known = files_.find(file.first);
+    if (known == files_.end()) return false;
+    return !known->second.identity.has_value() || *known->second.identity == file.second;
+  });
+}
+
+// What is known of the file that bears the name now; nothing where that is nothing.
+std::shared_ptr<FileVerification> LibraryGuard::Find(const std::string& name) {
+  const Identity identity = Identify(name);
   const std::lock_guard lock(files_mutex_);
   const auto found = files_.find(name);
-  return found == files_.end() ? nullptr : found->second.verification;
+  if (found == files_.end()) return nullptr;
+  KnownFile& known = found->second;
+  const format::Manifest::File* const expected = known.verification->expected();
+  if (known.identity.has_value() && !(*known.identity == identity)) {
+    if (expected == nullptr) {
+      files_.erase(found);
+      return nullptr;
+    }
+    const auto again = std::make_shared<FileVerification>();
+    again->Expect(*expected);
+    known.verification = again;
+  }
+  // Without digests, one that is written here may still grow.
+  if (!known.is_written_here || expected != nullptr) known.identity = identity;
+  return known.verification;
 }
 
 void LibraryGuard::NoteWritten(const std::string& name) {
@@ -108,16 +187,23 @@ void LibraryGuard::NoteDeleted(const std::string& name) {
 void LibraryGuard::Take(const format::Manifest& manifest) {
   const std::lock_guard lock(files_mutex_);
   for (const format::Manifest::File& file : manifest.files) {
-    KnownFile& known = files_[file.name];
-    const format::Manifest::File* const expected = known.verification->expected();
-    if (expected != nullptr && *expected != file) known = {};
-    known.verification->Expect(file);
+    const auto known = files_.find(file.name);
+    if (known != files_.end()) {
+      const format::Manifest::File* const expected = known->second.verification->expected();
+      if (expected == nullptr) known->second.verification->Expect(file);
+      if (expected == nullptr || *expected == file) continue;
+    }
+    KnownFile another;
+    another.verification->Expect(file);
+    files_.insert_or_assign(file.name, std::move(another));
   }
 }
 
 void LibraryGuard::Forget() {
   const std::lock_guard lock(admission_mutex_);
   manifest_.reset();
+  generation_ = 0;
+  refusals_.clear();
   ForgetFiles();
 }
 

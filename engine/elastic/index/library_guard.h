@@ -1,7 +1,10 @@
 #pragma once
 
+#include <sys/stat.h>
+
 #include <chrono>
 #include <cstdint>
+#include <ctime>
 #include <map>
 #include <memory>
 #include <mutex>
@@ -26,15 +29,18 @@ namespace vantrel::elastic {
 // - where the check of index_health.h, run over its segment, has nothing to say that would be unsafe: once, when the
 //   commit is first seen. That reads the whole segment, so it is for commits without a manifest.
 //
+// A file that takes another's place under the same name is known no more, or verified anew. Once verified, a block is
+// not read again for that: what decays on the disk later is found by who opens the index next.
+//
 // For any thread.
 class LibraryGuard {
  public:
   // Looks at nothing yet.
   explicit LibraryGuard(std::string folder);
 
-  // To be called with a commit that the index library is about to read. Throws IndexDamagedError where one of its
-  // segments is unsafe, and IndexError where its files cannot be read. May take long, see above.
-  void Admit(const format::Commit& commit);
+  // To be called before the index library opens the newest commit; returns its generation. Throws IndexDamagedError
+  // where one of its segments is unsafe, and IndexError where its files cannot be read. May take long, see above.
+  int64_t AdmitNewestCommit();
 
   // A file for the index library. One of a segment that is not in an admitted commit must be in the newest one, which
   // is admitted then; and a commit's own file must be one that can be decoded. Throws IndexError.
@@ -52,29 +58,44 @@ class LibraryGuard {
   void Forget();
 
  private:
-  struct KnownFile {
-    std::shared_ptr<FileVerification> verification = std::make_shared<FileVerification>();
-    bool is_written_here = false;
+  // Which of the files that ever bore a name is meant.
+  struct Identity {
+    dev_t device = 0;
+    ino_t inode = 0;
+    off_t size = 0;
+    timespec changed{};
+
+    bool operator==(const Identity& other) const;
   };
 
-  // What came of the last check of whole segments that found something unsafe.
+  struct KnownFile {
+    std::shared_ptr<FileVerification> verification = std::make_shared<FileVerification>();
+    std::optional<Identity> identity = {};  // nothing as long as it has not been opened
+    bool is_written_here = false;           // and then it has no identity before it has digests
+  };
+
+  // A check of whole segments that found something unsafe.
   struct Refusal {
-    int64_t generation = 0;
     std::chrono::steady_clock::time_point until;
-    IndexDamagedError error = {"", 0, ""};
+    IndexDamagedError error;
   };
 
   void ForgetFiles();
+  void Admit(const format::Folder& folder, const format::Commit& commit);
+  bool AdmitByManifest(const format::Folder& folder, const format::Commit& commit);
   void AdmitUnknownSegments(const format::Folder& folder, const format::Commit& commit);
-  bool Knows(const std::set<std::string>& names) const;
-  std::shared_ptr<FileVerification> Find(const std::string& name) const;
+  void CheckSegments(const format::Folder& folder, const format::Commit& commit);
+  Identity Identify(const std::string& name) const;
+  std::map<std::string, Identity> IdentifyAll(const std::set<std::string>& names) const;
+  bool Knows(const std::map<std::string, Identity>& files) const;
+  std::shared_ptr<FileVerification> Find(const std::string& name);
 
   const std::string folder_;
 
   std::mutex admission_mutex_;                // for the order of admissions, and what follows
   std::optional<format::Manifest> manifest_;  // of the commit admitted last, if it has one
   int64_t generation_ = 0;                    // of that commit
-  Refusal refusal_;
+  std::map<int64_t, Refusal> refusals_;       // by generation
 
   mutable std::mutex files_mutex_;          // for what follows
   std::map<std::string, KnownFile> files_;  // those that may be handed out, by name

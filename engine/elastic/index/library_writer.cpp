@@ -5,6 +5,7 @@
 #include <lucene++/SerialMergeScheduler.h>
 
 #include <exception>
+#include <new>
 #include <utility>
 
 #include "elastic/index/field_analyzer.h"
@@ -89,8 +90,17 @@ void LibraryWriter::MergeSegments() {
 }
 
 void LibraryWriter::UpdateManifest() {
+  const auto generation = [this] {
+    return manifest_.manifest().has_value() ? manifest_.manifest()->generation : 0;
+  };
+  const int64_t before = generation();
   manifest_.Update();
-  if (manifest_.manifest().has_value()) guard_->Take(*manifest_.manifest());
+  if (generation() == before) return;
+  try {
+    guard_->Take(*manifest_.manifest());
+  } catch (const std::bad_alloc&) {
+    // What was written here stays known without digests.
+  }
 }
 
 void LibraryWriter::Run(const char* purpose, const std::function<void()>& operation) {

@@ -14,6 +14,8 @@ namespace {
 std::optional<format::Manifest> FindNewestManifest(const format::Folder& folder) {
   try {
     return format::FindManifest(folder, format::ReadNewestCommit(folder));
+  } catch (const IndexIoError&) {
+    throw;
   } catch (const IndexError&) {
     return std::nullopt;  // without a commit to belong to
   }

@@ -12,7 +12,8 @@ namespace vantrel::elastic {
 class ManifestKeeper {
  public:
   // Takes over the manifest of the newest commit, if there is one: files that it names are not digested again, as
-  // the files of an index are written once. So what decays in them meanwhile stays known.
+  // the files of an index are written once. So what decays in them meanwhile stays known. Throws
+  // IndexIoError where the system fails.
   explicit ManifestKeeper(std::string folder);
 
   // That of the newest commit, or of the last one that was given one; nothing as long as there is none.

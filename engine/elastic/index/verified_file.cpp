@@ -23,6 +23,13 @@ void VerifyBlock(const format::ByteSource& file, const format::Manifest::File& e
 
 }  // namespace
 
+void RequireSize(const format::ByteSource& file, const format::Manifest::File& expected) {
+  if (file.size() == expected.size) return;
+  throw IndexDamagedError(file.name(), std::min(file.size(), expected.size),
+                          "the file is not what was written: it has " + std::to_string(file.size()) +
+                              " bytes, not " + std::to_string(expected.size));
+}
+
 void FileVerification::Expect(const format::Manifest::File& expected) {
   const std::lock_guard lock(mutex_);
   if (expected_ != nullptr) return;
@@ -31,18 +38,13 @@ void FileVerification::Expect(const format::Manifest::File& expected) {
   known_.store(expected_.get(), std::memory_order_release);
 }
 
-void FileVerification::VerifySize(const format::ByteSource& file) const {
-  const format::Manifest::File* const expected = this->expected();
-  if (expected == nullptr || file.size() == expected->size) return;
-  throw IndexDamagedError(file.name(), std::min(file.size(), expected->size),
-                          "the file is not what was written: it has " + std::to_string(file.size()) +
-                              " bytes, not " + std::to_string(expected->size));
-}
-
 void FileVerification::Verify(const format::ByteSource& file, uint64_t offset, uint64_t length) {
   const format::Manifest::File* const expected = this->expected();
   if (expected == nullptr || length == 0) return;
-  VerifySize(file);
+  RequireSize(file, *expected);
+  if (offset > expected->size || length > expected->size - offset) {
+    throw IndexDamagedError(file.name(), expected->size, "something refers to what is past the end");
+  }
   const uint64_t last = (offset + length - 1) / kDigestBlock;
   for (uint64_t block = offset / kDigestBlock; block <= last; ++block) {
     if (is_verified_[block].load(std::memory_order_relaxed)) continue;
@@ -54,7 +56,8 @@ void FileVerification::Verify(const format::ByteSource& file, uint64_t offset, u
 VerifiedFile::VerifiedFile(std::shared_ptr<const format::ByteSource> file,
                            std::shared_ptr<FileVerification> verification)
     : file_(std::move(file)), verification_(std::move(verification)) {
-  verification_->VerifySize(*file_);
+  if (const format::Manifest::File* const expected = verification_->expected())
+    RequireSize(*file_, *expected);
 }
 
 void VerifiedFile::ReadAt(uint64_t offset, std::span<uint8_t> out) const {

@@ -12,6 +12,9 @@
 
 namespace vantrel::elastic {
 
+// Throws IndexDamagedError where a file is of another size than it was written with.
+void RequireSize(const format::ByteSource& file, const format::Manifest::File& expected);
+
 // What is known of a file that the index library may read. As long as there are no digests, it is taken as it is;
 // from then on, each block (block_digest.h) is compared with its digest before the first byte of it is handed out,
 // once in the life of this object. Thread-safe.
@@ -23,11 +26,9 @@ class FileVerification {
   // The digests, nothing as long as there are none.
   const format::Manifest::File* expected() const { return known_.load(std::memory_order_acquire); }
 
-  // Throws IndexDamagedError where there are digests, and they are those of a file of another size.
-  void VerifySize(const format::ByteSource& file) const;
-
   // Reads the blocks in which the range lies, as far as that was not done before. Throws IndexDamagedError where one
-  // is not as it was written, and what reading throws.
+  // is not as it was written, where the file has another size, and where the range is not within; and what reading
+  // throws.
   void Verify(const format::ByteSource& file, uint64_t offset, uint64_t length);
 
  private:

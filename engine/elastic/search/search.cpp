@@ -1,6 +1,7 @@
 #include "vantrel/elastic/search.h"
 
 #include <algorithm>
+#include <exception>
 #include <functional>
 #include <limits>
 #include <map>
@@ -71,6 +72,12 @@ TimeCheck::Deadline DeadlineOf(const SearchRequest& request) {
 // What it takes to load a document, in documents looked at.
 constexpr uint32_t kLoadWeight = 128;
 
+// Another search has failed on the same snapshot meanwhile, and left behind what is not whole.
+class SpoiledSnapshot : public std::exception {};
+
+// How many more snapshots are tried then.
+constexpr int kMostSnapshots = 3;
+
 class SearchRun {
  public:
   SearchRun(const std::vector<SearchedIndex>& indexes, const SearchRequest& request,
@@ -129,10 +136,8 @@ class SearchRun {
         directory->NoteFailedReading();
         throw;
       }
-      // In another search on the same snapshot, which left behind what is not whole.
-      if (directory->has_failed_reading())
-        throw IndexError(index.path, std::string(purpose) + ": " + directory->last_read_problem());
     });
+    if (directory->has_failed_reading()) throw SpoiledSnapshot();
   }
 
   void Describe(SearchResult& result) const {
@@ -185,21 +190,33 @@ class SearchRun {
 
 }  // namespace
 
-SearchResult RunSearch(const std::vector<SearchedIndex>& indexes, const SearchRequest& request,
+SearchResult RunSearch(const std::function<std::vector<SearchedIndex>()>& open, const SearchRequest& request,
                        const SearchPluginRegistry& plugins, const SearchLimits& limits) {
   CheckRequest(request, limits);
-  return SearchRun(indexes, request, plugins, limits).Run();
+  for (int left = kMostSnapshots;; --left) {
+    const std::vector<SearchedIndex> indexes = open();
+    try {
+      return SearchRun(indexes, request, plugins, limits).Run();
+    } catch (const SpoiledSnapshot&) {
+      if (left > 0) continue;
+      throw IndexError(indexes.front().path,
+                       "cannot search: reading fails in other searches, again and again");
+    }
+  }
 }
 
 SearchResult SearchIndexes(const std::vector<std::shared_ptr<Index>>& indexes, const SearchRequest& request,
                            const SearchPluginRegistry& plugins, const SearchLimits& limits) {
   CheckIndexCount(indexes.size(), limits);
-  std::vector<SearchedIndex> searched;
-  searched.reserve(indexes.size());
-  for (const std::shared_ptr<Index>& index : indexes) {
-    searched.push_back({index->path(), index->settings(), index->NewestSnapshot()});
-  }
-  return RunSearch(searched, request, plugins, limits);
+  const auto open = [&] {
+    std::vector<SearchedIndex> searched;
+    searched.reserve(indexes.size());
+    for (const std::shared_ptr<Index>& index : indexes) {
+      searched.push_back({index->path(), index->settings(), index->NewestSnapshot()});
+    }
+    return searched;
+  };
+  return RunSearch(open, request, plugins, limits);
 }
 
 }  // namespace vantrel::elastic

@@ -1,5 +1,6 @@
 #pragma once
 
+#include <functional>
 #include <memory>
 #include <string>
 #include <vector>
@@ -17,8 +18,9 @@ struct SearchedIndex {
   std::shared_ptr<const Snapshot> snapshot;
 };
 
-// What SearchIndexes does, of which see there, once the indexes' snapshots are at hand.
-SearchResult RunSearch(const std::vector<SearchedIndex>& indexes, const SearchRequest& request,
+// What SearchIndexes does, of which see there, on the snapshots that `open` hands out. It is asked for newer ones where
+// another search has failed on the same.
+SearchResult RunSearch(const std::function<std::vector<SearchedIndex>()>& open, const SearchRequest& request,
                        const SearchPluginRegistry& plugins, const SearchLimits& limits);
 
 }  // namespace vantrel::elastic

@@ -4,8 +4,6 @@
 #include <ctime>
 #include <utility>
 
-#include "elastic/format/commit.h"
-#include "elastic/format/folder.h"
 #include "elastic/search/library_failure.h"
 #include "vantrel/elastic/index_error.h"
 
@@ -40,11 +38,12 @@ std::shared_ptr<const Snapshot> SnapshotKeeper::Newest() {
   const bool unchanged = same_folder && state_.settled && state.changed.tv_sec == state_.changed.tv_sec &&
                          state.changed.tv_nsec == state_.changed.tv_nsec;
   if (snapshot_ != nullptr && unchanged) return snapshot_;
-  if (!same_folder && snapshot_ != nullptr) {
+  if (!same_folder && state_.inode != 0) {
     snapshot_.reset();
     guard_->Forget();
   }
-  const int64_t generation = AdmitNewestCommit();
+  // Also where the commit is at hand: it may have been given its manifest since.
+  const int64_t generation = guard_->AdmitNewestCommit();
   if (snapshot_ == nullptr || generation != generation_) Open(generation);
   state_ = state;
   return snapshot_;
@@ -55,16 +54,6 @@ SnapshotKeeper::FolderState SnapshotKeeper::Look() const {
   if (stat(folder_.c_str(), &status) != 0) throw IndexIoError(folder_, "cannot examine index folder", errno);
   const time_t age = time(nullptr) - status.st_mtim.tv_sec;
   return {status.st_dev, status.st_ino, status.st_mtim, age >= kSettledSeconds};
-}
-
-// Returns its generation.
-int64_t SnapshotKeeper::AdmitNewestCommit() {
-  int64_t generation = 0;
-  format::UseNewestCommit(format::DiskFolder(folder_), [&](const format::Commit& commit) {
-    if (snapshot_ == nullptr || commit.generation != generation_) guard_->Admit(commit);
-    generation = commit.generation;
-  });
-  return generation;
 }
 
 void SnapshotKeeper::Open(int64_t generation) {

@@ -50,7 +50,6 @@ class SnapshotKeeper {
   };
 
   FolderState Look() const;
-  int64_t AdmitNewestCommit();
   void Open(int64_t generation);
 
   std::string folder_;

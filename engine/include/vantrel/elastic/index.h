@@ -49,7 +49,7 @@ struct AnalyzedToken {
 // that are let go with the last search that is at them.
 //
 // Any number of threads may use an Index at once. Changes are made one after another: a thread that changes
-// something waits for those before it, an Optimize or a Commit included. Searches wait for nobody.
+// something waits for those before it, an Optimize or a Commit included. Searches do not wait for changes.
 //
 // Errors are IndexError (index_error.h), and in searches also SearchError (search_error.h):
 //   IndexValueError   the argument cannot be taken; nothing happened, everything else still holds
@@ -58,11 +58,11 @@ struct AnalyzedToken {
 //   any other         disk, memory or files failed; where a change was under way, every change since the last
 //                     commit is lost, and the next one starts anew from that commit
 //
-// Nothing damaged reaches the index library, which could crash on it. Files that the commit's manifest knows are
-// compared with it, each block of 1 MiB when it is first read; what differs is an error that names the file, and
-// whatever does not read that block goes on. A commit without a manifest is checked as a whole when it is first
-// searched or written to (CheckIndexHealth, about a second for each GB), and refused where it is unsafe; for a minute
-// then, it is not checked again.
+// What is damaged when it is first read does not reach the index library, which could crash on it. Files that the
+// commit's manifest knows are compared with it, each block of 1 MiB when it is first read; what differs is an error
+// that names the file, and whatever does not read that block goes on. A commit without a manifest is checked as a whole
+// when it is first searched or written to (CheckIndexHealth, about a second for each GB), which searches wait for, and
+// refused where it is unsafe; for a minute at least it is then not checked again.
 class VANTREL_ELASTIC_EXPORT Index {
  public:
   // Makes an empty index in the folder `path`, taken byte for byte, which is created where it is missing; its
