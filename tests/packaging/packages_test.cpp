@@ -174,7 +174,7 @@ TEST(Packages, ADevelopmentPackageNeedsItsLibraryAndWhatItsHeadersInclude) {
   const std::string version = Field("quorelastic", "Version");
   EXPECT_THAT(Field("libquorelastic-dev", "Depends"),
               AllOf(HasSubstr("libquorelastic0 (= " + version + ")"), HasSubstr("liblucene++-dev"),
-                    HasSubstr("libjsoncpp-dev"), HasSubstr("libboost-thread-dev")));
+                    HasSubstr("libjsoncpp-dev"), HasSubstr("libboost-thread-dev"), HasSubstr("pkg-config")));
   EXPECT_EQ(Field("libquordaemon-dev", "Depends"), "libquordaemon0 (= " + version + ")");
 }
 
