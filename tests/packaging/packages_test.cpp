@@ -103,12 +103,23 @@ TEST(Packages, AreSixOfOneVersionEachOnlyOnce) {
 }
 
 TEST(Packages, HoldTheirPartOfTheInstallation) {
-  EXPECT_THAT(OwnFiles("quorelastic"), Contains("/usr/bin/quorelastic"));
+  EXPECT_THAT(OwnFiles("quorelastic"),
+              ElementsAre("/usr/bin/quorelastic", "/usr/share/bash-completion/completions/quorelastic"));
   for (const char* path :
        {"/usr/sbin/quorelasticd", "/etc/default/quorelasticd", "/usr/lib/systemd/system/quorelasticd.service",
         "/usr/lib/systemd/system/quorelasticd.socket", "/usr/lib/sysusers.d/quorelasticd.conf",
         "/usr/lib/tmpfiles.d/quorelasticd.conf", "/usr/share/doc/quorelasticd/protocol.md"}) {
     EXPECT_THAT(OwnFiles("quorelasticd"), Contains(path));
+  }
+}
+
+TEST(Packages, HoldTheManualsOfWhatIsInThem) {
+  for (const auto& [package, manual] : {std::array{"quorelastic", "man8/quorelastic.8.gz"},
+                                        std::array{"quorelasticd", "man8/quorelasticd.8.gz"},
+                                        std::array{"quorelasticd", "man7/quorelastic-protocol.7.gz"},
+                                        std::array{"libquorelastic-dev", "man3/libquorelastic.3.gz"}}) {
+    EXPECT_TRUE(Contents(package).contains(std::string("/usr/share/man/") + manual))
+        << package << ": " << manual;
   }
 }
 
