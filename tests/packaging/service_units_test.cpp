@@ -54,6 +54,20 @@ TEST_F(ServiceUnits, LeaveTheDaemonLittleToDoHarmWith) {
   EXPECT_THAT(run.out, HasSubstr("Overall exposure level for quorelasticd.service: 0."));
 }
 
+TEST_F(ServiceUnits, DoNotStartADaemonAgainThatRefusesItsOptions) {
+  const RunResult run = RunCommand({std::string(BUILD_FOLDER) + "/bin/quorelasticd", "--no-such-option"});
+  EXPECT_THAT(Lines(Installed("usr/lib/systemd/system/quorelasticd.service")),
+              ::testing::Contains("RestartPreventExitStatus=" + std::to_string(run.status)));
+}
+
+TEST_F(ServiceUnits, LeaveRoomForTheMostThreadsThatTheDaemonTakes) {
+  const std::string unit = Installed("usr/lib/systemd/system/quorelasticd.service");
+  const std::string key = "\nTasksMax=";
+  const size_t place = unit.find(key);
+  ASSERT_NE(place, std::string::npos);
+  EXPECT_GT(std::atoi(unit.c_str() + place + key.size()), 3 * 256 + 16);
+}
+
 TEST_F(ServiceUnits, ListenWhereTheToolConnectsAndForTheGroupAlone) {
   const auto lines = Lines(Installed("usr/lib/systemd/system/quorelasticd.socket"));
   for (const char* line :
