@@ -255,7 +255,7 @@ TEST(Packages, AreTheSameWhoeverMakesThemAndWhen) {
   const TemporaryFolder folder;
   OutputOf({"sh", "-ec", "umask 077; exec \"$0\" \"$@\"",
             std::string(SOURCE_FOLDER) + "/packaging/make-packages", BUILD_FOLDER, folder.path()},
-           {.environment = {"LANG=C.UTF-8", "TZ=Asia/Tokyo"}});
+           {.environment = {"LANG=C.UTF-8", "TZ=Asia/Tokyo", "SOURCE_DATE_EPOCH=1"}});
   for (const std::string& package : kPackages) {
     const std::string file = fs::path(PathOf(package)).filename();
     EXPECT_TRUE(ReadFile(PathOf(package)) == ReadFile(folder / file)) << file;
