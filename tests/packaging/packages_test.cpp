@@ -262,6 +262,27 @@ TEST(Packages, AreTheSameWhoeverMakesThemAndWhen) {
   }
 }
 
+TEST(Packages, AreNotMadeOfABuildThatIsNotToBeShipped) {
+  const std::string cache = ReadFile(std::string(BUILD_FOLDER) + "/CMakeCache.txt");
+  for (const auto& [setting, other, complaint] :
+       {std::array{"CMAKE_BUILD_TYPE:STRING=Release", "CMAKE_BUILD_TYPE:STRING=Debug", "not a Release build"},
+        std::array{"QUORELASTIC_SANITIZE:STRING=", "QUORELASTIC_SANITIZE:STRING=address", "has sanitizers"},
+        std::array{"QUORELASTIC_DATA_ROOT:STRING=/var/lib/quorelastic", "QUORELASTIC_DATA_ROOT:STRING=/srv",
+                   "has its indexes in /srv"},
+        std::array{"CMAKE_PROJECT_VERSION:STATIC=", "CMAKE_PROJECT_VERSION:STATIC=9", "the build at 9"}}) {
+    const TemporaryFolder build;
+    std::string changed = cache;
+    const size_t place = changed.find(std::string("\n").append(setting));
+    ASSERT_NE(place, std::string::npos) << setting;
+    changed.replace(place + 1, std::string(setting).size(), other);
+    WriteFile(build / "CMakeCache.txt", changed);
+    const RunResult run = RunCommand(
+        {std::string(SOURCE_FOLDER) + "/packaging/make-packages", build.path(), build / "packages"});
+    EXPECT_EQ(run.status, 1);
+    EXPECT_THAT(run.err, HasSubstr(complaint));
+  }
+}
+
 // The script that runs after a removal, in a sandbox with a /var/lib of its own.
 class Purge : public ::testing::Test {
  protected:
