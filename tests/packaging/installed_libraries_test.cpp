@@ -72,6 +72,16 @@ TEST_F(InstalledEngine, IsFoundByPkgConfig) {
   ExpectToFindLines(BuildWithPkgConfig("quorelastic", "line_search"));
 }
 
+TEST_F(InstalledEngine, IsNotFoundWhereALibraryOfItsHeadersIsMissing) {
+  const RunResult run =
+      RunCommand({"cmake", "-S", source_, "-B", work_ / "build", "-DCMAKE_PREFIX_PATH=" + prefix_.path(),
+                  std::string("-DCMAKE_CXX_COMPILER=") + CXX_COMPILER},
+                 // pkg-config looks nowhere.
+                 {.environment = {"PKG_CONFIG_LIBDIR=" + prefix_ / "nowhere", "PKG_CONFIG_PATH="}});
+  EXPECT_NE(run.status, 0);
+  EXPECT_THAT(run.err, HasSubstr("pkg-config does not find LUCENE"));
+}
+
 class InstalledConnection : public InstalledLibrary {
  protected:
   InstalledConnection() : InstalledLibrary("quordaemon") {}

@@ -103,12 +103,23 @@ TEST(Packages, AreSixOfOneVersionEachOnlyOnce) {
 }
 
 TEST(Packages, HoldTheirPartOfTheInstallation) {
-  EXPECT_THAT(OwnFiles("quorelastic"), Contains("/usr/bin/quorelastic"));
+  EXPECT_THAT(OwnFiles("quorelastic"),
+              ElementsAre("/usr/bin/quorelastic", "/usr/share/bash-completion/completions/quorelastic"));
   for (const char* path :
        {"/usr/sbin/quorelasticd", "/etc/default/quorelasticd", "/usr/lib/systemd/system/quorelasticd.service",
         "/usr/lib/systemd/system/quorelasticd.socket", "/usr/lib/sysusers.d/quorelasticd.conf",
         "/usr/lib/tmpfiles.d/quorelasticd.conf", "/usr/share/doc/quorelasticd/protocol.md"}) {
     EXPECT_THAT(OwnFiles("quorelasticd"), Contains(path));
+  }
+}
+
+TEST(Packages, HoldTheManualsOfWhatIsInThem) {
+  for (const auto& [package, manual] : {std::array{"quorelastic", "man8/quorelastic.8.gz"},
+                                        std::array{"quorelasticd", "man8/quorelasticd.8.gz"},
+                                        std::array{"quorelasticd", "man7/quorelastic-protocol.7.gz"},
+                                        std::array{"libquorelastic-dev", "man3/libquorelastic.3.gz"}}) {
+    EXPECT_TRUE(Contents(package).contains(std::string("/usr/share/man/") + manual))
+        << package << ": " << manual;
   }
 }
 
@@ -174,7 +185,7 @@ TEST(Packages, ADevelopmentPackageNeedsItsLibraryAndWhatItsHeadersInclude) {
   const std::string version = Field("quorelastic", "Version");
   EXPECT_THAT(Field("libquorelastic-dev", "Depends"),
               AllOf(HasSubstr("libquorelastic0 (= " + version + ")"), HasSubstr("liblucene++-dev"),
-                    HasSubstr("libjsoncpp-dev"), HasSubstr("libboost-thread-dev")));
+                    HasSubstr("libjsoncpp-dev"), HasSubstr("libboost-thread-dev"), HasSubstr("pkg-config")));
   EXPECT_EQ(Field("libquordaemon-dev", "Depends"), "libquordaemon0 (= " + version + ")");
 }
 
@@ -244,10 +255,31 @@ TEST(Packages, AreTheSameWhoeverMakesThemAndWhen) {
   const TemporaryFolder folder;
   OutputOf({"sh", "-ec", "umask 077; exec \"$0\" \"$@\"",
             std::string(SOURCE_FOLDER) + "/packaging/make-packages", BUILD_FOLDER, folder.path()},
-           {.environment = {"LANG=C.UTF-8", "TZ=Asia/Tokyo"}});
+           {.environment = {"LANG=C.UTF-8", "TZ=Asia/Tokyo", "SOURCE_DATE_EPOCH=1"}});
   for (const std::string& package : kPackages) {
     const std::string file = fs::path(PathOf(package)).filename();
     EXPECT_TRUE(ReadFile(PathOf(package)) == ReadFile(folder / file)) << file;
+  }
+}
+
+TEST(Packages, AreNotMadeOfABuildThatIsNotToBeShipped) {
+  const std::string cache = ReadFile(std::string(BUILD_FOLDER) + "/CMakeCache.txt");
+  for (const auto& [setting, other, complaint] :
+       {std::array{"CMAKE_BUILD_TYPE:STRING=Release", "CMAKE_BUILD_TYPE:STRING=Debug", "not a Release build"},
+        std::array{"QUORELASTIC_SANITIZE:STRING=", "QUORELASTIC_SANITIZE:STRING=address", "has sanitizers"},
+        std::array{"QUORELASTIC_DATA_ROOT:STRING=/var/lib/quorelastic", "QUORELASTIC_DATA_ROOT:STRING=/srv",
+                   "has its indexes in /srv"},
+        std::array{"CMAKE_PROJECT_VERSION:STATIC=", "CMAKE_PROJECT_VERSION:STATIC=9", "the build at 9"}}) {
+    const TemporaryFolder build;
+    std::string changed = cache;
+    const size_t place = changed.find(std::string("\n").append(setting));
+    ASSERT_NE(place, std::string::npos) << setting;
+    changed.replace(place + 1, std::string(setting).size(), other);
+    WriteFile(build / "CMakeCache.txt", changed);
+    const RunResult run = RunCommand(
+        {std::string(SOURCE_FOLDER) + "/packaging/make-packages", build.path(), build / "packages"});
+    EXPECT_EQ(run.status, 1);
+    EXPECT_THAT(run.err, HasSubstr(complaint));
   }
 }
 

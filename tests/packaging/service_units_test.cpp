@@ -5,6 +5,7 @@
 #include <cstdlib>
 #include <filesystem>
 #include <string>
+#include <vector>
 
 #include "packaging/lines.h"
 #include "support/files.h"
@@ -53,6 +54,20 @@ TEST_F(ServiceUnits, LeaveTheDaemonLittleToDoHarmWith) {
   EXPECT_THAT(run.out, HasSubstr("Overall exposure level for quorelasticd.service: 0."));
 }
 
+TEST_F(ServiceUnits, DoNotStartADaemonAgainThatRefusesItsOptions) {
+  const RunResult run = RunCommand({std::string(BUILD_FOLDER) + "/bin/quorelasticd", "--no-such-option"});
+  EXPECT_THAT(Lines(Installed("usr/lib/systemd/system/quorelasticd.service")),
+              ::testing::Contains("RestartPreventExitStatus=" + std::to_string(run.status)));
+}
+
+TEST_F(ServiceUnits, LeaveRoomForTheMostThreadsThatTheDaemonTakes) {
+  const std::string unit = Installed("usr/lib/systemd/system/quorelasticd.service");
+  const std::string key = "\nTasksMax=";
+  const size_t place = unit.find(key);
+  ASSERT_NE(place, std::string::npos);
+  EXPECT_GT(std::atoi(unit.c_str() + place + key.size()), 3 * 256 + 16);
+}
+
 TEST_F(ServiceUnits, ListenWhereTheToolConnectsAndForTheGroupAlone) {
   const auto lines = Lines(Installed("usr/lib/systemd/system/quorelasticd.socket"));
   for (const char* line :
@@ -61,13 +76,30 @@ TEST_F(ServiceUnits, ListenWhereTheToolConnectsAndForTheGroupAlone) {
   }
 }
 
-TEST_F(ServiceUnits, RunTheDaemonThatIsInstalledBesideThem) {
+TEST_F(ServiceUnits, UnderUsrReadTheConfigurationInEtc) {
+  EXPECT_THAT(Lines(Installed("usr/lib/systemd/system/quorelasticd.service")),
+              ::testing::Contains("EnvironmentFile=-/etc/default/quorelasticd"));
+  EXPECT_TRUE(std::filesystem::exists(root_ / "etc/default/quorelasticd"));
+}
+
+TEST_F(ServiceUnits, ElsewhereRunTheDaemonAndReadTheConfigurationThatAreInstalledBesideThem) {
   const TemporaryFolder prefix;
-  // Configuration goes to /etc whatever the prefix is; here that is kept within the test's folder.
-  OutputOf({"cmake", "--install", BUILD_FOLDER, "--prefix", "/opt/search", "--component", "quorelasticd"},
-           {.environment = {"DESTDIR=" + prefix.path()}});
-  EXPECT_THAT(ReadFile(prefix / "opt/search/lib/systemd/system/quorelasticd.service"),
-              HasSubstr("\nExecStart=/opt/search/sbin/quorelasticd $QUORELASTICD_OPTIONS\n"));
+  OutputOf({"cmake", "--install", BUILD_FOLDER, "--prefix", prefix.path(), "--component", "quorelasticd"});
+  const auto lines = Lines(ReadFile(prefix / "lib/systemd/system/quorelasticd.service"));
+  EXPECT_THAT(lines,
+              ::testing::Contains("ExecStart=" + prefix.path() + "/sbin/quorelasticd $QUORELASTICD_OPTIONS"));
+  EXPECT_THAT(lines, ::testing::Contains("EnvironmentFile=-" + prefix.path() + "/etc/default/quorelasticd"));
+  EXPECT_TRUE(std::filesystem::exists(prefix / "etc/default/quorelasticd"));
+}
+
+TEST_F(ServiceUnits, AConfigurationThatIsThereAlreadyStays) {
+  const TemporaryFolder prefix;
+  const std::vector<std::string> install = {"cmake",       "--install",   BUILD_FOLDER,  "--prefix",
+                                            prefix.path(), "--component", "quorelasticd"};
+  OutputOf(install);
+  WriteFile(prefix / "etc/default/quorelasticd", "QUORELASTICD_OPTIONS=--verbose\n");
+  OutputOf(install);
+  EXPECT_EQ(ReadFile(prefix / "etc/default/quorelasticd"), "QUORELASTICD_OPTIONS=--verbose\n");
 }
 
 TEST_F(ServiceUnits, TheUserIsASystemUserWithoutALogin) {
