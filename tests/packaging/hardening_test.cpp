@@ -49,6 +49,8 @@ INSTANTIATE_TEST_SUITE_P(Files, Hardening,
                            return path.substr(4, path.find('.') - 4);
                          });
 
+// libquordaemon is left out: the compiler proves each of its copies sound, or does not know the size of the target, so
+// that none is checked as it runs.
 TEST(Fortification, LengthsAreCheckedInTheCLibrary) {
   for (const char* file : {"bin/quorelastic", "bin/quorelasticd", "lib/libquorelastic.so"}) {
     const std::string symbols =

@@ -10,6 +10,7 @@
 #include <vector>
 
 #include "packaging/lines.h"
+#include "packaging/package_path.h"
 #include "support/files.h"
 #include "support/temporary_folder.h"
 
@@ -27,14 +28,6 @@ using ::testing::UnorderedElementsAreArray;
 
 const std::vector<std::string> kPackages = {"libquordaemon-dev", "libquordaemon0", "libquorelastic-dev",
                                             "libquorelastic0",   "quorelastic",    "quorelasticd"};
-
-std::string PathOf(const std::string& package) {
-  for (const std::string& file : ListFolder(PACKAGES_FOLDER)) {
-    if (file.starts_with(package + "_")) return std::string(PACKAGES_FOLDER) + "/" + file;
-  }
-  ADD_FAILURE() << package << " has not been made";
-  return "";
-}
 
 std::string Field(const std::string& package, const std::string& field) {
   const auto lines = Lines(OutputOf({"dpkg-deb", "--field", PathOf(package), field}));
@@ -281,40 +274,6 @@ TEST(Packages, AreNotMadeOfABuildThatIsNotToBeShipped) {
     EXPECT_EQ(run.status, 1);
     EXPECT_THAT(run.err, HasSubstr(complaint));
   }
-}
-
-// The script that runs after a removal, in a sandbox with a /var/lib of its own.
-class Purge : public ::testing::Test {
- protected:
-  RunResult Run(const std::string& before, const std::string& after) const {
-    const TemporaryFolder folder;
-    OutputOf({"dpkg-deb", "--control", PathOf("quorelasticd"), folder / "control"});
-    return RunCommand(
-        {"bwrap", "--ro-bind", "/", "/", "--dev", "/dev", "--tmpfs", "/var/lib", "--tmpfs", "/etc/systemd",
-         "sh", "-ec", before + "; sh \"$0\" purge; " + after, folder / "control/postrm"},
-        {.environment = {"DPKG_MAINTSCRIPT_PACKAGE=quorelasticd"}});
-  }
-
-  void SetUp() override {
-    const RunResult trial = RunCommand({"bwrap", "--ro-bind", "/", "/", "--tmpfs", "/var/lib", "true"});
-    if (trial.status != 0) GTEST_SKIP() << "no sandbox on this machine: " << trial.err;
-  }
-};
-
-TEST_F(Purge, LeavesNothingOfADaemonWithoutIndexes) {
-  const RunResult run = Run("mkdir -p /var/lib/quorelastic/import; touch /var/lib/quorelastic/daemon.lock",
-                            "test ! -e /var/lib/quorelastic");
-  EXPECT_EQ(run.status, 0) << run;
-  EXPECT_EQ(run.err, "");
-}
-
-TEST_F(Purge, KeepsIndexes) {
-  const RunResult run =
-      Run("mkdir -p /var/lib/quorelastic/import /var/lib/quorelastic/mail; "
-          "echo precious >/var/lib/quorelastic/mail/file",
-          "cat /var/lib/quorelastic/mail/file");
-  EXPECT_EQ(run.out, "precious\n");
-  EXPECT_THAT(run.err, HasSubstr("the indexes in /var/lib/quorelastic are kept"));
 }
 
 }  // namespace

@@ -1,9 +1,11 @@
 // The units that systemd runs the daemon by, as they are installed under /usr.
 
 #include <gmock/gmock.h>
+#include <unistd.h>
 
 #include <cstdlib>
 #include <filesystem>
+#include <regex>
 #include <string>
 #include <vector>
 
@@ -100,6 +102,30 @@ TEST_F(ServiceUnits, AConfigurationThatIsThereAlreadyStays) {
   WriteFile(prefix / "etc/default/quorelasticd", "QUORELASTICD_OPTIONS=--verbose\n");
   OutputOf(install);
   EXPECT_EQ(ReadFile(prefix / "etc/default/quorelasticd"), "QUORELASTICD_OPTIONS=--verbose\n");
+}
+
+TEST_F(ServiceUnits, TheFoldersAreTheGroupsAsFarAsItNeedsThemAndAChangedModeStays) {
+  // The file's lines with a user that there is on this machine, whose owner need not be set.
+  const std::string root = root_.path();
+  const std::string id = std::to_string(geteuid());
+  std::string lines;
+  for (const std::string& line : Lines(Installed("usr/lib/tmpfiles.d/quorelasticd.conf"))) {
+    lines += std::regex_replace(line, std::regex("quorelastic quorelastic -"),
+                                id + " " + std::to_string(getegid()) + " -") +
+             "\n";
+  }
+  WriteFile(root_ / "folders.conf", lines);
+  const std::vector<std::string> make = {"systemd-tmpfiles", "--create", "--root=" + root,
+                                         root_ / "folders.conf"};
+  const auto modes = [&] {
+    return OutputOf(
+        {"stat", "--format=%a", root + "/var/lib/quorelastic", root + "/var/lib/quorelastic/import"});
+  };
+  OutputOf(make);
+  EXPECT_EQ(modes(), "750\n3770\n");
+  std::filesystem::permissions(root + "/var/lib/quorelastic/import", std::filesystem::perms::owner_all);
+  OutputOf(make);
+  EXPECT_EQ(modes(), "750\n700\n");
 }
 
 TEST_F(ServiceUnits, TheUserIsASystemUserWithoutALogin) {
