@@ -1,13 +1,14 @@
 #pragma once
 
 #include <cstdint>
-#include <string>
+#include <functional>
 
 namespace vantrel::elastic {
 
-// Whether the index library's checker lives through one segment of the index in a folder: it is
-// run in a child process with 2 GiB of memory and a time that goes with `index_bytes`. What it finds is no matter.
-// To be called where the process has no other thread. Throws std::system_error where there can be no child.
-bool CheckerSurvives(const std::string& path, const std::string& segment, uint64_t index_bytes);
+// Whether a process lives through an operation of the index library on an index: it is tried in a copy of this one,
+// with 2 GiB of memory and a time that goes with `index_bytes`, a second for a small one. Whoever does the same next
+// will live through it as well, as it finds the same in the same memory. An exception counts as a failure. To be called
+// where the process has no other thread. Throws std::system_error where there can be no copy.
+bool SurvivesTrial(uint64_t index_bytes, const std::function<void()>& operation);
 
 }  // namespace vantrel::elastic

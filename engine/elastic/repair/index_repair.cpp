@@ -10,6 +10,7 @@
 #include <sys/stat.h>
 
 #include <algorithm>
+#include <functional>
 #include <optional>
 #include <set>
 #include <string>
@@ -58,34 +59,57 @@ uint64_t SizeOf(const HealthReport& report) {
   return bytes;
 }
 
-// The segments that the checker cannot even be asked about.
-std::set<std::string> FindCondemned(const std::string& path) {
+// What the checker cannot be asked about without care.
+struct UnsafeSegments {
+  std::set<std::string> condemned;  // it does not survive them
+  std::set<std::string> survived;   // alone, it does; by luck, maybe
+  uint64_t index_bytes = 0;
+};
+
+bool CheckerSurvives(const std::string& path, const std::string& segment, uint64_t index_bytes) {
+  return SurvivesTrial(index_bytes, [&] {
+    auto only = Lucene::Collection<Lucene::String>::newInstance();
+    only.add(Lucene::StringUtils::toUnicode(segment));
+    const auto directory = Lucene::newLucene<CheckedDirectory>(path, std::set<std::string>());
+    Lucene::newLucene<Lucene::CheckIndex>(directory)->checkIndex(only);
+  });
+}
+
+UnsafeSegments FindUnsafeSegments(const std::string& path) {
   const HealthReport report = CheckIndexHealth(path);
   std::set<std::string> unsafe;
   for (const HealthFinding& finding : report.findings) {
     if (finding.grade == HealthFinding::Grade::kUnsafe && !finding.segment.empty())
       unsafe.insert(finding.segment);
   }
-  std::set<std::string> condemned;
-  const uint64_t bytes = unsafe.empty() ? 0 : SizeOf(report);
+  UnsafeSegments segments;
+  if (unsafe.empty()) return segments;
+  segments.index_bytes = SizeOf(report);
   for (const std::string& segment : unsafe) {
-    if (!CheckerSurvives(path, segment, bytes)) condemned.insert(segment);
+    const bool survives = CheckerSurvives(path, segment, segments.index_bytes);
+    (survives ? segments.survived : segments.condemned).insert(segment);
   }
-  return condemned;
+  return segments;
 }
 
 // One look of the library's checker at an index, and what it may do about it.
 class Checker {
  public:
-  explicit Checker(const std::string& path)
-      : path_(path),
-        commit_(ReadNewestCommit(path)),
-        condemned_(FindCondemned(path)),
-        directory_(Lucene::newLucene<CheckedDirectory>(path, condemned_)) {
-    RunReading(path_, directory_, "cannot check the index", [&] {
+  explicit Checker(const std::string& path) : path_(path), commit_(ReadNewestCommit(path)) {
+    UnsafeSegments unsafe = FindUnsafeSegments(path);
+    condemned_ = std::move(unsafe.condemned);
+    directory_ = Lucene::newLucene<CheckedDirectory>(path_, condemned_);
+    const std::function<void()> check = [this] {
       checker_ = Lucene::newLucene<Lucene::CheckIndex>(directory_);
       status_ = checker_->checkIndex();
-    });
+    };
+    // Reading past the end of a table ends well in one memory and badly in another: so it is rehearsed in this one, and
+    // where that fails, segments are given up until it does not.
+    while (!unsafe.survived.empty() && !SurvivesTrial(unsafe.index_bytes, check)) {
+      condemned_.insert(unsafe.survived.extract(unsafe.survived.begin()));
+      directory_ = Lucene::newLucene<CheckedDirectory>(path_, condemned_);
+    }
+    RunReading(path_, directory_, "cannot check the index", check);
     // Without a list of segments there is nothing that the library could go on from; it would crash.
     if (!status_->clean && !status_->newSegments) {
       throw IndexError(path_, "the index library cannot read the commit; nothing was changed");
