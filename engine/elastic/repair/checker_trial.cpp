@@ -2,6 +2,7 @@
 
 #include <fcntl.h>
 #include <sys/resource.h>
+#include <sys/time.h>
 #include <sys/wait.h>
 #include <unistd.h>
 
@@ -26,15 +27,16 @@ constexpr bool kLimitsMemory = true;
 // The checker gets through about a hundred megabytes a second of processor time; a slow processor is given one. Where it
 // runs astray, it is for ever, and somebody waits. By the clock there is time for a slow disk too.
 constexpr uint64_t kBytesPerSecond = uint64_t{1} << 20;
-constexpr uint64_t kLeastProcessorSeconds = 1;
-constexpr uint64_t kLeastSeconds = 60;
+constexpr suseconds_t kLeastProcessorMicroseconds = 250'000;
+constexpr unsigned kLeastSeconds = 60;
 
-uint64_t TimeFor(uint64_t bytes, uint64_t least) {
-  return std::min<uint64_t>(least + bytes / kBytesPerSecond, std::numeric_limits<int32_t>::max());
+int32_t SecondsFor(uint64_t bytes) {
+  constexpr uint64_t kMost = std::numeric_limits<int32_t>::max() - kLeastSeconds;
+  return static_cast<int32_t>(std::min(bytes / kBytesPerSecond, kMost));
 }
 
 [[noreturn]] void RunTrial(const std::function<void()>& operation, uint64_t index_bytes) {
-  for (const int signal : {SIGSEGV, SIGABRT, SIGBUS, SIGFPE, SIGALRM, SIGXCPU}) std::signal(signal, SIG_DFL);
+  for (const int signal : {SIGSEGV, SIGABRT, SIGBUS, SIGFPE, SIGALRM, SIGPROF}) std::signal(signal, SIG_DFL);
   const rlimit none = {0, 0};
   setrlimit(RLIMIT_CORE, &none);
   const rlimit memory = {kMostMemory, kMostMemory};
@@ -42,10 +44,10 @@ uint64_t TimeFor(uint64_t bytes, uint64_t least) {
   // What the C library says of a broken heap is for nobody.
   const int nothing = open("/dev/null", O_WRONLY | O_CLOEXEC);
   dup2(nothing, STDERR_FILENO);
-  const rlim_t processor_seconds = TimeFor(index_bytes, kLeastProcessorSeconds);
-  const rlimit processor = {processor_seconds, processor_seconds};
-  setrlimit(RLIMIT_CPU, &processor);
-  alarm(static_cast<unsigned>(TimeFor(index_bytes, kLeastSeconds)));
+  const int32_t seconds = SecondsFor(index_bytes);
+  const itimerval processor_time = {{}, {seconds, kLeastProcessorMicroseconds}};
+  setitimer(ITIMER_PROF, &processor_time, nullptr);
+  alarm(static_cast<unsigned>(seconds) + kLeastSeconds);
   try {
     operation();
   } catch (...) {
