@@ -190,7 +190,7 @@ std::optional<Manifest> FindManifest(const Folder& folder, const Commit& commit)
 
 std::set<std::string> FilesOf(const Folder& folder, const SegmentInfo& segment) {
   const RecordingFolder recording(folder);
-  WholeSegment(recording, segment);
+  [[maybe_unused]] const WholeSegment opened(recording, segment);
   return recording.names();
 }
 
