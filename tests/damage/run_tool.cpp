@@ -65,6 +65,7 @@ ToolRun RunLimited(const std::string& program, const std::vector<std::string>& a
   std::vector<std::string> copies = {program};
   copies.insert(copies.end(), arguments.begin(), arguments.end());
   std::vector<char*> pointers;
+  pointers.reserve(copies.size() + 1);
   for (std::string& argument : copies) pointers.push_back(argument.data());
   pointers.push_back(nullptr);
   const Capture output;

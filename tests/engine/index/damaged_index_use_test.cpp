@@ -23,9 +23,7 @@ using ::quorelastic::testing::ListFolder;
 using ::quorelastic::testing::MakeDocument;
 using ::quorelastic::testing::ReadFile;
 using ::quorelastic::testing::TemporaryFolder;
-using ::quorelastic::testing::Terms;
 using ::quorelastic::testing::WriteFile;
-using ::testing::ElementsAre;
 using ::testing::HasSubstr;
 
 constexpr const char* kManifest = "/quorelastic.manifest";
