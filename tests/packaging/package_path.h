@@ -1,20 +1,14 @@
 #pragma once
 
-#include <gtest/gtest.h>
-
 #include <string>
-
-#include "support/files.h"
+#include <vector>
 
 namespace quorelastic::testing {
 
-// The file of a package that packaging/make-packages has made.
-inline std::string PathOf(const std::string& package) {
-  for (const std::string& file : ListFolder(PACKAGES_FOLDER)) {
-    if (file.starts_with(package + "_")) return std::string(PACKAGES_FOLDER) + "/" + file;
-  }
-  ADD_FAILURE() << package << " has not been made";
-  return "";
-}
+// The names of the files of the packages that packaging/make-packages has made.
+std::vector<std::string> PackageFiles();
+
+// The path of a package's file. A failure of the test where it has not been made.
+std::string PathOf(const std::string& package);
 
 }  // namespace quorelastic::testing
