@@ -6,6 +6,7 @@
 #include <new>
 
 namespace vantrel::elastic::format {
+
 BlockDigest::BlockDigest() : state_(XXH3_createState(), [](XXH3_state_s* state) { XXH3_freeState(state); }) {
   if (state_ == nullptr) throw std::bad_alloc();
   XXH3_64bits_reset(state_.get());
@@ -25,17 +26,19 @@ std::string DigestText(uint64_t digest) {
   return digits;
 }
 
-uint64_t DigestOfBlock(const ByteSource& file, uint64_t block) {
+uint64_t DigestOfBlock(const ByteSource& file, uint64_t block, std::vector<uint8_t>& buffer) {
   const uint64_t start = block * kDigestBlock;
   BlockDigest digest;
-  ReadToDigest(file, start, std::min(start + kDigestBlock, file.size()),
+  ReadToDigest(file, start, std::min(start + kDigestBlock, file.size()), buffer,
                [&](uint64_t /*offset*/, std::span<const uint8_t> piece) { digest.Add(piece); });
   return digest.value();
 }
 
 std::vector<uint64_t> DigestBlocks(const ByteSource& file) {
   std::vector<uint64_t> digests(CountDigestBlocks(file.size()));
-  for (uint64_t block = 0; block < digests.size(); ++block) digests[block] = DigestOfBlock(file, block);
+  std::vector<uint8_t> buffer;
+  for (uint64_t block = 0; block < digests.size(); ++block)
+    digests[block] = DigestOfBlock(file, block, buffer);
   return digests;
 }
 

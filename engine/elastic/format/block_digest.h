@@ -45,21 +45,24 @@ inline constexpr size_t kDigestDigits = 16;
 std::string DigestText(uint64_t digest);
 
 // Reads a range of a file in pieces that stay in the processor's cache until they are digested: calls
-// take(offset, piece) for each, in order. Throws what reading throws.
+// take(offset, piece) for each, in order. `buffer` is grown where need be, and kept for the next range. Throws what
+// reading throws.
 template <typename Take>
-void ReadToDigest(const ByteSource& file, uint64_t from, uint64_t to, Take take) {
+void ReadToDigest(const ByteSource& file, uint64_t from, uint64_t to, std::vector<uint8_t>& buffer,
+                  Take take) {
   constexpr uint64_t kPiece = uint64_t{256} << 10;
-  const auto buffer = std::make_unique_for_overwrite<uint8_t[]>(std::min(kPiece, to - from));
   while (from < to) {
-    const std::span<uint8_t> piece(buffer.get(), std::min(kPiece, to - from));
+    const uint64_t length = std::min(kPiece, to - from);
+    if (buffer.size() < length) buffer.resize(length);
+    const std::span<uint8_t> piece(buffer.data(), length);
     file.ReadAt(from, piece);
     take(from, std::span<const uint8_t>(piece));
     from += piece.size();
   }
 }
 
-// The digest of a block of a file, by its number. Throws what reading throws.
-uint64_t DigestOfBlock(const ByteSource& file, uint64_t block);
+// The digest of a block of a file, by its number, with a buffer as above. Throws what reading throws.
+uint64_t DigestOfBlock(const ByteSource& file, uint64_t block, std::vector<uint8_t>& buffer);
 
 // The digests of a whole file. Throws what reading throws.
 std::vector<uint64_t> DigestBlocks(const ByteSource& file);

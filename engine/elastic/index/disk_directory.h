@@ -64,8 +64,8 @@ class DiskDirectory : public BytePathDirectory {
   void NoteReadProblem(const IndexError& error);
 
   std::string path_;
-  std::shared_ptr<LibraryGuard>
-      guard_;  // may be shared with other directories of the same folder; may be empty
+  // May be shared with other directories of the same folder; may be empty.
+  std::shared_ptr<LibraryGuard> guard_;
   std::set<std::string> uncommitted_;  // names created since the last commit
   std::optional<IndexIoError> failure_;
   mutable std::mutex read_problem_mutex_;

@@ -90,12 +90,7 @@ void LibraryWriter::MergeSegments() {
 }
 
 void LibraryWriter::UpdateManifest() {
-  const auto generation = [this] {
-    return manifest_.manifest().has_value() ? manifest_.manifest()->generation : 0;
-  };
-  const int64_t before = generation();
-  manifest_.Update();
-  if (generation() == before) return;
+  if (!manifest_.Update()) return;
   try {
     guard_->Take(*manifest_.manifest());
   } catch (const std::bad_alloc&) {

@@ -26,23 +26,24 @@ std::optional<format::Manifest> FindNewestManifest(const format::Folder& folder)
 ManifestKeeper::ManifestKeeper(std::string folder)
     : folder_(std::move(folder)), manifest_(FindNewestManifest(format::DiskFolder(folder_))) {}
 
-void ManifestKeeper::Update() {
+bool ManifestKeeper::Update() {
   try {
-    Write();
+    return Write();
   } catch (const std::exception&) {
-    // As promised: the commit is none the worse.
+    return false;  // as promised: the commit is none the worse
   }
 }
 
-void ManifestKeeper::Write() {
+bool ManifestKeeper::Write() {
   const format::DiskFolder folder(folder_);
   const format::Commit commit = format::ReadNewestCommit(folder);
-  if (manifest_.has_value() && manifest_->generation == commit.generation) return;
+  if (manifest_.has_value() && manifest_->generation == commit.generation) return false;
   format::Manifest next = format::MakeManifest(folder, commit, manifest_);
   const std::string text = format::WriteManifest(next);
-  if (text.size() > format::kLargestManifest) return;
+  if (text.size() > format::kLargestManifest) return false;
   WriteFileDurably(folder_, format::kManifestName, text);
   manifest_ = std::move(next);
+  return true;
 }
 
 }  // namespace vantrel::elastic

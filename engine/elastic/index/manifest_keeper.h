@@ -21,10 +21,11 @@ class ManifestKeeper {
 
   // Gives the newest commit a manifest. Where the system does not let it, the commit stands without one, and a check
   // sees less; what manifest is left then belongs to an earlier commit.
-  void Update();
+  // Returns whether there is one that was not there before.
+  bool Update();
 
  private:
-  void Write();
+  bool Write();
 
   std::string folder_;
   std::optional<format::Manifest> manifest_;

@@ -2,18 +2,19 @@
 
 #include <algorithm>
 #include <utility>
+#include <vector>
 
 #include "elastic/format/block_digest.h"
 #include "vantrel/elastic/index_error.h"
 
 namespace vantrel::elastic {
-
 namespace {
 
 using format::kDigestBlock;
 
 void VerifyBlock(const format::ByteSource& file, const format::Manifest::File& expected, uint64_t block) {
-  const uint64_t digest = format::DigestOfBlock(file, block);
+  std::vector<uint8_t> buffer;
+  const uint64_t digest = format::DigestOfBlock(file, block, buffer);
   if (digest == expected.digests[block]) return;
   throw IndexDamagedError(file.name(), block * kDigestBlock,
                           "the block that begins here is not what was written: its digest is " +
