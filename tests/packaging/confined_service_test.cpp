@@ -17,11 +17,12 @@
 #include <vector>
 
 #include "daemon_client.h"
-#include "packaging/lines.h"
+#include "packaging/command_output.h"
 #include "support/byte_writer.h"
 #include "support/descriptor.h"
 #include "support/files.h"
 #include "support/temporary_folder.h"
+#include "support/text_search.h"
 #include "vantrel/elastic/index.h"
 
 namespace quorelastic::testing {
@@ -36,7 +37,7 @@ void Expand(const std::string& name, std::set<std::string>& calls) {
     calls.insert(name);
     return;
   }
-  for (const std::string& line : Lines(OutputOf({"systemd-analyze", "syscall-filter", name}))) {
+  for (const std::string& line : SplitLines(OutputOf({"systemd-analyze", "syscall-filter", name}))) {
     const size_t begin = line.find_first_not_of(' ');
     if (begin == 0 || begin == std::string::npos || line[begin] == '#') continue;
     Expand(line.substr(begin), calls);
@@ -48,7 +49,7 @@ std::set<std::string> AllowedCalls(const std::string& unit) {
   const std::string key = "SystemCallFilter=";
   std::set<std::string> allowed;
   Expand("@default", allowed);
-  for (const std::string& line : Lines(ReadFile(unit))) {
+  for (const std::string& line : SplitLines(ReadFile(unit))) {
     if (!line.starts_with(key)) continue;
     const bool is_refusal = line[key.size()] == '~';
     std::set<std::string> named;

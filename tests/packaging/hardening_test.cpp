@@ -4,7 +4,7 @@
 
 #include <string>
 
-#include "packaging/lines.h"
+#include "packaging/command_output.h"
 
 namespace quorelastic::testing {
 namespace {

@@ -8,7 +8,7 @@
 #include <vector>
 
 #include "daemon_process.h"
-#include "packaging/lines.h"
+#include "packaging/command_output.h"
 #include "support/files.h"
 #include "support/temporary_folder.h"
 

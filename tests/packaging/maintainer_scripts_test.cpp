@@ -7,10 +7,12 @@
 #include <string>
 #include <vector>
 
-#include "packaging/lines.h"
+#include "packaging/command_output.h"
 #include "packaging/package_path.h"
 #include "support/files.h"
+#include "support/sandbox_test.h"
 #include "support/temporary_folder.h"
+#include "support/text_search.h"
 
 namespace quorelastic::testing {
 namespace {
@@ -28,11 +30,11 @@ constexpr char kPurge[] = "postrm purge";
 constexpr char kForgetCalls[] = "rm -f \"$LOG\"";
 constexpr char kLinks[] = "cd /etc/systemd/system; find . -type l | sort";
 
-class MaintainerScripts : public ::testing::Test {
+class MaintainerScripts : public SandboxTest {
  protected:
   void SetUp() override {
-    const RunResult trial = RunCommand({"bwrap", "--ro-bind", "/", "/", "--tmpfs", "/var/lib", "true"});
-    if (trial.status != 0) GTEST_SKIP() << "no sandbox on this machine: " << trial.err;
+    SandboxTest::SetUp();
+    if (IsSkipped()) return;
     OutputOf({"dpkg-deb", "--raw-extract", PathOf("quorelasticd"), folder_ / "package"});
     fs::create_directory(folder_ / "commands");
     const std::string note = "echo \"${0##*/} $*\" >>\"$LOG\"\n";
@@ -73,7 +75,7 @@ class MaintainerScripts : public ::testing::Test {
 
   std::string Log() const { return folder_ / "log"; }
   std::vector<std::string> Calls() const {
-    return fs::exists(Log()) ? Lines(ReadFile(Log())) : std::vector<std::string>();
+    return fs::exists(Log()) ? SplitLines(ReadFile(Log())) : std::vector<std::string>();
   }
 
   TemporaryFolder folder_;
@@ -88,8 +90,8 @@ TEST_F(MaintainerScripts, AnInstallationMakesTheUserAndTheFoldersAndStartsTheSer
                           "systemctl --system daemon-reload", "deb-systemd-invoke start quorelasticd.socket",
                           "deb-systemd-invoke restart quorelasticd.service"));
   // At boot too.
-  EXPECT_THAT(Lines(run.out), ElementsAre("./multi-user.target.wants/quorelasticd.service",
-                                          "./sockets.target.wants/quorelasticd.socket"));
+  EXPECT_THAT(SplitLines(run.out), ElementsAre("./multi-user.target.wants/quorelasticd.service",
+                                               "./sockets.target.wants/quorelasticd.socket"));
 }
 
 TEST_F(MaintainerScripts, WhereSystemdDoesNotRunNothingIsStartedOrStopped) {

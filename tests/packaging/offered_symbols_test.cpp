@@ -10,8 +10,9 @@
 #include <string_view>
 #include <vector>
 
-#include "packaging/lines.h"
+#include "packaging/command_output.h"
 #include "support/files.h"
+#include "support/text_search.h"
 
 namespace quorelastic::testing {
 namespace {
@@ -24,7 +25,7 @@ std::vector<std::string> OfferedNames(const std::string& library) {
   static const std::regex line("[0-9a-f]* ([A-Za-z]) (?:(?:typeinfo name|typeinfo|vtable) for )?(.*)");
   std::vector<std::string> names;
   const std::string path = std::string(BUILD_FOLDER) + "/lib/" + library;
-  for (const std::string& text : Lines(OutputOf(
+  for (const std::string& text : SplitLines(OutputOf(
            {"nm", "--dynamic", "--defined-only", "--demangle", "--without-symbol-versions", path}))) {
     std::smatch parts;
     if (!std::regex_match(text, parts, line)) {

@@ -9,10 +9,11 @@
 #include <string>
 #include <vector>
 
-#include "packaging/lines.h"
+#include "packaging/command_output.h"
 #include "packaging/package_path.h"
 #include "support/files.h"
 #include "support/temporary_folder.h"
+#include "support/text_search.h"
 
 namespace quorelastic::testing {
 namespace {
@@ -30,7 +31,7 @@ const std::vector<std::string> kPackages = {"libquordaemon-dev", "libquordaemon0
                                             "libquorelastic0",   "quorelastic",    "quorelasticd"};
 
 std::string Field(const std::string& package, const std::string& field) {
-  const auto lines = Lines(OutputOf({"dpkg-deb", "--field", PathOf(package), field}));
+  const auto lines = SplitLines(OutputOf({"dpkg-deb", "--field", PathOf(package), field}));
   return lines.empty() ? "" : lines[0];
 }
 
@@ -47,7 +48,7 @@ struct Entry {
 std::map<std::string, Entry> Contents(const std::string& package) {
   static const std::regex line(R"((\S+) (\S+) +\d+ \S+ \S+ \.(/\S*?)( -> .*)?)");
   std::map<std::string, Entry> entries;
-  for (const std::string& text : Lines(OutputOf({"dpkg-deb", "--contents", PathOf(package)}))) {
+  for (const std::string& text : SplitLines(OutputOf({"dpkg-deb", "--contents", PathOf(package)}))) {
     std::smatch parts;
     if (std::regex_match(text, parts, line)) {
       entries[parts[3]] = {parts[1], parts[2]};
@@ -86,7 +87,7 @@ std::vector<std::string> SourceFiles(const std::string& folder, const std::strin
 
 TEST(Packages, AreSixOfOneVersionEachOnlyOnce) {
   std::vector<std::string> names;
-  for (const std::string& file : ListFolder(PACKAGES_FOLDER)) names.push_back(file.substr(0, file.find('_')));
+  for (const std::string& file : PackageFiles()) names.push_back(file.substr(0, file.find('_')));
   EXPECT_EQ(names, kPackages);
   for (const std::string& package : kPackages) {
     EXPECT_EQ(Field(package, "Version"), Field("quorelastic", "Version"));
@@ -237,7 +238,7 @@ TEST(Packages, AnOverrideOfTheCheckersHasAReason) {
     OutputOf({"dpkg-deb", "--extract", PathOf(package), folder.path()});
     const std::string path = folder / ("usr/share/lintian/overrides/" + package);
     std::string before;
-    for (const std::string& line : Lines(ReadFile(path))) {
+    for (const std::string& line : SplitLines(ReadFile(path))) {
       EXPECT_TRUE(line.starts_with("#") || before.starts_with("#")) << package << ": " << line;
       before = line;
     }

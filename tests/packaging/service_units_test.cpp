@@ -9,9 +9,10 @@
 #include <string>
 #include <vector>
 
-#include "packaging/lines.h"
+#include "packaging/command_output.h"
 #include "support/files.h"
 #include "support/temporary_folder.h"
+#include "support/text_search.h"
 
 namespace quorelastic::testing {
 namespace {
@@ -58,7 +59,7 @@ TEST_F(ServiceUnits, LeaveTheDaemonLittleToDoHarmWith) {
 
 TEST_F(ServiceUnits, DoNotStartADaemonAgainThatRefusesItsOptions) {
   const RunResult run = RunCommand({std::string(BUILD_FOLDER) + "/bin/quorelasticd", "--no-such-option"});
-  EXPECT_THAT(Lines(Installed("usr/lib/systemd/system/quorelasticd.service")),
+  EXPECT_THAT(SplitLines(Installed("usr/lib/systemd/system/quorelasticd.service")),
               ::testing::Contains("RestartPreventExitStatus=" + std::to_string(run.status)));
 }
 
@@ -71,7 +72,7 @@ TEST_F(ServiceUnits, LeaveRoomForTheMostThreadsThatTheDaemonTakes) {
 }
 
 TEST_F(ServiceUnits, ListenWhereTheToolConnectsAndForTheGroupAlone) {
-  const auto lines = Lines(Installed("usr/lib/systemd/system/quorelasticd.socket"));
+  const auto lines = SplitLines(Installed("usr/lib/systemd/system/quorelasticd.socket"));
   for (const char* line :
        {"ListenStream=/run/quorelasticd.sock", "SocketMode=0660", "SocketGroup=quorelastic"}) {
     EXPECT_THAT(lines, ::testing::Contains(line));
@@ -79,7 +80,7 @@ TEST_F(ServiceUnits, ListenWhereTheToolConnectsAndForTheGroupAlone) {
 }
 
 TEST_F(ServiceUnits, UnderUsrReadTheConfigurationInEtc) {
-  EXPECT_THAT(Lines(Installed("usr/lib/systemd/system/quorelasticd.service")),
+  EXPECT_THAT(SplitLines(Installed("usr/lib/systemd/system/quorelasticd.service")),
               ::testing::Contains("EnvironmentFile=-/etc/default/quorelasticd"));
   EXPECT_TRUE(std::filesystem::exists(root_ / "etc/default/quorelasticd"));
 }
@@ -87,7 +88,7 @@ TEST_F(ServiceUnits, UnderUsrReadTheConfigurationInEtc) {
 TEST_F(ServiceUnits, ElsewhereRunTheDaemonAndReadTheConfigurationThatAreInstalledBesideThem) {
   const TemporaryFolder prefix;
   OutputOf({"cmake", "--install", BUILD_FOLDER, "--prefix", prefix.path(), "--component", "quorelasticd"});
-  const auto lines = Lines(ReadFile(prefix / "lib/systemd/system/quorelasticd.service"));
+  const auto lines = SplitLines(ReadFile(prefix / "lib/systemd/system/quorelasticd.service"));
   EXPECT_THAT(lines,
               ::testing::Contains("ExecStart=" + prefix.path() + "/sbin/quorelasticd $QUORELASTICD_OPTIONS"));
   EXPECT_THAT(lines, ::testing::Contains("EnvironmentFile=-" + prefix.path() + "/etc/default/quorelasticd"));
@@ -109,7 +110,7 @@ TEST_F(ServiceUnits, TheFoldersAreTheGroupsAsFarAsItNeedsThemAndAChangedModeStay
   const std::string root = root_.path();
   const std::string id = std::to_string(geteuid());
   std::string lines;
-  for (const std::string& line : Lines(Installed("usr/lib/tmpfiles.d/quorelasticd.conf"))) {
+  for (const std::string& line : SplitLines(Installed("usr/lib/tmpfiles.d/quorelasticd.conf"))) {
     lines += std::regex_replace(line, std::regex("quorelastic quorelastic -"),
                                 id + " " + std::to_string(getegid()) + " -") +
              "\n";
@@ -134,7 +135,7 @@ TEST_F(ServiceUnits, TheUserIsASystemUserWithoutALogin) {
   const RunResult run = RunCommand(
       {"systemd-sysusers", "--root=" + machine.path(), root_ / "usr/lib/sysusers.d/quorelasticd.conf"});
   ASSERT_EQ(run.status, 0) << run;
-  const auto users = Lines(ReadFile(machine / "etc/passwd"));
+  const auto users = SplitLines(ReadFile(machine / "etc/passwd"));
   ASSERT_THAT(users, SizeIs(1));
   EXPECT_THAT(users[0],
               MatchesRegex("quorelastic:[^:]*:[0-9]+:[0-9]+:Full-text search daemon:/var/lib/quorelastic:.*"

@@ -3,6 +3,7 @@
 #include <regex.h>
 
 #include <array>
+#include <sstream>
 #include <stdexcept>
 #include <string_view>
 
@@ -49,6 +50,13 @@ std::vector<std::vector<std::string>> FindAll(const std::string& text, const std
     found.push_back(std::move(match));
   }
   return found;
+}
+
+std::vector<std::string> SplitLines(const std::string& text) {
+  std::vector<std::string> lines;
+  std::istringstream in(text);
+  for (std::string line; std::getline(in, line);) lines.push_back(line);
+  return lines;
 }
 
 bool IsAsShown(const std::string& line, const std::string& shown) {

@@ -10,6 +10,9 @@ namespace quorelastic::testing {
 // std::invalid_argument for what is no pattern.
 std::vector<std::vector<std::string>> FindAll(const std::string& text, const std::string& pattern);
 
+// The lines of a text, without their ends.
+std::vector<std::string> SplitLines(const std::string& text);
+
 // Whether a line is as shown, where three dots in what is shown stand for anything.
 bool IsAsShown(const std::string& line, const std::string& shown);
 

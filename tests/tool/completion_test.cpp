@@ -12,8 +12,8 @@
 #include "support/repository.h"
 #include "support/sandbox_test.h"
 #include "support/temporary_folder.h"
+#include "support/text_search.h"
 #include "support/tool_run.h"
-#include "tool/inspection.h"
 #include "tool/option_table.h"
 #include "vantrel/elastic/search_plugin.h"
 
@@ -47,9 +47,7 @@ Strings Command(const Strings& words, const std::string& helpers = "") {
 Strings Offered(const RunResult& run) {
   EXPECT_EQ(run.status, 0) << run;
   EXPECT_EQ(run.err, "");
-  Strings offered = Lines(run.out);
-  for (std::string& one : offered) one.pop_back();  // the end of the line
-  return offered;
+  return SplitLines(run.out);
 }
 
 Strings Complete(const Strings& words, const std::string& helpers = "") {
@@ -97,7 +95,7 @@ TEST(CompletionTest, KnowsWhichOptionsTakeAValue) {
 }
 
 TEST(CompletionTest, OffersEveryActionOfTheTool) {
-  const std::set<std::string> actions = FindInSources("src", R"re(\baction == "(\w+)")re");
+  const std::set<std::string> actions = ReadActions();
   EXPECT_THAT(Complete({"--action", ""}), UnorderedElementsAreArray(actions));
   EXPECT_THAT(Complete({"-a", "c"}), UnorderedElementsAre("command", "check"));
 }

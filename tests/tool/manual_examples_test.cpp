@@ -16,7 +16,6 @@
 #include "support/sandbox_test.h"
 #include "support/text_search.h"
 #include "support/tool_run.h"
-#include "tool/inspection.h"
 
 namespace quorelastic::testing {
 namespace {
@@ -89,8 +88,7 @@ class ManualExamplesTest : public SandboxTest {
     const RunResult run = sandbox_.RunCommand(
         {"bash", "-c", script}, {.environment = {"PATH=" + sandbox_.folder() + "/bin:/usr/bin:/bin"}});
     std::vector<std::vector<std::string>> outputs(1);
-    for (std::string line : Lines(run.out)) {
-      line.pop_back();  // its end
+    for (const std::string& line : SplitLines(run.out)) {
       if (line == mark) {
         outputs.emplace_back();
       } else {

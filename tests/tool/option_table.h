@@ -1,9 +1,11 @@
 #pragma once
 
+#include <set>
 #include <stdexcept>
 #include <string>
 #include <vector>
 
+#include "support/repository.h"
 #include "support/tool_run.h"
 
 namespace quorelastic::testing {
@@ -28,5 +30,8 @@ inline std::vector<std::string> ReadOptionTable() {
 inline bool TakesValue(const std::string& option) {
   return RunTool({"--" + option}).err.find("requires an argument") != std::string::npos;
 }
+
+// The action words that it compares with.
+inline std::set<std::string> ReadActions() { return FindInSources("src", R"re(\baction == "(\w+)")re"); }
 
 }  // namespace quorelastic::testing

@@ -2,20 +2,12 @@
 
 #include <gtest/gtest.h>
 
-#include <sstream>
 #include <string>
 #include <vector>
 
 #include "support/tool_run.h"
 
 namespace quorelastic::testing {
-
-inline std::vector<std::string> Lines(const std::string& text) {
-  std::vector<std::string> lines;
-  std::istringstream in(text);
-  for (std::string line; std::getline(in, line);) lines.push_back(line);
-  return lines;
-}
 
 // What a command that is to succeed writes to standard output.
 inline std::string OutputOf(const std::vector<std::string>& command, const RunOptions& options = {}) {
