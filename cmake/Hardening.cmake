@@ -6,9 +6,6 @@ add_link_options(-Wl,-z,noexecstack -Wl,-z,relro -Wl,-z,now -Wl,--as-needed)
 
 if(CMAKE_BUILD_TYPE STREQUAL "Release" AND NOT QUORELASTIC_SANITIZE)
   add_compile_options(-fstack-protector-strong -fstack-clash-protection -U_FORTIFY_SOURCE -D_FORTIFY_SOURCE=3)
-  if(CMAKE_SYSTEM_PROCESSOR MATCHES "x86_64|i[3-6]86")
-    add_compile_options(-fcf-protection)
-  endif()
   # Of two maps that fit, the last one holds.
   add_compile_options("-ffile-prefix-map=${PROJECT_SOURCE_DIR}=." "-ffile-prefix-map=${PROJECT_BINARY_DIR}=./build")
 endif()

@@ -130,24 +130,25 @@ std::span<const uint8_t> ByteReader::Take(uint64_t most) {
   return taken;
 }
 
-// Eight bytes at a time, of which six are counted: so a run of three bytes that announce another one lies within some
-// eight of them, wherever it begins.
+// Eight bytes at a time, beside those before them: a run of three bytes that announce another one is told by its last.
 bool ByteReader::PassShortVInts(uint64_t count) {
   constexpr size_t kLoaded = 8;
-  constexpr size_t kCounted = 6;
   constexpr uint64_t kHighBits = 0x8080808080808080;
-  constexpr uint64_t kCountedBits = kHighBits >> (8 * (kLoaded - kCounted));
   static_assert(std::endian::native == std::endian::little, "the first byte is the lowest of the eight");
+  uint64_t before = 0;  // the high bits of the last eight bytes
   while (count > 0) {
-    if (Window(kLoaded).size() < kLoaded) return PassShortVIntsAtEnd(count);
+    if (Window(kLoaded).size() < kLoaded) {
+      return PassShortVIntsAtEnd(count, std::countl_one(before | ~kHighBits) / 8);
+    }
     const uint8_t* next = buffer_.data() + position_;
     const uint8_t* const last = buffer_.data() + filled_ - kLoaded;
-    for (; next <= last; next += kCounted) {
+    for (; next <= last; next += kLoaded) {
       uint64_t bytes = 0;
       std::memcpy(&bytes, next, sizeof bytes);
       const uint64_t more = bytes & kHighBits;
-      if ((more & more >> 8 & more >> 16) != 0) return false;
-      uint64_t ends = ~bytes & kCountedBits;
+      if ((more & (more << 8 | before >> 56) & (more << 16 | before >> 48)) != 0) return false;
+      before = more;
+      uint64_t ends = more ^ kHighBits;
       const uint64_t ended = (ends >> 7) * 0x0101010101010101 >> 56;  // how many bits are set
       if (ended >= count) {
         while (--count > 0) ends &= ends - 1;
@@ -161,8 +162,9 @@ bool ByteReader::PassShortVInts(uint64_t count) {
   return true;
 }
 
-bool ByteReader::PassShortVIntsAtEnd(uint64_t count) {
-  for (int length = 1; count > 0; ++length) {
+// `passed` bytes of the first one lie behind.
+bool ByteReader::PassShortVIntsAtEnd(uint64_t count, int passed) {
+  for (int length = passed + 1; count > 0; ++length) {
     if (remaining() == 0 || length > 3) return false;
     if (ReadByte() >= 0x80) continue;
     --count;

@@ -91,7 +91,7 @@ class ByteReader {
   uint64_t ReadLongVLong();
   void Refill(uint64_t wanted);
   [[noreturn]] void RefuseEnd(uint64_t offset, uint64_t wanted) const;
-  bool PassShortVIntsAtEnd(uint64_t count);
+  bool PassShortVIntsAtEnd(uint64_t count, int passed);
 
   std::shared_ptr<const ByteSource> source_;
   const std::string* name_;  // the source's

@@ -29,15 +29,24 @@ namespace {
 
 constexpr size_t kLongestPosting = 10;  // bytes
 
-// Goes on with a VInt whose first byte announces more; `is_long` where it takes five bytes or more.
+// Goes on with a VInt whose first two bytes announce more; `is_long` where it takes five bytes or more.
 inline const uint8_t* FinishVInt(const uint8_t* next, uint32_t& value, bool& is_long) {
-  value = (value & 0x7f) | static_cast<uint32_t>(*next & 0x7f) << 7;
-  if (*next++ < 0x80) return next;
   value |= static_cast<uint32_t>(*next & 0x7f) << 14;
   if (*next++ < 0x80) return next;
   value |= static_cast<uint32_t>(*next & 0x7f) << 21;
   if (*next++ >= 0x80) is_long = true;
   return next;
+}
+
+// A VInt of which the byte behind it may be read too. One byte or two are told without a jump, which the processor
+// would often guess wrong.
+inline const uint8_t* TakeVInt(const uint8_t* next, uint32_t& value, bool& is_long) {
+  const uint32_t first = next[0];
+  const uint32_t second = next[1];
+  const uint32_t has_second = first >> 7;
+  value = (first & 0x7f) | ((second & 0x7f) << 7 & -has_second);
+  if ((has_second & second >> 7) != 0) return FinishVInt(next + 2, value, is_long);
+  return next + 1 + has_second;
 }
 
 }  // namespace
@@ -51,28 +60,34 @@ bool PostingsReader::PassQuickly(int32_t count) {
   const uint8_t* next = window.data();
   uint32_t* const frequencies = block_.data() + block_count_;
   uint64_t document = static_cast<uint32_t>(document_);
+  uint64_t occurrences = 0;
+  uint32_t bound = 0;
   bool is_bad = false;
   for (int32_t i = 0; i < count; ++i) {
-    uint32_t code = *next++;
-    if (code >= 0x80) next = FinishVInt(next, code, is_bad);
+    uint32_t code = 0;
+    next = TakeVInt(next, code, is_bad);
     uint32_t distance = code;
     uint32_t frequency = 1;
     if constexpr (!kOmitsFrequencies) {
       distance = code >> 1;
       if ((code & 1) == 0) {
-        frequency = *next++;
-        if (frequency >= 0x80) next = FinishVInt(next, frequency, is_bad);
+        frequency = *next;  // nearly always all of it
+        next = frequency < 0x80 ? next + 1 : TakeVInt(next, frequency, is_bad);
       }
     }
     is_bad = is_bad || distance == 0 || frequency == 0;
     document += distance;
     frequencies[i] = frequency;
+    occurrences += frequency;
+    bound |= frequency;
   }
   if (is_bad || document >= document_count_) return false;
   reader_.Advance(static_cast<size_t>(next - window.data()));
   document_ = static_cast<int32_t>(document);
   left_ -= count;
-  for (int32_t i = 0; i < count; ++i) AddToBlock(frequencies[i]);
+  block_count_ += count;
+  block_occurrences_ += occurrences;
+  block_bound_ |= bound;
   return true;
 }
 

@@ -3,6 +3,8 @@
 #include <gtest/gtest.h>
 
 #include <limits>
+#include <random>
+#include <string>
 
 #include "support/byte_writer.h"
 #include "support/expect_damage.h"
@@ -45,6 +47,41 @@ TEST(ByteReaderTest, ReadsVariableLengthNumbersUpToTheirLimits) {
     EXPECT_EQ(reader.ReadVLong(), value);
     EXPECT_EQ(reader.remaining(), 0U);
   }
+}
+
+TEST(ByteReaderTest, PassesShortNumbersWhereverTheyLieInItsBuffer) {
+  for (const size_t buffer : {size_t{8}, size_t{9}, size_t{13}, size_t{16} << 10}) {
+    std::mt19937 random(static_cast<uint32_t>(buffer));
+    for (int round = 0; round < 200; ++round) {
+      ByteWriter bytes;
+      const uint64_t count = 1 + random() % 60;
+      for (uint64_t i = 0; i < count; ++i) bytes.VInt(int64_t{1} << random() % 21);
+      const uint64_t end = bytes.size();
+      bytes.Raw(std::string(random() % 12, 'x'));
+      ByteReader reader(SourceOf(bytes.bytes()), buffer);
+      ASSERT_TRUE(reader.PassShortVInts(count));
+      ASSERT_EQ(reader.offset(), end) << count << " numbers";
+    }
+  }
+}
+
+TEST(ByteReaderTest, PassesNoLongNumberAmongShortOnes) {
+  constexpr uint64_t kCount = 30;
+  for (uint64_t place = 0; place < kCount; ++place) {
+    for (const size_t buffer : {size_t{8}, size_t{9}, size_t{16} << 10}) {
+      ByteWriter bytes;
+      for (uint64_t i = 0; i < kCount; ++i) bytes.VInt(i == place ? 1 << 21 : 1);
+      ByteReader reader(SourceOf(bytes.bytes()), buffer);
+      EXPECT_FALSE(reader.PassShortVInts(kCount)) << "the number at " << place;
+    }
+  }
+}
+
+TEST(ByteReaderTest, PassesNoShortNumbersPastTheEnd) {
+  ByteReader reader(SourceOf("1234567890"), 8);
+  EXPECT_FALSE(reader.PassShortVInts(11));
+  ByteReader torn(SourceOf("1234567\x80"), 8);
+  EXPECT_FALSE(torn.PassShortVInts(8));
 }
 
 TEST(ByteReaderTest, RefusesAVIntOfMoreThan32BitsWhereItBegins) {

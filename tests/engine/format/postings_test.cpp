@@ -3,7 +3,12 @@
 #include <gmock/gmock.h>
 #include <gtest/gtest.h>
 
+#include <algorithm>
+#include <limits>
+#include <random>
+#include <string>
 #include <utility>
+#include <vector>
 
 #include "support/byte_writer.h"
 #include "support/expect_damage.h"
@@ -16,6 +21,7 @@ using ::quorelastic::testing::ByteWriter;
 using ::quorelastic::testing::ExpectDamage;
 using ::quorelastic::testing::SourceOf;
 using ::testing::ElementsAre;
+using ::testing::ElementsAreArray;
 using ::testing::Pair;
 
 TermInfo Term(int32_t document_frequency, uint64_t pointer) {
@@ -98,6 +104,43 @@ TEST(PostingsTest, GoesOnBehindSomeOfTheDocuments) {
   reader.Resume(2, 97, 1, false);
   ExpectDamage(2, "posting lies 3 after document 97 of 100", [&] { reader.Next(); });
   ExpectDamage(9, "past the end", [&] { reader.Resume(9, 0, 1, false); });
+}
+
+// Distances and frequencies of one to five bytes each, in any order.
+TEST(PostingsTest, PassesABlockAsItPassesItsDocuments) {
+  constexpr int32_t kDocuments = PostingsReader::kLongestBlock;
+  std::mt19937 random(1);
+  for (int round = 0; round < 500; ++round) {
+    const bool omits_frequencies = round % 4 == 0;
+    const uint32_t widest = 1 + random() % 24;  // bits
+    ByteWriter bytes;
+    for (int32_t i = 0; i < kDocuments; ++i) {
+      const uint32_t distance = 1 + random() % (1U << random() % widest);
+      const uint32_t frequency = random() % 3 == 0 ? 2 + random() % (1U << random() % 32) : 1;
+      bytes.VInt(omits_frequencies ? distance : distance << 1 | (frequency == 1 ? 1 : 0));
+      if (!omits_frequencies && frequency != 1) bytes.VInt(frequency);
+    }
+    const uint64_t end = bytes.size();
+    bytes.Raw(std::string(2000, 'x'));
+    const auto source = SourceOf(bytes.bytes());
+    PostingsReader one_by_one(source, std::numeric_limits<int32_t>::max());
+    one_by_one.Seek(Term(kDocuments, 0), omits_frequencies);
+    std::vector<uint32_t> frequencies;
+    uint64_t occurrences = 0;
+    while (one_by_one.Next()) {
+      frequencies.push_back(one_by_one.frequency());
+      occurrences += one_by_one.frequency();
+    }
+    PostingsReader at_once(source, std::numeric_limits<int32_t>::max());
+    at_once.Seek(Term(kDocuments, 0), omits_frequencies);
+    at_once.PassBlock(kDocuments);
+    ASSERT_EQ(at_once.offset(), end);
+    ASSERT_EQ(at_once.document(), one_by_one.document());
+    ASSERT_THAT(at_once.block_frequencies(), ElementsAreArray(frequencies));
+    ASSERT_EQ(at_once.block_occurrences(), occurrences);
+    ASSERT_GE(at_once.block_bound(), *std::max_element(frequencies.begin(), frequencies.end()));
+    ASSERT_FALSE(at_once.Next());
+  }
 }
 
 }  // namespace
