@@ -110,13 +110,14 @@ TEST(PostingsTest, GoesOnBehindSomeOfTheDocuments) {
 TEST(PostingsTest, PassesABlockAsItPassesItsDocuments) {
   constexpr int32_t kDocuments = PostingsReader::kLongestBlock;
   std::mt19937 random(1);
+  const auto below = [&random](uint64_t limit) { return static_cast<uint32_t>(random() % limit); };
   for (int round = 0; round < 500; ++round) {
     const bool omits_frequencies = round % 4 == 0;
-    const uint32_t widest = 1 + random() % 24;  // bits
+    const uint32_t widest = 1 + below(24);  // bits
     ByteWriter bytes;
     for (int32_t i = 0; i < kDocuments; ++i) {
-      const uint32_t distance = 1 + random() % (1U << random() % widest);
-      const uint32_t frequency = random() % 3 == 0 ? 2 + random() % (1U << random() % 32) : 1;
+      const uint32_t distance = 1 + below(uint64_t{1} << below(widest));
+      const uint32_t frequency = below(3) == 0 ? 2 + below(uint64_t{1} << below(31)) : 1;
       bytes.VInt(omits_frequencies ? distance : distance << 1 | (frequency == 1 ? 1 : 0));
       if (!omits_frequencies && frequency != 1) bytes.VInt(frequency);
     }
