@@ -104,6 +104,10 @@ void SyncFile(const std::string& path) {
   if (!file.is_open() || fsync(file.get()) != 0) throw IndexIoError(path, "cannot make file durable", errno);
 }
 
+std::string AsToldByLibrary(const IndexError& error) {
+  return StringUtils::toUTF8(StringUtils::toUnicode(error.what()));
+}
+
 }  // namespace
 
 DiskDirectory::DiskDirectory(const std::string& path, std::shared_ptr<LibraryGuard> guard)
@@ -118,9 +122,14 @@ void DiskDirectory::Fail(const IndexIoError& error) {
   boost::throw_exception(Lucene::IOException(StringUtils::toUnicode(error.what())));
 }
 
-std::string DiskDirectory::last_read_problem() const {
+void DiskDirectory::ThrowFailure(const char* purpose, std::string reason) const {
   const std::lock_guard lock(read_problem_mutex_);
-  return read_problem_;
+  if (reason.empty()) reason = read_problem_;
+  if (io_problem_.has_value() && reason.find(AsToldByLibrary(*io_problem_)) != std::string::npos) {
+    throw IndexIoError(*io_problem_);
+  }
+  if (reason.empty()) reason = "the index library gives no reason";
+  throw IndexError(path_, std::string(purpose) + ": " + reason);
 }
 
 void DiskDirectory::NoteFailedReading(const IndexError& error) {
@@ -132,7 +141,10 @@ void DiskDirectory::NoteFailedReading(const IndexError& error) {
 
 void DiskDirectory::NoteReadProblem(const IndexError& error) {
   const std::lock_guard lock(read_problem_mutex_);
-  read_problem_ = error.what();
+  read_problem_ = AsToldByLibrary(error);
+  // A file that is missing is the index's fault, not the system's.
+  const auto* const failure = dynamic_cast<const IndexIoError*>(&error);
+  if (failure != nullptr && failure->error_number() != ENOENT) io_problem_ = *failure;
 }
 
 Lucene::IndexOutputPtr DiskDirectory::createOutput(const Lucene::String& name) {

@@ -38,9 +38,10 @@ class DiskDirectory : public BytePathDirectory {
   // writes: it does not pass on all of them.
   const std::optional<IndexIoError>& failure() const { return failure_; }
 
-  // The newest thing that could not be opened or read, as one line; empty as long as there was none. It may
-  // be harmless, but where the library fails without a reason, this is it.
-  std::string last_read_problem() const;
+  // Throws what the failure of an operation of the library comes down to, which had that purpose ("cannot search"):
+  // IndexIoError where the system refused to open or to read something, else IndexError about the folder, with
+  // `reason`, what the library says. Where it says nothing, with the newest thing that could not be read.
+  [[noreturn]] void ThrowFailure(const char* purpose, std::string reason) const;
 
   // Whether something has failed that read through this directory. The library keeps for good what it has half read,
   // and crashes when it closes a reader that has failed on norms: so its readers are then not to be used again, and
@@ -69,7 +70,8 @@ class DiskDirectory : public BytePathDirectory {
   std::set<std::string> uncommitted_;  // names created since the last commit
   std::optional<IndexIoError> failure_;
   mutable std::mutex read_problem_mutex_;
-  std::string read_problem_;
+  std::string read_problem_;                // the newest, as the library tells it
+  std::optional<IndexIoError> io_problem_;  // the newest that is the system's
   std::atomic<bool> has_failed_reading_ = false;
 };
 

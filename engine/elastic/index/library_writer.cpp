@@ -112,8 +112,7 @@ void LibraryWriter::Run(const char* purpose, const std::function<void()>& operat
     writer_.reset();
   }
   if (directory_ && directory_->failure().has_value()) throw IndexIoError(*directory_->failure());
-  if (reason.empty() && directory_) reason = directory_->last_read_problem();
-  if (reason.empty()) reason = "the index library gives no reason";
+  if (directory_) directory_->ThrowFailure(purpose, reason);
   throw IndexError(folder_, std::string(purpose) + ": " + reason);
 }
 

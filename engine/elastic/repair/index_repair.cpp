@@ -19,9 +19,9 @@
 #include "elastic/format/commit.h"
 #include "elastic/format/folder.h"
 #include "elastic/index/manifest_keeper.h"
+#include "elastic/index/run_reading.h"
 #include "elastic/repair/checked_directory.h"
 #include "elastic/repair/checker_trial.h"
-#include "elastic/search/library_failure.h"
 #include "vantrel/elastic/index_error.h"
 #include "vantrel/elastic/index_health.h"
 #include "vantrel/elastic/library_setup.h"
@@ -109,7 +109,7 @@ class Checker {
       condemned_.insert(unsafe.survived.extract(unsafe.survived.begin()));
       directory_ = Lucene::newLucene<CheckedDirectory>(path_, condemned_);
     }
-    RunReading(path_, directory_, "cannot check the index", check);
+    RunReading(directory_, "cannot check the index", check);
     // Without a list of segments there is nothing that the library could go on from; it would crash.
     if (!status_->clean && !status_->newSegments) {
       throw IndexError(path_, "the index library cannot read the commit; nothing was changed");
@@ -136,7 +136,7 @@ class Checker {
   }
 
   void Fix() {
-    RunReading(path_, directory_, "cannot repair the index", [&] { checker_->fixIndex(status_); });
+    RunReading(directory_, "cannot repair the index", [&] { checker_->fixIndex(status_); });
     if (directory_->failure().has_value()) throw IndexIoError(*directory_->failure());
   }
 

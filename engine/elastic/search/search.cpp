@@ -9,10 +9,10 @@
 #include <utility>
 
 #include "elastic/format/quoted.h"
+#include "elastic/index/run_reading.h"
 #include "elastic/search/common_searcher.h"
 #include "elastic/search/field_filter.h"
 #include "elastic/search/hit_collector.h"
-#include "elastic/search/library_failure.h"
 #include "elastic/search/query_builder.h"
 #include "elastic/search/search_run.h"
 #include "elastic/search/stored_fields.h"
@@ -125,7 +125,7 @@ class SearchRun {
 
   static void Read(const SearchedIndex& index, const char* purpose, const std::function<void()>& operation) {
     const auto& directory = index.snapshot->directory();
-    RunReading(index.path, directory, purpose, [&] {
+    RunReading(directory, purpose, [&] {
       try {
         operation();
       } catch (const Lucene::TimeExceededException&) {

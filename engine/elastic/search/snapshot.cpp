@@ -4,7 +4,7 @@
 #include <ctime>
 #include <utility>
 
-#include "elastic/search/library_failure.h"
+#include "elastic/index/run_reading.h"
 #include "vantrel/elastic/index_error.h"
 
 namespace vantrel::elastic {
@@ -61,7 +61,7 @@ void SnapshotKeeper::Open(int64_t generation) {
   const auto before = generation > generation_ ? snapshot_ : nullptr;
   const auto directory =
       before == nullptr ? Lucene::newLucene<DiskDirectory>(folder_, guard_) : before->directory();
-  RunReading(folder_, directory, "cannot open the index for searching", [&] {
+  RunReading(directory, "cannot open the index for searching", [&] {
     const Lucene::IndexReaderPtr reader =
         before == nullptr ? Lucene::IndexReader::open(directory, true) : before->reader()->reopen(true);
     if (before == nullptr || reader != before->reader()) {

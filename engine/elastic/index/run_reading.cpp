@@ -1,14 +1,15 @@
-#include "elastic/search/library_failure.h"
+#include "elastic/index/run_reading.h"
 
 #include <new>
+#include <string>
 
 #include "vantrel/elastic/index_error.h"
 #include "vantrel/elastic/search_error.h"
 
 namespace vantrel::elastic {
 
-void RunReading(const std::string& folder, const boost::shared_ptr<DiskDirectory>& directory,
-                const char* purpose, const std::function<void()>& operation) {
+void RunReading(const boost::shared_ptr<DiskDirectory>& directory, const char* purpose,
+                const std::function<void()>& operation) {
   std::string reason;
   try {
     return operation();
@@ -23,9 +24,7 @@ void RunReading(const std::string& folder, const boost::shared_ptr<DiskDirectory
   } catch (const std::exception& error) {
     reason = error.what();
   }
-  if (reason.empty()) reason = directory->last_read_problem();
-  if (reason.empty()) reason = "the index library gives no reason";
-  throw IndexError(folder, std::string(purpose) + ": " + reason);
+  directory->ThrowFailure(purpose, reason);
 }
 
 }  // namespace vantrel::elastic
