@@ -12,7 +12,7 @@
 #include <optional>
 
 #include "damage/damage.h"
-#include "damage/run_tool.h"
+#include "damage/limited_run.h"
 #include "support/files.h"
 #include "support/random_index.h"
 #include "support/temporary_folder.h"
@@ -140,7 +140,7 @@ TEST_P(DamagedIndexTest, TheProgramEndsInOutputOrAnUncaughtException) {
     SCOPED_TRACE("case " + std::to_string(i) + ": " + damage.Describe());
     const DamagedFile damaged(path(), damage);
     for (const char* action : {"allterm", "term"}) {
-      const ToolRun run = RunToolLimited({"-a", action, "-i", "-d", path()});
+      const LimitedRun run = RunToolLimited({"-a", action, "-i", "-d", path()});
       SCOPED_TRACE(action);
       if (WIFEXITED(run.status)) {
         ++ended_in_output;
@@ -165,7 +165,7 @@ TEST_P(DamagedIndexTest, TheProgramsCheckEndsInAVerdict) {
     if (i % (kEvery * RunsEvery()) != 0) continue;
     SCOPED_TRACE("case " + std::to_string(i) + ": " + damage.Describe());
     const DamagedFile damaged(path(), damage);
-    const ToolRun run = RunToolLimited({"-a", "check", "-d", path()});
+    const LimitedRun run = RunToolLimited({"-a", "check", "-d", path()});
     ASSERT_TRUE(WIFEXITED(run.status)) << "signal " << WTERMSIG(run.status) << "\n" << run.errors;
     EXPECT_EQ(WEXITSTATUS(run.status), 0);
     EXPECT_EQ(run.output, "");

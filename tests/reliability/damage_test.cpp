@@ -18,7 +18,7 @@
 #include <vector>
 
 #include "damage/damage.h"
-#include "damage/run_tool.h"
+#include "damage/limited_run.h"
 #include "elastic/format/commit.h"
 #include "elastic/format/folder.h"
 #include "elastic/format/manifest.h"
@@ -120,7 +120,8 @@ class ReliabilityDamage : public ::testing::TestWithParam<HealthShape> {
     return {"-f", field, "-t", text, "-n", document, "-f", vector_field};
   }
 
-  ToolRun Run(const Action& action, const std::string& path, const std::vector<std::string>& options) const {
+  LimitedRun Run(const Action& action, const std::string& path,
+                 const std::vector<std::string>& options) const {
     const std::string word = action.word;
     std::vector<std::string> arguments = {"-a", word, "-d", path, "-i"};
     arguments.insert(arguments.end(), options.begin(), options.end());
@@ -137,7 +138,7 @@ class ReliabilityDamage : public ::testing::TestWithParam<HealthShape> {
     std::filesystem::copy(index_, copy_, Options::create_hard_links | Options::recursive);
   }
 
-  ToolRun RunOnCopy(const Action& action, const std::vector<std::string>& options) const {
+  LimitedRun RunOnCopy(const Action& action, const std::vector<std::string>& options) const {
     MakeCopy();
     return Run(action, copy_, options);
   }
@@ -160,22 +161,22 @@ class ReliabilityDamage : public ::testing::TestWithParam<HealthShape> {
     return WriteManifest(MakeManifest(folder, ReadNewestCommit(folder)));
   }
 
-  ToolRun UseCopy(const std::pair<std::string, std::string>& term) const {
+  LimitedRun UseCopy(const std::pair<std::string, std::string>& term) const {
     return RunLimited(USE_INDEX, {copy_, term.first, term.second});
   }
 
-  ToolRun RunAny(const Action& action, const std::vector<std::string>& options) const {
+  LimitedRun RunAny(const Action& action, const std::vector<std::string>& options) const {
     return action.word == std::string("repair") ? RunOnCopy(action, options) : Run(action, index_, options);
   }
 
   // What an action says of the intact index.
-  const ToolRun& Intact(const Action& action, size_t lookup) {
-    ToolRun& run = intact_[{action.word, lookup}];
+  const LimitedRun& Intact(const Action& action, size_t lookup) {
+    LimitedRun& run = intact_[{action.word, lookup}];
     if (run.output.empty() && run.errors.empty()) run = RunAny(action, lookups_[lookup]);
     return run;
   }
 
-  void Judge(const Action& action, const ToolRun& run, const ToolRun& intact) {
+  void Judge(const Action& action, const LimitedRun& run, const LimitedRun& intact) {
     ++tally_.runs;
     const std::string said = run.output + run.errors;
     EXPECT_THAT(said, Not(AnyOf(HasSubstr("bad_alloc"), HasSubstr("memory"))));
@@ -208,7 +209,7 @@ class ReliabilityDamage : public ::testing::TestWithParam<HealthShape> {
   Contents contents_;
   std::mt19937 random_;
   std::array<std::vector<std::string>, 24> lookups_;
-  std::map<std::pair<std::string, size_t>, ToolRun> intact_;
+  std::map<std::pair<std::string, size_t>, LimitedRun> intact_;
   Tally tally_;
 };
 
@@ -223,7 +224,7 @@ TEST_P(ReliabilityDamage, EveryOfflineActionEndsByItselfOrByAnUncaughtException)
     const size_t lookup = Below(lookups_.size());
     for (const Action& action : kActions) {
       if (!IsWanted(action)) continue;
-      const ToolRun& intact = Intact(action, lookup);
+      const LimitedRun& intact = Intact(action, lookup);
       const DamagedFile damaged(index_, damage);
       SCOPED_TRACE("damage " + std::to_string(i) + ", " + action.word + " " +
                    ::testing::PrintToString(lookups_[lookup]) + ": " + damage.Describe());
@@ -258,7 +259,7 @@ TEST_P(ReliabilityDamage, SearchingAndMergingEndsInAnAnswerOrAnErrorOfTheEngine)
       if (has_manifest) WriteFile(copy_ + "/quorelastic.manifest", manifest);
       SCOPED_TRACE("damage " + std::to_string(i) + (has_manifest ? ", manifest" : "") + ", " + term.first +
                    ":" + term.second + ": " + damage.Describe());
-      const ToolRun run = UseCopy(term);
+      const LimitedRun run = UseCopy(term);
       ++tally_.runs;
       EXPECT_EQ(run.status, 0) << run.output << run.errors;
       const bool reported = run.output.find("error: ") != std::string::npos;

@@ -9,7 +9,7 @@
 #include <ostream>
 #include <string>
 
-#include "damage/run_tool.h"
+#include "damage/limited_run.h"
 #include "support/byte_writer.h"
 #include "support/files.h"
 #include "support/small_index.h"
@@ -22,11 +22,11 @@ namespace {
 using ::quorelastic::testing::ByteWriter;
 using ::quorelastic::testing::CopyFolder;
 using ::quorelastic::testing::FindFile;
+using ::quorelastic::testing::LimitedRun;
 using ::quorelastic::testing::ListFolder;
 using ::quorelastic::testing::ReadFile;
 using ::quorelastic::testing::RunToolLimited;
 using ::quorelastic::testing::TemporaryFolder;
-using ::quorelastic::testing::ToolRun;
 using ::quorelastic::testing::WriteFile;
 using ::quorelastic::testing::WriteSkippingIndex;
 using ::quorelastic::testing::WriteSmallIndex;
@@ -36,7 +36,8 @@ using Grade = HealthFinding::Grade;
 void ExpectLookupsToEnd(const std::string& path) {
   const auto expect_end = [&](const std::string& action, const std::string& token,
                               const std::string& document) {
-    const ToolRun run = RunToolLimited({"-a", action, "-d", path, "-f", "body", "-t", token, "-n", document});
+    const LimitedRun run =
+        RunToolLimited({"-a", action, "-d", path, "-f", "body", "-t", token, "-n", document});
     EXPECT_TRUE(WIFEXITED(run.status) && WEXITSTATUS(run.status) == 0)
         << action << " of " << token << " from " << document << " ends in signal " << WTERMSIG(run.status)
         << "\n"

@@ -1,4 +1,4 @@
-#include "damage/run_tool.h"
+#include "damage/limited_run.h"
 
 #include <sys/mman.h>
 #include <sys/resource.h>
@@ -57,11 +57,11 @@ class Capture {
 
 int RunsEvery() { return kIsSanitized ? 10 : 1; }
 
-ToolRun RunToolLimited(const std::vector<std::string>& arguments) {
+LimitedRun RunToolLimited(const std::vector<std::string>& arguments) {
   return RunLimited(QUORELASTIC_TOOL, arguments);
 }
 
-ToolRun RunLimited(const std::string& program, const std::vector<std::string>& arguments) {
+LimitedRun RunLimited(const std::string& program, const std::vector<std::string>& arguments) {
   std::vector<std::string> copies = {program};
   copies.insert(copies.end(), arguments.begin(), arguments.end());
   std::vector<char*> pointers;
@@ -73,7 +73,7 @@ ToolRun RunLimited(const std::string& program, const std::vector<std::string>& a
   const pid_t child = fork();
   if (child < 0) throw std::system_error(errno, std::generic_category(), "fork");
   if (child == 0) BecomeProgram(std::move(pointers), output, errors);
-  ToolRun run;
+  LimitedRun run;
   while (waitpid(child, &run.status, 0) < 0) {
     if (errno != EINTR) throw std::system_error(errno, std::generic_category(), "waitpid");
   }

@@ -5,7 +5,7 @@
 
 namespace quorelastic::testing {
 
-struct ToolRun {
+struct LimitedRun {
   int status = 0;  // as of waitpid
   std::string output;
   std::string errors;
@@ -13,10 +13,10 @@ struct ToolRun {
 
 // Runs a program with at most 2 GiB of address space (not where a sanitizer needs more) and 10 seconds, after
 // which SIGALRM ends it.
-ToolRun RunLimited(const std::string& program, const std::vector<std::string>& arguments);
+LimitedRun RunLimited(const std::string& program, const std::vector<std::string>& arguments);
 
 // The same for the tool.
-ToolRun RunToolLimited(const std::vector<std::string>& arguments);
+LimitedRun RunToolLimited(const std::vector<std::string>& arguments);
 
 // A run takes many times as long with a sanitizer: only each so many-th case is run then.
 int RunsEvery();
