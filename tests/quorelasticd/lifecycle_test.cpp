@@ -1,4 +1,4 @@
-// How a daemon starts, ends, and what outlives it.
+// How a daemon starts, and what it tells the service manager and leaves behind.
 
 #include <gmock/gmock.h>
 #include <sys/socket.h>
@@ -6,41 +6,23 @@
 #include <sys/un.h>
 #include <unistd.h>
 
-#include <algorithm>
-#include <atomic>
 #include <chrono>
 #include <csignal>
 #include <cstring>
 #include <filesystem>
-#include <iterator>
-#include <memory>
-#include <set>
 #include <string>
 #include <thread>
-#include <vector>
 
-#include "quordaemon/wire.h"
-#include "served_index.h"
+#include "daemon_client.h"
+#include "daemon_process.h"
 #include "support/files.h"
+#include "support/temporary_folder.h"
 
 namespace quorelastic::testing {
 namespace {
 
 namespace fs = std::filesystem;
 using ::testing::HasSubstr;
-
-constexpr const char* kCreate =
-    R"({"command":"index_create","data":{"id":"x","settings":{"fields":[{"name":"t","type":"text"}]}}})";
-constexpr const char* kCountRequest = R"({"command":"index_list","data":{"id":"x"}})";
-
-int Count(DaemonClient& client) {
-  return client.Ask(kCountRequest)["result"]["indexes"][0]["documents"].asInt();
-}
-
-std::string AddRequest(const std::string& id, bool commit) {
-  return R"({"command":"document_bulk","data":{"id":"x","documents":[{"id":")" + id + R"("}],"commit":)" +
-         (commit ? "true" : "false") + "}}";
-}
 
 TEST(Lifecycle, ItTellsTheServiceManagerWhatItDoes) {
   const TemporaryFolder folder;
@@ -165,215 +147,6 @@ TEST(Lifecycle, TheServiceManagersSocketIsServedAndLeftThere) {
   EXPECT_EQ(daemon.Stop(), 0);
   EXPECT_TRUE(fs::exists(path));
   close(listener);
-}
-
-TEST(Lifecycle, CommittedDocumentsOutliveARestartAndAKill) {
-  const TemporaryFolder folder;
-  {
-    DaemonProcess daemon(folder.path());
-    DaemonClient client(daemon.socket());
-    ASSERT_EQ(client.AskForError(kCreate), "");
-    ASSERT_EQ(client.AskForError(AddRequest("1", true)), "");
-    EXPECT_EQ(daemon.Stop(), 0);
-  }
-  {
-    DaemonProcess daemon(folder.path());
-    DaemonClient client(daemon.socket());
-    EXPECT_EQ(Count(client), 1);
-    ASSERT_EQ(client.AskForError(AddRequest("2", true)), "");
-    ASSERT_EQ(client.AskForError(AddRequest("lost", false)), "");
-    daemon.Signal(SIGKILL);
-    daemon.Wait();
-  }
-  DaemonProcess daemon(folder.path());
-  DaemonClient client(daemon.socket());
-  EXPECT_EQ(Count(client), 2);
-}
-
-TEST(Lifecycle, WhatWasNotCommittedIsCommittedAtTheEnd) {
-  const TemporaryFolder folder;
-  {
-    DaemonProcess daemon(folder.path());
-    DaemonClient client(daemon.socket());
-    ASSERT_EQ(client.AskForError(kCreate), "");
-    ASSERT_EQ(client.AskForError(AddRequest("1", false)), "");
-    EXPECT_EQ(daemon.Stop(), 0);
-  }
-  DaemonProcess daemon(folder.path());
-  DaemonClient client(daemon.socket());
-  EXPECT_EQ(Count(client), 1);
-}
-
-TEST(Lifecycle, ARequestThatComesTooLateIsRefused) {
-  const TemporaryFolder folder;
-  DaemonProcess daemon(folder.path());
-  DaemonClient client(daemon.socket());
-  const std::string request = R"({"command":"status"})";
-  const auto header = quordaemon::EncodeHeader(static_cast<uint32_t>(request.size()));
-  const std::string bytes = std::string(header.begin(), header.end()) + request;
-  ASSERT_EQ(send(client.descriptor(), bytes.data(), 10, MSG_NOSIGNAL), 10);
-  // Once another client that came later is served, ours has been accepted too.
-  ASSERT_EQ(DaemonClient(daemon.socket()).AskForError(request), "");
-  daemon.Signal(SIGTERM);
-  while (daemon.Notifications().size() < 2) std::this_thread::sleep_for(std::chrono::milliseconds(5));
-  std::this_thread::sleep_for(std::chrono::milliseconds(50));
-  ASSERT_EQ(send(client.descriptor(), bytes.data() + 10, bytes.size() - 10, MSG_NOSIGNAL),
-            static_cast<ssize_t>(bytes.size()) - 10);
-  EXPECT_EQ(client.Receive()["error"]["code"].asString(), "shutting_down");
-  EXPECT_TRUE(client.IsHungUp());
-  EXPECT_EQ(daemon.Wait(), 0);
-}
-
-TEST(Lifecycle, RequestsThatWaitForTheirTurnAreRefusedOnceTheStreamBeforeThemIsDone) {
-  const TemporaryFolder folder;
-  DaemonProcess daemon(folder.path());
-  DaemonClient client(daemon.socket());
-  ASSERT_EQ(client.AskForError(kCreate), "");
-  ASSERT_EQ(client.AskForError(R"({"command":"document_bulk","data":{"id":"x","documents":[{"id":"1","t":")" +
-                               ManyWords(50000) + "\"}]}}"),
-            "");
-  ASSERT_TRUE(client.Send(R"({"command":"terms","data":{"id":"x","max":1000000}})"));
-  ASSERT_TRUE(client.Send(R"({"command":"status"})"));
-  client.Receive();
-  daemon.Signal(SIGTERM);
-  while (daemon.Notifications().size() < 2) std::this_thread::sleep_for(std::chrono::milliseconds(5));
-  JsonValue reply;
-  do {
-    reply = client.Receive();
-  } while (!reply.isMember("success"));
-  EXPECT_TRUE(reply["success"].asBool());
-  EXPECT_EQ(client.Receive()["error"]["code"].asString(), "shutting_down");
-  EXPECT_TRUE(client.IsHungUp());
-  EXPECT_EQ(daemon.Wait(), 0);
-}
-
-TEST(Lifecycle, AStreamUnderWayIsFinishedFirst) {
-  const TemporaryFolder folder;
-  DaemonProcess daemon(folder.path());
-  DaemonClient client(daemon.socket());
-  ASSERT_EQ(client.AskForError(kCreate), "");
-  const std::string words = ManyWords(50000);
-  ASSERT_EQ(client.AskForError(R"({"command":"document_bulk","data":{"id":"x","documents":[{"id":"1","t":")" +
-                               words + "\"}]}}"),
-            "");
-  ASSERT_TRUE(client.Send(R"({"command":"terms","data":{"id":"x","max":1000000}})"));
-  client.Receive();
-  daemon.Signal(SIGTERM);
-  JsonValue reply;
-  do {
-    reply = client.Receive();
-  } while (!reply.isMember("success"));
-  EXPECT_EQ(reply["result"]["count"].asInt(), 50001);
-  EXPECT_TRUE(client.IsHungUp());
-  EXPECT_EQ(daemon.Wait(), 0);
-}
-
-TEST(Lifecycle, AClientThatNeverReadsIsCutOffAtTheEnd) {
-  const TemporaryFolder folder;
-  DaemonProcess daemon(folder.path(), {"--shutdown-timeout", "1"});
-  DaemonClient client(daemon.socket());
-  ASSERT_EQ(client.AskForError(kCreate), "");
-  const std::string words = ManyWords(50000);
-  ASSERT_EQ(client.AskForError(R"({"command":"document_bulk","data":{"id":"x","documents":[{"id":"1","t":")" +
-                               words + "\"}]}}"),
-            "");
-  ASSERT_TRUE(client.Send(R"({"command":"terms","data":{"id":"x","max":1000000}})"));
-  client.Receive();
-  EXPECT_EQ(daemon.Stop(), 0);
-}
-
-// Clients add documents, one a commit, until the daemon goes; whatever was acknowledged must be there afterwards.
-void EndUnderLoad(int signal, int expected_status) {
-  const TemporaryFolder folder;
-  std::vector<std::set<std::string>> acknowledged(8);
-  {
-    DaemonProcess daemon(folder.path());
-    ASSERT_EQ(DaemonClient(daemon.socket()).AskForError(kCreate), "");
-    std::atomic<int> commits{0};
-    std::vector<std::thread> threads;
-    for (size_t c = 0; c < acknowledged.size(); ++c) {
-      threads.emplace_back([&, c] {
-        try {
-          DaemonClient client(daemon.socket());
-          for (int i = 0;; ++i) {
-            const std::string id = std::to_string(c) + "-" + std::to_string(i);
-            const JsonValue reply = client.Ask(AddRequest(id, true));
-            if (!reply["success"].asBool()) break;
-            acknowledged[c].insert(id);
-            ++commits;
-          }
-        } catch (const std::runtime_error&) {
-          // the daemon hung up
-        }
-      });
-    }
-    while (commits < 40) std::this_thread::sleep_for(std::chrono::milliseconds(1));
-    daemon.Signal(signal);
-    EXPECT_EQ(daemon.Wait(), expected_status);
-    for (std::thread& thread : threads) thread.join();
-  }
-  DaemonProcess daemon(folder.path());
-  ASSERT_TRUE(daemon.is_ready()) << daemon.Log();
-  DaemonClient client(daemon.socket());
-  std::set<std::string> found;
-  for (const JsonValue& reply :
-       client.Exchange(R"({"command":"terms","data":{"id":"x","field":"id","live":true,"max":1000000}})")) {
-    for (const Json::Value& term : reply["progress"]["terms"]) found.insert(term["text"].asString());
-  }
-  for (const auto& ids : acknowledged) {
-    for (const std::string& id : ids) EXPECT_TRUE(found.contains(id)) << id;
-  }
-}
-
-TEST(Lifecycle, NothingAcknowledgedIsLostInAShutdownUnderLoad) { EndUnderLoad(SIGTERM, 0); }
-
-TEST(Lifecycle, NothingAcknowledgedIsLostInAKillUnderLoad) { EndUnderLoad(SIGKILL, -SIGKILL); }
-
-size_t CountDescriptors(pid_t pid) {
-  const fs::directory_iterator entries("/proc/" + std::to_string(pid) + "/fd");
-  return static_cast<size_t>(std::distance(fs::begin(entries), fs::end(entries)));
-}
-
-TEST(Lifecycle, MoreIndexesThanMayBeOpenAreAllServedWithFewDescriptors) {
-  const TemporaryFolder folder;
-  DaemonProcess daemon(folder.path(), {"--max-open-indexes", "5"});
-  constexpr int kIndexes = 60;
-  const auto name = [](int i) { return "\"x" + std::to_string(i) + "\""; };
-  const auto search = [&](DaemonClient& client, int i) {
-    return client.Ask(R"({"command":"search","data":{"indice":[)" + name(i) +
-                      R"(],"query_string":{"query":"word"}}})")["result"]["total"];
-  };
-  size_t most = 0;
-  DaemonClient client(daemon.socket());
-  for (int i = 0; i < kIndexes; ++i) {
-    ASSERT_EQ(client.AskForError(R"({"command":"index_create","data":{"id":)" + name(i) +
-                                 R"(,"settings":{"fields":[{"name":"t","type":"text"}]}}})"),
-              "");
-    // Every other one is left with a change that is not committed.
-    ASSERT_EQ(client.AskForError(R"({"command":"document_bulk","data":{"id":)" + name(i) +
-                                 R"(,"documents":[{"id":"1","t":"word"}]}})"),
-              "");
-    ASSERT_EQ(client.AskForError(R"({"command":"document_bulk","data":{"id":)" + name(i) +
-                                 R"(,"documents":[{"id":"2","t":"word"}],"commit":)" +
-                                 (i % 2 == 0 ? "true" : "false") + "}}"),
-              "");
-    EXPECT_GE(search(client, i), i % 2 == 0 ? 2 : 1);
-    most = std::max(most, CountDescriptors(daemon.pid()));
-  }
-  for (int i = 0; i < kIndexes; ++i) EXPECT_GE(search(client, i), i % 2 == 0 ? 2 : 1) << i;
-  most = std::max(most, CountDescriptors(daemon.pid()));
-  EXPECT_LT(most, 200U);
-  // What has changes is committed in the background, and closed when the next index is opened.
-  const auto give_up = std::chrono::steady_clock::now() + std::chrono::seconds(60);
-  int opened = 0;
-  while (client.Ask(R"({"command":"status"})")["result"]["open_indexes"].asInt() > 5) {
-    ASSERT_LT(std::chrono::steady_clock::now(), give_up);
-    search(client, opened++ % kIndexes);
-  }
-  ASSERT_EQ(daemon.Stop(), 0);
-  DaemonProcess again(folder.path());
-  DaemonClient other(again.socket());
-  for (int i = 0; i < kIndexes; ++i) EXPECT_EQ(search(other, i), 2) << i;
 }
 
 }  // namespace
