@@ -27,8 +27,8 @@ struct Searching {
   // Searches that are few run on the threads of their connections, which spares them two changes of thread. These
   // are fewer turns than such threads: one is always left for everybody else.
   Turns& quick_turns;
-  boost::asio::any_io_executor
-      executor;  // for the others; apart from writers, so that no merge delays a search
+  // For the others; apart from writers, so that no merge delays a search.
+  boost::asio::any_io_executor executor;
   std::chrono::milliseconds time_limit;
 };
 

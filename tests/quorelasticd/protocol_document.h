@@ -17,8 +17,8 @@ struct ProtocolDocument {
   // A heading with what stands below it, up to the next heading of any level.
   struct Section {
     std::vector<std::string> paragraph;  // its first paragraph, line by line
-    std::vector<std::vector<std::string>>
-        table;  // the rows of its first table, cell by cell, without its head
+    // The rows of its first table, cell by cell, without its head.
+    std::vector<std::vector<std::string>> table;
   };
 
   std::string text;

@@ -75,8 +75,8 @@ class DigestCheckedFolder : public format::Folder {
   const format::Folder& folder_;
   const format::Manifest& manifest_;
   mutable std::mutex mutex_;
-  mutable std::map<std::string, std::shared_ptr<FileDigestCheck>>
-      checks_;  // by name; empty where it was taken
+  // By name; empty where it was taken.
+  mutable std::map<std::string, std::shared_ptr<FileDigestCheck>> checks_;
 };
 
 }  // namespace vantrel::elastic::health

@@ -72,8 +72,8 @@ class PrefixWalk {
   bool at_end_ = true;   // of it
   uint64_t number_ = 0;  // of the term that comes next
   Fingerprint entries_;  // that were found again
-  std::optional<LiveTermFilter>
-      live_filter_;  // made when it is first asked: it reads the whole deletions file
+  // Made when it is first asked: it reads the whole deletions file.
+  std::optional<LiveTermFilter> live_filter_;
 };
 
 }  // namespace vantrel::elastic

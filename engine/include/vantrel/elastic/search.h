@@ -79,8 +79,8 @@ struct SearchResult {
   double max_score = 0;         // of all of them; 0 where there is none
   std::string query;            // as it was understood by the first of the indexes
   std::vector<SearchHit> hits;  // the window [from, from + size) of what was found, best first
-  std::vector<std::string>
-      warnings;  // what may not be as meant, one line each, such as a field that is not there
+  // What may not be as meant, one line each, such as a field that is not there.
+  std::vector<std::string> warnings;
 };
 
 // Searches several indexes, none of them null, as if they were one: what a word weighs is counted over all of
