@@ -2,7 +2,9 @@
 
 #include <chrono>
 #include <cstdint>
+#include <optional>
 
+#include "elastic/deadline_after.h"
 #include "vantrel/elastic/search_error.h"
 
 namespace vantrel::elastic {
@@ -11,20 +13,18 @@ namespace vantrel::elastic {
 class Deadline {
  public:
   // Counted from now; 0 is never.
-  explicit Deadline(std::chrono::milliseconds time_limit)
-      : is_set_(time_limit.count() > 0), end_(std::chrono::steady_clock::now() + time_limit) {}
+  explicit Deadline(std::chrono::milliseconds time_limit) : end_(DeadlineAfter(time_limit)) {}
 
   // To be called for each small step. Throws SearchTimeoutError.
   void Check() {
     constexpr uint32_t kEvery = 1024;
-    if (is_set_ && ++checks_ % kEvery == 0 && std::chrono::steady_clock::now() > end_) {
+    if (end_.has_value() && ++checks_ % kEvery == 0 && std::chrono::steady_clock::now() > *end_) {
       throw SearchTimeoutError();
     }
   }
 
  private:
-  bool is_set_;
-  std::chrono::steady_clock::time_point end_;
+  std::optional<std::chrono::steady_clock::time_point> end_;
   uint32_t checks_ = 0;
 };
 
