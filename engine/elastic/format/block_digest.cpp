@@ -26,7 +26,7 @@ std::string DigestText(uint64_t digest) {
   return digits;
 }
 
-uint64_t DigestOfBlock(const ByteSource& file, uint64_t block, std::vector<uint8_t>& buffer) {
+uint64_t DigestOfBlock(const ByteSource& file, uint64_t block, ReadBuffer& buffer) {
   const uint64_t start = block * kDigestBlock;
   BlockDigest digest;
   ReadToDigest(file, start, std::min(start + kDigestBlock, file.size()), buffer,
@@ -36,7 +36,7 @@ uint64_t DigestOfBlock(const ByteSource& file, uint64_t block, std::vector<uint8
 
 std::vector<uint64_t> DigestBlocks(const ByteSource& file) {
   std::vector<uint64_t> digests(CountDigestBlocks(file.size()));
-  std::vector<uint8_t> buffer;
+  ReadBuffer buffer;
   for (uint64_t block = 0; block < digests.size(); ++block)
     digests[block] = DigestOfBlock(file, block, buffer);
   return digests;

@@ -44,25 +44,37 @@ class BlockDigest {
 inline constexpr size_t kDigestDigits = 16;
 std::string DigestText(uint64_t digest);
 
+// Bytes to read into, kept from one range to the next and grown where need be.
+class ReadBuffer {
+ public:
+  std::span<uint8_t> Take(size_t length) {
+    if (size_ < length) {
+      bytes_ = std::make_unique_for_overwrite<uint8_t[]>(length);
+      size_ = length;
+    }
+    return {bytes_.get(), length};
+  }
+
+ private:
+  std::unique_ptr<uint8_t[]> bytes_;
+  size_t size_ = 0;
+};
+
 // Reads a range of a file in pieces that stay in the processor's cache until they are digested: calls
-// take(offset, piece) for each, in order. `buffer` is grown where need be, and kept for the next range. Throws what
-// reading throws.
+// take(offset, piece) for each, in order. Throws what reading throws.
 template <typename Take>
-void ReadToDigest(const ByteSource& file, uint64_t from, uint64_t to, std::vector<uint8_t>& buffer,
-                  Take take) {
+void ReadToDigest(const ByteSource& file, uint64_t from, uint64_t to, ReadBuffer& buffer, Take take) {
   constexpr uint64_t kPiece = uint64_t{256} << 10;
   while (from < to) {
-    const uint64_t length = std::min(kPiece, to - from);
-    if (buffer.size() < length) buffer.resize(length);
-    const std::span<uint8_t> piece(buffer.data(), length);
+    const std::span<uint8_t> piece = buffer.Take(std::min(kPiece, to - from));
     file.ReadAt(from, piece);
     take(from, std::span<const uint8_t>(piece));
     from += piece.size();
   }
 }
 
-// The digest of a block of a file, by its number, with a buffer as above. Throws what reading throws.
-uint64_t DigestOfBlock(const ByteSource& file, uint64_t block, std::vector<uint8_t>& buffer);
+// The digest of a block of a file, by its number. Throws what reading throws.
+uint64_t DigestOfBlock(const ByteSource& file, uint64_t block, ReadBuffer& buffer);
 
 // The digests of a whole file. Throws what reading throws.
 std::vector<uint64_t> DigestBlocks(const ByteSource& file);

@@ -43,6 +43,10 @@ bool IsSegmentName(std::string_view name) {
   return name.size() <= kMostDigits + 1 && name.starts_with('_') && IsBase36(name.substr(1));
 }
 
+std::string_view SegmentOfFile(std::string_view name) {
+  return name.starts_with('_') ? name.substr(0, name.find_first_of("._", 1)) : std::string_view();
+}
+
 std::string DeletionsFileName(const std::string& segment, int64_t generation) {
   return generation == 0 ? segment + ".del" : segment + "_" + ToBase36(generation) + ".del";
 }

@@ -27,6 +27,9 @@ std::string CommitFileName(int64_t generation);
 // "_" and a number in base 36: what may stand for a segment in a path without leaving the folder.
 bool IsSegmentName(std::string_view name);
 
+// Which segment a file belongs to, by its name; empty for others.
+std::string_view SegmentOfFile(std::string_view name);
+
 // Generation 0 names the file without a generation.
 std::string DeletionsFileName(const std::string& segment, int64_t generation);
 

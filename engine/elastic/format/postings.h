@@ -50,7 +50,8 @@ class PostingsReader {
     return true;
   }
 
-  // Moves past that many documents at once, as Next() would, of those that are left; at most kLongestBlock.
+  // Moves past that many documents at once, as Next() would, of those that are left; at most kLongestBlock. Then
+  // frequency() tells nothing.
   void PassBlock(int32_t count);
   static constexpr int32_t kLongestBlock = 128;
 
@@ -64,8 +65,7 @@ class PostingsReader {
   int32_t document() const { return document_; }
   uint32_t frequency() const { return frequency_; }
 
-  // Where the document at the cursor begins, and where the next one does, or what follows the last one.
-  uint64_t start() const { return start_; }
+  // Where the next document begins, or what follows the last one.
   uint64_t offset() const { return reader_.offset(); }
   uint64_t size() const { return reader_.size(); }
   const std::string& name() const { return reader_.name(); }

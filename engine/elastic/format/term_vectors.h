@@ -85,7 +85,6 @@ class TermVectorsReader {
   void ReadUtf8Text(uint64_t start);
   void ReadUtf16Text(uint64_t start);
   void PassPlaces(uint32_t frequency);
-  int32_t CheckHeader(ByteReader& reader) const;
 
   ByteReader index_;
   ByteReader documents_;

@@ -29,7 +29,11 @@ bool IsNumbered(std::string_view extension, char letter) {
 }  // namespace
 
 bool IsMissingError(const IndexIoError& error) {
-  constexpr std::array kErrors = {ENOENT, EACCES, EPERM, EISDIR, ENOTDIR, ELOOP, ENAMETOOLONG};
+  return error.error_number() == EACCES || error.error_number() == EPERM || IsAbsenceError(error);
+}
+
+bool IsAbsenceError(const IndexIoError& error) {
+  constexpr std::array kErrors = {ENOENT, EISDIR, ENOTDIR, ELOOP, ENAMETOOLONG};
   return std::find(kErrors.begin(), kErrors.end(), error.error_number()) != kErrors.end();
 }
 
@@ -43,7 +47,6 @@ WholeSegment::Slot WholeSegment::OpenPlain(const Folder& folder, const std::stri
   try {
     auto source = folder.Open(name);
     ++open_files_;
-    total_size_ += source->size();
     return {std::move(source), nullptr};
   } catch (const IndexIoError& error) {
     if (!IsMissingError(error)) throw;

@@ -25,6 +25,9 @@ class FileMissingError : public IndexError {
 // says nothing about it.
 bool IsMissingError(const IndexIoError& error);
 
+// Whether a failed opening means that there is no such file: none of that name, or something else in its place.
+bool IsAbsenceError(const IndexIoError& error);
+
 // Throws a failed opening on: as FileMissingError where the index can be blamed for it, else as it is.
 [[noreturn]] void RethrowOpening(const IndexError& error);
 
@@ -66,7 +69,6 @@ class WholeSegment {
 
   // How many files it holds open.
   size_t open_files() const { return open_files_; }
-  uint64_t total_size() const { return total_size_; }
 
  private:
   // A file or why it is not there.
@@ -92,7 +94,6 @@ class WholeSegment {
   std::optional<CompoundSlot> store_;
   bool has_deletions_ = false;
   size_t open_files_ = 0;
-  uint64_t total_size_ = 0;
   std::string folder_path_;
 };
 

@@ -86,7 +86,7 @@ void FileDigestCheck::Return(uint64_t block, uint64_t to, DigestPtr digest) {
 void FileDigestCheck::Finish() {
   const std::string& file = source_->name();
   RequireEqual(Grade::kDamaged, file, 0, "the size in the manifest,", expected_.size, source_->size());
-  std::vector<uint8_t> buffer;
+  format::ReadBuffer buffer;
   for (uint64_t block = 0; block < done_.size(); ++block) {
     const uint64_t start = block * kDigestBlock;
     format::ReadToDigest(*source_, start + done_[block], start + LengthOf(block), buffer,

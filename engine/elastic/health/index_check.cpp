@@ -1,6 +1,7 @@
 #include "elastic/health/index_check.h"
 
 #include <algorithm>
+#include <cerrno>
 #include <memory>
 #include <mutex>
 #include <optional>
@@ -93,11 +94,6 @@ unsigned ThreadsFor(const HealthOptions& options) {
   return options.threads > 0 ? options.threads : std::max(1U, std::thread::hardware_concurrency());
 }
 
-// Which segment a file belongs to, by its name; empty for others.
-std::string SegmentOf(const std::string& name) {
-  return name.starts_with('_') ? name.substr(0, name.find_first_of("._", 1)) : "";
-}
-
 // Checks a commit, some of its segments after the other.
 class CommitRun {
  public:
@@ -177,8 +173,9 @@ class CommitRun {
   void FinishDigests() {
     std::vector<std::function<void()>> tasks;
     for (const auto& check : folder_.TakeOpened()) {
-      tasks.emplace_back(
-          [this, check] { findings_.Run(SegmentOf(check->name()), [&] { check->Finish(); }); });
+      tasks.emplace_back([this, check] {
+        findings_.Run(std::string(format::SegmentOfFile(check->name())), [&] { check->Finish(); });
+      });
     }
     RunParallel(tasks, threads_);
   }
@@ -186,7 +183,7 @@ class CommitRun {
   // What the manifest names, and no segment may have opened: the commit's own file, and what is missing.
   void OpenTheRest() {
     for (const format::Manifest::File& file : manifest_.files) {
-      findings_.Run(SegmentOf(file.name), [&] {
+      findings_.Run(std::string(format::SegmentOfFile(file.name)), [&] {
         try {
           folder_.Open(file.name);
         } catch (const IndexError& error) {
@@ -237,7 +234,8 @@ HealthReport CheckFolder(const format::Folder& folder, const HealthOptions& opti
     if (run.findings().file_is_missing()) finding_it.Run("", [&] { newest = FindCommit(metered); });
     const bool is_overtaken = newest.generation > commit.generation;
     if (!is_overtaken) return report;
-    if (left == 0) throw IndexError(folder.path(), "the index changes faster than it can be checked");
+    if (left == 0)
+      throw IndexIoError(folder.path(), "the index changes faster than it can be checked", EBUSY);
   }
 }
 

@@ -2,7 +2,6 @@
 
 #include <algorithm>
 #include <utility>
-#include <vector>
 
 #include "elastic/format/block_digest.h"
 #include "vantrel/elastic/index_error.h"
@@ -13,7 +12,7 @@ namespace {
 using format::kDigestBlock;
 
 void VerifyBlock(const format::ByteSource& file, const format::Manifest::File& expected, uint64_t block) {
-  std::vector<uint8_t> buffer;
+  format::ReadBuffer buffer;
   const uint64_t digest = format::DigestOfBlock(file, block, buffer);
   if (digest == expected.digests[block]) return;
   throw IndexDamagedError(file.name(), block * kDigestBlock,

@@ -5,6 +5,8 @@
 #include <string_view>
 #include <utility>
 
+#include "elastic/format/file_names.h"
+
 namespace vantrel::elastic {
 namespace {
 
@@ -12,12 +14,11 @@ constexpr std::array<std::string_view, 6> kSharedExtensions = {"cfx", "fdt", "fd
 
 // The segment that a file belongs to alone; empty where there is none.
 std::string_view OwnSegment(std::string_view name) {
-  if (!name.starts_with('_')) return {};
   const std::string_view extension = name.substr(std::min(name.find('.'), name.size() - 1) + 1);
   if (std::find(kSharedExtensions.begin(), kSharedExtensions.end(), extension) != kSharedExtensions.end()) {
     return {};
   }
-  return name.substr(0, name.find_first_of("._", 1));
+  return format::SegmentOfFile(name);
 }
 
 }  // namespace

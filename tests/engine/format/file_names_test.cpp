@@ -48,6 +48,15 @@ TEST(FileNamesTest, ASegmentsNameHasNoMoreDigitsThanA64BitNumber) {
   EXPECT_FALSE(IsSegmentName("_00000000000000"));
 }
 
+TEST(FileNamesTest, TellsTheSegmentOfAFile) {
+  for (const char* name : {"_1a.cfs", "_1a.tis", "_1a_2.del", "_1a_z.s3", "_1a.f12", "_1a"}) {
+    EXPECT_EQ(SegmentOfFile(name), "_1a") << name;
+  }
+  for (const char* name : {"", "segments_1", "segments.gen", "quorelastic.manifest", ".nfs_1"}) {
+    EXPECT_EQ(SegmentOfFile(name), "") << name;
+  }
+}
+
 TEST(FileNamesTest, NamesTheDeletionsOfASegment) {
   EXPECT_EQ(DeletionsFileName("_a", 0), "_a.del");
   EXPECT_EQ(DeletionsFileName("_a", 1), "_a_1.del");
