@@ -15,6 +15,7 @@
 #include "elastic/format/file_descriptor.h"
 #include "elastic/format/file_names.h"
 #include "elastic/format/folder.h"
+#include "elastic/format/whole_segment.h"
 #include "elastic/index/durable_file.h"
 
 namespace vantrel::elastic {
@@ -125,8 +126,8 @@ void DiskDirectory::Fail(const IndexIoError& error) {
 void DiskDirectory::ThrowFailure(const char* purpose, std::string reason) const {
   const std::lock_guard lock(read_problem_mutex_);
   if (reason.empty()) reason = read_problem_;
-  if (io_problem_.has_value() && reason.find(AsToldByLibrary(*io_problem_)) != std::string::npos) {
-    throw IndexIoError(*io_problem_);
+  for (const IndexIoError& problem : io_problems_) {
+    if (reason.find(AsToldByLibrary(problem)) != std::string::npos) throw IndexIoError(problem);
   }
   if (reason.empty()) reason = "the index library gives no reason";
   throw IndexError(path_, std::string(purpose) + ": " + reason);
@@ -139,12 +140,20 @@ void DiskDirectory::NoteFailedReading(const IndexError& error) {
   if (!harmless) NoteFailedReading();
 }
 
+std::optional<IndexIoError> DiskDirectory::io_problem() const {
+  const std::lock_guard lock(read_problem_mutex_);
+  if (io_problems_.empty()) return std::nullopt;
+  return io_problems_.back();
+}
+
 void DiskDirectory::NoteReadProblem(const IndexError& error) {
   const std::lock_guard lock(read_problem_mutex_);
   read_problem_ = AsToldByLibrary(error);
-  // A file that is missing is the index's fault, not the system's.
-  const auto* const failure = dynamic_cast<const IndexIoError*>(&error);
-  if (failure != nullptr && failure->error_number() != ENOENT) io_problem_ = *failure;
+  const auto* const problem = dynamic_cast<const IndexIoError*>(&error);
+  if (problem == nullptr || format::IsAbsenceError(*problem)) return;
+  constexpr size_t kKept = 16;
+  if (io_problems_.size() == kKept) io_problems_.pop_front();
+  io_problems_.push_back(*problem);
 }
 
 Lucene::IndexOutputPtr DiskDirectory::createOutput(const Lucene::String& name) {

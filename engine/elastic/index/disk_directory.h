@@ -1,6 +1,7 @@
 #pragma once
 
 #include <atomic>
+#include <deque>
 #include <memory>
 #include <mutex>
 #include <optional>
@@ -43,6 +44,10 @@ class DiskDirectory : public BytePathDirectory {
   // `reason`, what the library says. Where it says nothing, with the newest thing that could not be read.
   [[noreturn]] void ThrowFailure(const char* purpose, std::string reason) const;
 
+  // The newest refusal of the system to open or to read a file; nothing as long as there was none. Whoever asked the
+  // library whether the index is whole has then not learned it.
+  std::optional<IndexIoError> io_problem() const;
+
   // Whether something has failed that read through this directory. The library keeps for good what it has half read,
   // and crashes when it closes a reader that has failed on norms: so its readers are then not to be used again, and
   // not to be closed, but dropped.
@@ -70,8 +75,8 @@ class DiskDirectory : public BytePathDirectory {
   std::set<std::string> uncommitted_;  // names created since the last commit
   std::optional<IndexIoError> failure_;
   mutable std::mutex read_problem_mutex_;
-  std::string read_problem_;                // the newest, as the library tells it
-  std::optional<IndexIoError> io_problem_;  // the newest that is the system's
+  std::string read_problem_;              // the newest, as the library tells it
+  std::deque<IndexIoError> io_problems_;  // the newest that are the system's: each thread may meet one
   std::atomic<bool> has_failed_reading_ = false;
 };
 

@@ -6,6 +6,7 @@
 #include <vector>
 
 #include "elastic/format/file_names.h"
+#include "elastic/format/whole_segment.h"
 #include "elastic/health/index_check.h"
 #include "vantrel/elastic/index_error.h"
 
@@ -38,7 +39,7 @@ int64_t LibraryGuard::AdmitNewestCommit() {
   const std::lock_guard lock(admission_mutex_);
   const format::DiskFolder folder(folder_);
   std::optional<IndexDamagedError> refusal;
-  format::UseNewestCommit(folder, [&](const format::Commit& commit) {
+  const auto admit = [&](const format::Commit& commit) {
     refusal.reset();
     try {
       Admit(folder, commit);
@@ -46,7 +47,15 @@ int64_t LibraryGuard::AdmitNewestCommit() {
     } catch (const IndexDamagedError& error) {
       refusal = error;  // the commit before is no way out: it is this one that the library would open
     }
-  });
+  };
+  try {
+    format::UseNewestCommit(folder, admit);
+  } catch (const IndexIoError& error) {
+    // What the commit or its manifest names has to be there.
+    const std::string name = error.path().substr(error.path().rfind('/') + 1);
+    if (format::SegmentOfFile(name).empty() || !format::IsAbsenceError(error)) throw;
+    format::RethrowOpening(error);
+  }
   if (refusal.has_value()) throw IndexDamagedError(*refusal);
   return generation_;
 }

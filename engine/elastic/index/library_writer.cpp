@@ -106,6 +106,10 @@ void LibraryWriter::Run(const char* purpose, const std::function<void()>& operat
   } catch (const Lucene::LuceneException& error) {
     reason = StringUtils::toUTF8(error.getError());
     RollBack();
+    if (error.getType() == Lucene::LuceneException::OutOfMemory) throw std::bad_alloc();
+  } catch (const std::bad_alloc&) {
+    writer_.reset();
+    throw;
   } catch (const std::exception& error) {
     // The library tidies up after its own exceptions only: a roll-back might now wait for ever.
     reason = error.what();

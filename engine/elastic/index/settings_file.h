@@ -13,8 +13,8 @@ namespace vantrel::elastic {
 //                "frequencies": false, "pre_processors": [{"name": "ngram", "argument": "2"}, ...]}, ...]}
 //
 // type: "text", "keyword". term_vector: "none", "terms", "positions", "offsets", "positions_offsets". Every
-// member is there, but for "pre_processors" where there are none. A file of another version, or with a member unknown, is refused: to pass over what it asks
-// for would index documents differently from those that are there.
+// member is there, but for "pre_processors" where there are none. A file of another version, or with a member unknown,
+// is refused: to pass over what it asks for would index documents differently from those that are there.
 inline constexpr const char* kSettingsFileName = "quorelastic.json";  // no name of the index library's files
 
 // Throws IndexValueError, about the folder, where settings cannot be honoured: no field, two of one name, a

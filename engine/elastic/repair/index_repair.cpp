@@ -10,6 +10,7 @@
 #include <sys/stat.h>
 
 #include <algorithm>
+#include <cerrno>
 #include <functional>
 #include <optional>
 #include <set>
@@ -110,6 +111,9 @@ class Checker {
       directory_ = Lucene::newLucene<CheckedDirectory>(path_, condemned_);
     }
     RunReading(directory_, "cannot check the index", check);
+    // What the system did not let it read would be dropped for that.
+    const std::optional<IndexIoError> problem = directory_->io_problem();
+    if (!status_->clean && problem.has_value()) throw IndexIoError(*problem);
     // Without a list of segments there is nothing that the library could go on from; it would crash.
     if (!status_->clean && !status_->newSegments) {
       throw IndexError(path_, "the index library cannot read the commit; nothing was changed");
@@ -182,7 +186,7 @@ RepairReport PlanRepair(const std::string& path) {
     // A writer takes away the files of the commit before.
     if (report.is_clean || ReadNewestCommit(path).generation == report.generation) return report;
   }
-  throw IndexError(path, "the index changes faster than it can be looked at");
+  throw IndexIoError(path, "the index changes faster than it can be looked at", EBUSY);
 }
 
 }  // namespace vantrel::elastic

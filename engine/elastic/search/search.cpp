@@ -8,6 +8,7 @@
 #include <set>
 #include <utility>
 
+#include "elastic/deadline_after.h"
 #include "elastic/format/quoted.h"
 #include "elastic/index/run_reading.h"
 #include "elastic/search/common_searcher.h"
@@ -59,21 +60,19 @@ Lucene::FilterPtr MakeFilter(const SearchRequest& request, const SearchPluginReg
   return made.empty() ? Lucene::FilterPtr() : newLucene<AllFilter>(made, time);
 }
 
-TimeCheck::Deadline DeadlineOf(const SearchRequest& request) {
-  using Clock = std::chrono::steady_clock;
-  const auto now = Clock::now();
-  if (request.time_limit.count() <= 0) return std::nullopt;
-  // A limit past the end of the clock's time is none.
-  const auto most = std::chrono::duration_cast<std::chrono::milliseconds>(Clock::time_point::max() - now);
-  if (request.time_limit >= most) return std::nullopt;
-  return now + request.time_limit;
-}
-
 // What it takes to load a document, in documents looked at.
 constexpr uint32_t kLoadWeight = 128;
 
 // Another search has failed on the same snapshot meanwhile, and left behind what is not whole.
-class SpoiledSnapshot : public std::exception {};
+class SpoiledSnapshot : public std::exception {
+ public:
+  explicit SpoiledSnapshot(boost::shared_ptr<DiskDirectory> directory) : directory_(std::move(directory)) {}
+
+  const DiskDirectory& directory() const { return *directory_; }
+
+ private:
+  boost::shared_ptr<DiskDirectory> directory_;
+};
 
 // How many more snapshots are tried then.
 constexpr int kMostSnapshots = 3;
@@ -85,7 +84,7 @@ class SearchRun {
       : indexes_(indexes),
         request_(request),
         limits_(limits),
-        time_(std::make_shared<TimeCheck>(DeadlineOf(request))),
+        time_(std::make_shared<TimeCheck>(DeadlineAfter(request.time_limit))),
         collector_(newLucene<HitCollector>(request.from + request.size, time_)) {
     for (const SearchedIndex& index : indexes_) {
       queries_.push_back(BuildQuery(request.query, index.settings, limits));
@@ -137,7 +136,7 @@ class SearchRun {
         throw;
       }
     });
-    if (directory->has_failed_reading()) throw SpoiledSnapshot();
+    if (directory->has_failed_reading()) throw SpoiledSnapshot(directory);
   }
 
   void Describe(SearchResult& result) const {
@@ -197,10 +196,8 @@ SearchResult RunSearch(const std::function<std::vector<SearchedIndex>()>& open, 
     const std::vector<SearchedIndex> indexes = open();
     try {
       return SearchRun(indexes, request, plugins, limits).Run();
-    } catch (const SpoiledSnapshot&) {
-      if (left > 0) continue;
-      throw IndexError(indexes.front().path,
-                       "cannot search: reading fails in other searches, again and again");
+    } catch (const SpoiledSnapshot& spoiled) {
+      if (left == 0) spoiled.directory().ThrowFailure("cannot search", "");
     }
   }
 }

@@ -1,6 +1,7 @@
 // What the system refuses while an index is searched or written is told as that, and not as damage. The call that reads
 // files is stood in for, so that a test can let it fail.
 
+#include <gmock/gmock.h>
 #include <gtest/gtest.h>
 #include <sys/resource.h>
 #include <sys/syscall.h>
@@ -12,23 +13,43 @@
 #include <filesystem>
 #include <iterator>
 #include <string>
+#include <thread>
+#include <vector>
 
 #include "read_back.h"
+#include "support/as_nobody.h"
 #include "support/temporary_folder.h"
 #include "vantrel/elastic/index.h"
 #include "vantrel/elastic/index_error.h"
+#include "vantrel/elastic/index_repair.h"
 #include "vantrel/elastic/search.h"
 
 namespace {
 
-// How many reads go well until one fails; none does where it is negative.
-std::atomic<int> reads_before_failure = -1;
+std::atomic<int> reads = 0;
+int first_failing = -1;  // of these; none where it is negative
+int failing = 0;         // so many
+
+// Of the reads to come, some fail, the first one being number 0.
+void FailReads(int first, int count = 1) {
+  reads = 0;
+  first_failing = first;
+  failing = count;
+}
+
+// No more reads fail. Returns whether one did.
+bool StopFailingReads() {
+  const bool has_failed = first_failing >= 0 && reads > first_failing;
+  first_failing = -1;
+  return has_failed;
+}
 
 }  // namespace
 
 extern "C" __attribute__((visibility("default"))) ssize_t pread(int descriptor, void* bytes, size_t count,
                                                                 off_t offset) {
-  if (reads_before_failure >= 0 && reads_before_failure-- == 0) {
+  const int read = reads++;
+  if (first_failing >= 0 && read >= first_failing && read < first_failing + failing) {
     errno = EIO;
     return -1;
   }
@@ -39,9 +60,11 @@ namespace vantrel::elastic {
 namespace {
 
 namespace fs = std::filesystem;
+using ::quorelastic::testing::AsNobody;
 using ::quorelastic::testing::IdAndBody;
 using ::quorelastic::testing::MakeDocument;
 using ::quorelastic::testing::TemporaryFolder;
+using ::testing::HasSubstr;
 
 // As long as it lives, this process opens no more than `more` files beside those that are open.
 class FewDescriptors {
@@ -75,7 +98,13 @@ class SystemFailureTest : public ::testing::TestWithParam<bool> {
     }
     if (!GetParam()) fs::remove(path_ + "/quorelastic.manifest");
   }
-  ~SystemFailureTest() override { reads_before_failure = -1; }
+  ~SystemFailureTest() override { StopFailingReads(); }
+
+  void SetUp() override {
+    // A repair looks at it as somebody else.
+    fs::permissions(folder_.path(), fs::perms::all);
+    fs::permissions(path_, fs::perms::all);
+  }
 
   static uint64_t CountWords(const Index& index) {
     SearchRequest request;
@@ -116,7 +145,7 @@ class SystemFailureTest : public ::testing::TestWithParam<bool> {
     for (int read = 0;; ++read) {
       SCOPED_TRACE("read " + std::to_string(read));
       if (IsRefused(EIO, [&] { operation(read); })) ++refusals;
-      if (reads_before_failure.exchange(-1) >= 0) return refusals;
+      if (!StopFailingReads()) return refusals;
     }
   }
 
@@ -147,26 +176,81 @@ TEST_P(SystemFailureTest, AMergeThatCannotOpenAFileTellsTheSystemsReasonAndLoses
 }
 
 TEST_P(SystemFailureTest, ASearchThatCannotReadTellsTheSystemsReasonAndTheNextOneAnswers) {
-  const int refusals = CountRefusalsOfReads([&](int read) {
+  int refusals = 0;
+  bool has_failed = true;
+  for (int read = 0; has_failed; ++read) {
     const auto index = Index::Open(path_);
-    reads_before_failure = read;
-    const bool is_refused = IsRefused(EIO, [&] { EXPECT_EQ(CountWords(*index), 2U); });
-    const int left = reads_before_failure.exchange(-1);
-    EXPECT_EQ(CountWords(*index), 2U);
-    reads_before_failure = left;
-    if (is_refused) throw IndexIoError(path_, "told", EIO);
-  });
+    FailReads(read);
+    if (IsRefused(EIO, [&] { EXPECT_EQ(CountWords(*index), 2U); })) ++refusals;
+    has_failed = StopFailingReads();
+    EXPECT_EQ(CountWords(*index), 2U) << "after read " << read;
+  }
   EXPECT_GT(refusals, 5);
 }
 
 TEST_P(SystemFailureTest, AMergeThatCannotReadTellsTheSystemsReasonAndLosesNothing) {
   const int refusals = CountRefusalsOfReads([&](int read) {
     const auto index = Index::Open(path_);
-    reads_before_failure = read;
+    FailReads(read);
     index->Optimize();
     index->Commit();
   });
   EXPECT_GT(refusals, 3);
+  EXPECT_EQ(CountWords(*Index::Open(path_)), 2U);
+}
+
+TEST_P(SystemFailureTest, ASearchWhoseFileIsGoneSpeaksOfDamage) {
+  fs::remove(path_ + "/_0.frq");
+  try {
+    CountWords(*Index::Open(path_));
+    ADD_FAILURE() << "it was searched";
+  } catch (const IndexIoError& error) {
+    ADD_FAILURE() << error.what();
+  } catch (const IndexError& error) {
+    EXPECT_THAT(error.what(), HasSubstr("_0.frq"));
+  }
+}
+
+TEST_P(SystemFailureTest, SearchesThatFailTogetherEachTellTheSystemsReason) {
+  constexpr int kSearches = 4;
+  for (int round = 0; round < 50; ++round) {
+    const auto index = Index::Open(path_);
+    FailReads(round % 12, kSearches);
+    std::vector<std::thread> threads;
+    for (int i = 0; i < kSearches; ++i) {
+      threads.emplace_back([&] { IsRefused(EIO, [&] { EXPECT_EQ(CountWords(*index), 2U); }); });
+    }
+    for (std::thread& thread : threads) thread.join();
+    StopFailingReads();
+  }
+}
+
+TEST_P(SystemFailureTest, ARepairThatCannotReadChangesNothing) {
+  const int refusals = CountRefusalsOfReads([&](int read) {
+    FailReads(read);
+    EXPECT_TRUE(RepairIndex(path_).is_clean);
+  });
+  EXPECT_GT(refusals, 5);
+  EXPECT_EQ(CountWords(*Index::Open(path_)), 2U);
+}
+
+TEST_P(SystemFailureTest, ARepairThatCannotOpenAFileChangesNothing) {
+  const int refusals = CountRefusalsOfDescriptors([&](rlim_t more) {
+    const FewDescriptors few(more);
+    EXPECT_TRUE(RepairIndex(path_).is_clean);
+  });
+  EXPECT_GT(refusals, 5);
+  EXPECT_EQ(CountWords(*Index::Open(path_)), 2U);
+}
+
+TEST_P(SystemFailureTest, ARepairByWhoMayNotReadASegmentChangesNothing) {
+  const std::string file = path_ + "/_1.tis";
+  fs::permissions(file, fs::perms::none);
+  for (const auto repair : {RepairIndex, PlanRepair}) {
+    const AsNobody nobody;
+    EXPECT_TRUE(IsRefused(EACCES, [&] { repair(path_); }));
+  }
+  fs::permissions(file, fs::perms::owner_all);
   EXPECT_EQ(CountWords(*Index::Open(path_)), 2U);
 }
 

@@ -21,7 +21,8 @@ class VANTREL_ELASTIC_EXPORT IndexError : public std::runtime_error {
   std::string path_;
 };
 
-// The operating system refused: the file is missing, unreadable, of the wrong kind, or the medium failed.
+// The operating system refused: what is asked for is missing, unreadable or of the wrong kind, the medium failed, no more
+// files can be opened. A file that is not there although the index refers to it is damage instead, a plain IndexError.
 class VANTREL_ELASTIC_EXPORT IndexIoError : public IndexError {
  public:
   // `problem` says what could not be done; the text of `error_number` (an errno value) is added to it.

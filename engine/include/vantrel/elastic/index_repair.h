@@ -38,7 +38,7 @@ struct RepairReport {
 VANTREL_ELASTIC_EXPORT RepairReport RepairIndex(const std::string& path);
 
 // What RepairIndex would drop. Nothing is created, locked or changed, and a writer may go on beside it. Forks and throws
-// as RepairIndex does; IndexError also where the index changes faster than it can be looked at.
+// as RepairIndex does; IndexIoError (EBUSY) also where the index changes faster than it can be looked at.
 VANTREL_ELASTIC_EXPORT RepairReport PlanRepair(const std::string& path);
 
 }  // namespace vantrel::elastic
