@@ -16,12 +16,12 @@ struct Outcome {
   bool operator==(const Outcome&) const = default;
 };
 
-// Passes all documents in blocks of that many, or one by one.
+// Passes all documents in blocks of that many, or one by one. Blocks that lie in the buffer are decoded at once.
 Outcome Pass(const std::shared_ptr<const ByteSource>& documents,
              const std::shared_ptr<const ByteSource>& places, const TermInfo& term, bool has_payloads,
-             int32_t block) {
-  PostingsReader postings(documents, 1000, 64);
-  PositionsReader positions(places, 64);
+             int32_t block, size_t buffer) {
+  PostingsReader postings(documents, 1000, buffer);
+  PositionsReader positions(places, buffer);
   try {
     postings.Seek(term, false);
     positions.Seek(0, has_payloads);
@@ -50,10 +50,12 @@ extern "C" int LLVMFuzzerTestOneInput(const uint8_t* data, size_t size) {
     const uint32_t length = input.TakeNumber();
     const auto postings = input.TakeSource(length);
     const auto positions = input.TakeSource();
-    const Outcome expected = Pass(postings, positions, term, has_payloads, 0);
+    const Outcome expected = Pass(postings, positions, term, has_payloads, 0, 64);
     for (const int32_t block : {1, 3, 15, 128}) {
-      Require(Pass(postings, positions, term, has_payloads, block) == expected,
-              "blocks are no other reading");
+      for (const size_t buffer : {size_t{64}, ByteReader::kDefaultBufferSize}) {
+        Require(Pass(postings, positions, term, has_payloads, block, buffer) == expected,
+                "blocks are no other reading");
+      }
     }
   });
 }

@@ -3,7 +3,6 @@
 #include <gmock/gmock.h>
 #include <gtest/gtest.h>
 
-#include <algorithm>
 #include <limits>
 #include <random>
 #include <string>
@@ -106,42 +105,97 @@ TEST(PostingsTest, GoesOnBehindSomeOfTheDocuments) {
   ExpectDamage(9, "past the end", [&] { reader.Resume(9, 0, 1, false); });
 }
 
-// Distances and frequencies of one to five bytes each, in any order.
-TEST(PostingsTest, PassesABlockAsItPassesItsDocuments) {
-  constexpr int32_t kDocuments = PostingsReader::kLongestBlock;
-  std::mt19937 random(1);
-  const auto below = [&random](uint64_t limit) { return static_cast<uint32_t>(random() % limit); };
-  for (int round = 0; round < 500; ++round) {
-    const bool omits_frequencies = round % 4 == 0;
-    const uint32_t widest = 1 + below(24);  // bits
-    ByteWriter bytes;
-    for (int32_t i = 0; i < kDocuments; ++i) {
-      const uint32_t distance = 1 + below(uint64_t{1} << below(widest));
-      const uint32_t frequency = below(3) == 0 ? 2 + below(uint64_t{1} << below(31)) : 1;
-      bytes.VInt(omits_frequencies ? distance : distance << 1 | (frequency == 1 ? 1 : 0));
-      if (!omits_frequencies && frequency != 1) bytes.VInt(frequency);
-    }
-    const uint64_t end = bytes.size();
-    bytes.Raw(std::string(2000, 'x'));
-    const auto source = SourceOf(bytes.bytes());
-    PostingsReader one_by_one(source, std::numeric_limits<int32_t>::max());
-    one_by_one.Seek(Term(kDocuments, 0), omits_frequencies);
-    std::vector<uint32_t> frequencies;
-    uint64_t occurrences = 0;
-    while (one_by_one.Next()) {
-      frequencies.push_back(one_by_one.frequency());
-      occurrences += one_by_one.frequency();
-    }
-    PostingsReader at_once(source, std::numeric_limits<int32_t>::max());
-    at_once.Seek(Term(kDocuments, 0), omits_frequencies);
-    at_once.PassBlock(kDocuments);
-    ASSERT_EQ(at_once.offset(), end);
-    ASSERT_EQ(at_once.document(), one_by_one.document());
-    ASSERT_THAT(at_once.block_frequencies(), ElementsAreArray(frequencies));
-    ASSERT_EQ(at_once.block_occurrences(), occurrences);
-    ASSERT_GE(at_once.block_bound(), *std::max_element(frequencies.begin(), frequencies.end()));
-    ASSERT_FALSE(at_once.Next());
+struct Posting {
+  uint32_t distance;
+  uint32_t frequency;
+};
+
+// Passes the documents in one block and one by one, and compares. What follows them is long enough for the block to be
+// decoded at once, or nothing.
+void ExpectSameInABlock(const std::vector<Posting>& postings, bool omits_frequencies, size_t behind) {
+  const auto count = static_cast<int32_t>(postings.size());
+  ByteWriter bytes;
+  for (const auto& [distance, frequency] : postings) {
+    bytes.VInt(omits_frequencies ? distance : distance << 1 | (frequency == 1 ? 1 : 0));
+    if (!omits_frequencies && frequency != 1) bytes.VInt(frequency);
   }
+  const auto source = SourceOf(bytes.bytes() + std::string(behind, 'x'));
+  const int32_t documents = std::numeric_limits<int32_t>::max();
+  PostingsReader one_by_one(source, documents);
+  one_by_one.Seek(Term(count, 0), omits_frequencies);
+  std::vector<uint32_t> frequencies;
+  uint64_t occurrences = 0;
+  uint32_t bits = 0;
+  while (one_by_one.Next()) {
+    frequencies.push_back(one_by_one.frequency());
+    occurrences += one_by_one.frequency();
+    bits |= one_by_one.frequency();
+  }
+  PostingsReader at_once(source, documents);
+  at_once.Seek(Term(count, 0), omits_frequencies);
+  at_once.PassBlock(count);
+  EXPECT_EQ(at_once.offset(), bytes.size());
+  EXPECT_EQ(at_once.document(), one_by_one.document());
+  EXPECT_THAT(at_once.block_frequencies(), ElementsAreArray(frequencies));
+  EXPECT_EQ(at_once.block_occurrences(), occurrences);
+  EXPECT_EQ(at_once.block_bound(), bits);
+  EXPECT_FALSE(at_once.Next());
+}
+
+class PostingsBlockTest : public ::testing::TestWithParam<size_t> {
+ protected:
+  // A number of that many bits at most.
+  uint32_t Number(uint32_t bits) { return static_cast<uint32_t>(1 + random_() % (uint64_t{1} << bits)); }
+
+  std::vector<Posting> Block(uint32_t distance_bits, uint32_t frequency_bits) {
+    std::vector<Posting> postings(PostingsReader::kLongestBlock);
+    for (Posting& posting : postings) {
+      posting = {Number(distance_bits), random_() % 3 == 0 ? Number(frequency_bits) : 1};
+    }
+    return postings;
+  }
+
+ private:
+  std::mt19937 random_{1};
+};
+
+INSTANTIATE_TEST_SUITE_P(, PostingsBlockTest, ::testing::Values(2000, 0),
+                         [](const auto& test) { return test.param == 0 ? "AtTheEnd" : "BeforeOthers"; });
+
+TEST_P(PostingsBlockTest, NumbersOfAnyLengthArePassedAsOneByOne) {
+  for (uint32_t distance_bits = 1; distance_bits < 24; ++distance_bits) {
+    for (uint32_t frequency_bits = 1; frequency_bits < 28; ++frequency_bits) {
+      SCOPED_TRACE(std::to_string(distance_bits) + " and " + std::to_string(frequency_bits) + " bits");
+      const std::vector<Posting> postings = Block(distance_bits, frequency_bits);
+      ExpectSameInABlock(postings, false, GetParam());
+      ExpectSameInABlock(postings, true, GetParam());
+    }
+  }
+}
+
+TEST_P(PostingsBlockTest, ANumberOfFiveBytesIsPassedWhereverItStands) {
+  for (size_t place = 0; place < PostingsReader::kLongestBlock; ++place) {
+    SCOPED_TRACE(place);
+    std::vector<Posting> postings = Block(3, 3);
+    postings[place].distance = 1U << 30;
+    ExpectSameInABlock(postings, false, GetParam());
+    ExpectSameInABlock(postings, true, GetParam());
+    postings[place] = {1, 0xffffffff};
+    ExpectSameInABlock(postings, false, GetParam());
+  }
+}
+
+TEST(PostingsTest, RefusesInABlockADocumentBeyondTheSegmentAndAFrequencyOf0) {
+  const std::string behind(2000, 'x');
+  const auto pass = [&](const ByteWriter& bytes) {
+    PostingsReader reader(SourceOf(bytes.bytes() + behind), 100);
+    reader.Seek(Term(3, 0), false);
+    reader.PassBlock(3);
+  };
+  ExpectDamage(2, "posting lies 60 after document 50",
+               [&] { pass(ByteWriter().VInt(21).VInt(81).VInt(121)); });
+  ExpectDamage(1, "posting has frequency 0", [&] { pass(ByteWriter().VInt(21).VInt(10).VInt(0).VInt(3)); });
+  ExpectDamage(1, "posting lies 0 after document 10", [&] { pass(ByteWriter().VInt(21).VInt(1).VInt(3)); });
 }
 
 }  // namespace
