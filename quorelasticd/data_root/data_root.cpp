@@ -1,6 +1,7 @@
 #include "data_root/data_root.h"
 
 #include <fcntl.h>
+#include <spdlog/spdlog.h>
 #include <sys/stat.h>
 #include <unistd.h>
 
@@ -93,7 +94,10 @@ std::string DataRoot::HideIndex(const std::string& name) const {
 void DataRoot::Sweep() const {
   for (const fs::directory_entry& entry : fs::directory_iterator(path_)) {
     const std::string name = entry.path().filename().string();
-    if (name.starts_with(kNewPrefix) || name.starts_with(kOldPrefix)) fs::remove_all(entry.path());
+    if (!name.starts_with(kNewPrefix) && !name.starts_with(kOldPrefix)) continue;
+    std::error_code error;
+    fs::remove_all(entry.path(), error);
+    if (error) spdlog::warn("{}: cannot be removed wholly: {}", entry.path().string(), error.message());
   }
 }
 

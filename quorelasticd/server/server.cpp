@@ -20,6 +20,7 @@ using boost::system::error_code;
 constexpr size_t kMostRefusals = 64;
 
 constexpr auto kPauseAfterFailure = std::chrono::milliseconds(100);
+constexpr auto kWarningInterval = std::chrono::minutes(1);  // of one failure that goes on
 
 }  // namespace
 
@@ -99,10 +100,19 @@ void Server::Accept() {
     }
     if (error == asio::error::connection_aborted) return Accept();
     // Descriptors or memory have run out: trying again at once would only burn the processor.
-    spdlog::warn("cannot accept a client: {}", error.message());
+    WarnOfFailure(error);
     pause_.expires_after(kPauseAfterFailure);
     pause_.async_wait([this](error_code) { Accept(); });
   });
+}
+
+void Server::WarnOfFailure(error_code error) {
+  const auto now = std::chrono::steady_clock::now();
+  ++untold_failures_;
+  if (now < next_warning_) return;
+  spdlog::warn("cannot accept a client: {} (tries: {})", error.message(), untold_failures_);
+  untold_failures_ = 0;
+  next_warning_ = now + kWarningInterval;
 }
 
 void Server::Admit(Connection::Socket socket) {

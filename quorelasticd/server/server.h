@@ -47,6 +47,7 @@ class Server {
 
  private:
   void Accept();
+  void WarnOfFailure(boost::system::error_code error);
   void Admit(Connection::Socket socket);
   void Beat();
   void BeginStop();
@@ -63,9 +64,11 @@ class Server {
   boost::asio::strand<boost::asio::io_context::executor_type> strand_;
   boost::asio::local::stream_protocol::acceptor acceptor_;
   boost::asio::signal_set signals_;
-  boost::asio::steady_timer heart_;     // until the next beat
-  boost::asio::steady_timer pause_;     // before accepting again when descriptors have run out
-  boost::asio::steady_timer deadline_;  // for the last requests, while stopping
+  boost::asio::steady_timer heart_;  // until the next beat
+  boost::asio::steady_timer pause_;  // before accepting again when descriptors have run out
+  std::chrono::steady_clock::time_point next_warning_{};  // of that
+  size_t untold_failures_ = 0;                            // since the last one
+  boost::asio::steady_timer deadline_;                    // for the last requests, while stopping
   std::vector<std::weak_ptr<Connection>> connections_;
   std::function<void()> on_stop_;
   std::function<void()> beat_;  // may be empty

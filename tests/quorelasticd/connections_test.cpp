@@ -1,6 +1,7 @@
 // Many clients, slow clients, clients that vanish.
 
 #include <gmock/gmock.h>
+#include <sys/resource.h>
 #include <sys/socket.h>
 
 #include <atomic>
@@ -14,6 +15,7 @@
 #include "quordaemon/wire.h"
 #include "served_index.h"
 #include "support/sanitized.h"
+#include "support/text_search.h"
 
 namespace quorelastic::testing {
 namespace {
@@ -46,6 +48,19 @@ class ConnectionsTest : public ServedIndex {
   static constexpr int kManyWords = 80000;
   static constexpr const char* kAllTerms = R"({"command":"terms","data":{"id":"books","max":1000000}})";
 };
+
+TEST_F(ConnectionsTest, AClientWaitsWhileDescriptorsHaveRunOutAndTheLogTellsItOnce) {
+  rlimit before{};
+  ASSERT_EQ(prlimit(daemon_.pid(), RLIMIT_NOFILE, nullptr, &before), 0);
+  const rlimit none{.rlim_cur = 1, .rlim_max = before.rlim_max};
+  ASSERT_EQ(prlimit(daemon_.pid(), RLIMIT_NOFILE, &none, nullptr), 0);
+  DaemonClient client = Connect();
+  ASSERT_TRUE(client.Send(R"({"command":"status"})"));
+  std::this_thread::sleep_for(std::chrono::milliseconds(700));  // several tries
+  EXPECT_THAT(FindAll(daemon_.Log(), "(cannot accept a client): Too many open files"), ::testing::SizeIs(1));
+  ASSERT_EQ(prlimit(daemon_.pid(), RLIMIT_NOFILE, &before, nullptr), 0);
+  EXPECT_TRUE(client.Receive()["success"].asBool());
+}
 
 TEST_F(ConnectionsTest, PipelinedRequestsAreAnsweredInTheirOrder) {
   DaemonClient client = Connect();

@@ -10,6 +10,7 @@
 #include <string>
 
 #include "data_root/index_name.h"
+#include "support/as_nobody.h"
 #include "support/files.h"
 #include "support/temporary_folder.h"
 
@@ -17,6 +18,7 @@ namespace quorelasticd {
 namespace {
 
 namespace fs = std::filesystem;
+using quorelastic::testing::AsNobody;
 using quorelastic::testing::ListFolder;
 using quorelastic::testing::TemporaryFolder;
 using quorelastic::testing::WriteFile;
@@ -110,6 +112,23 @@ TEST(DataRoot, LeftoversAreSweptAtTheStart) {
   fs::create_directories(folder / "kept");
   const DataRoot root(folder.path());
   EXPECT_THAT(ListFolder(folder.path()), ElementsAre(".other", "daemon.lock", "import", "kept"));
+}
+
+TEST(DataRoot, ALeftoverThatCannotBeRemovedKeepsNoDaemonFromStarting) {
+  const TemporaryFolder folder;
+  fs::permissions(folder.path(), fs::perms::all);
+  for (const char* name : {"/.old-a", "/.new-b"}) {
+    fs::create_directory(folder.path() + name);
+    WriteFile(folder.path() + name + "/file", "");
+    fs::permissions(folder.path() + name, fs::perms(0555));
+  }
+  fs::create_directory(folder / ".old-c");
+  {
+    const AsNobody nobody;
+    EXPECT_NO_THROW(DataRoot{folder.path()});
+  }
+  EXPECT_THAT(ListFolder(folder.path()), ElementsAre(".new-b", ".old-a", "daemon.lock", "import"));
+  for (const char* name : {"/.old-a", "/.new-b"}) fs::permissions(folder.path() + name, fs::perms::all);
 }
 
 }  // namespace
