@@ -20,8 +20,8 @@ JsonOutline OutlineOf(std::string_view text);
 // Makes a value of a JSON text from outside. It must be valid UTF-8, within the limits json_depth and json_values,
 // and nothing but one document: refused are comments, a byte order mark, a comma behind the last element, a member twice
 // in one object, and anything behind the document. The parser lets control characters in strings pass, and numbers such
-// as 01, +1 and 1., though the standard forbids them. Throws RequestError: limit_exceeded, or bad_request with a reason that begins with `what`, such as
-// "the request".
+// as 01, +1 and 1., though the standard forbids them.
+// Throws RequestError: limit_exceeded, or bad_request with a reason that begins with `what`, such as "the request".
 Json::Value ParseJson(const std::string& text, const std::string& what);
 
 // An object's text with null for the values of the member `name`: what is left when the rest is too much. The text
