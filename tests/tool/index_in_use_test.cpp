@@ -65,7 +65,7 @@ class BusyWriter {
   size_t total = 0;
   size_t announced = 0;
   size_t listed = 0;
-  for (const std::string& line : Lines(listing)) {
+  for (const std::string& line : LinesWithEnds(listing)) {
     if (line.starts_with("segment: ")) announced += std::stoul(line.substr(line.rfind(' ')));
     if (line.starts_with("field: ")) ++listed;
     if (line.starts_with("total terms: ")) total = std::stoul(line.substr(line.rfind(' ')));

@@ -27,7 +27,7 @@ inline RunResult Inspect(const std::string& action, const std::string& folder,
 }
 
 // The lines of a text, each with its end.
-inline std::vector<std::string> Lines(const std::string& text) {
+inline std::vector<std::string> LinesWithEnds(const std::string& text) {
   std::vector<std::string> lines;
   for (size_t at = 0; at < text.size();) {
     const size_t end = text.find('\n', at);
@@ -40,7 +40,7 @@ inline std::vector<std::string> Lines(const std::string& text) {
 // How many lines begin so.
 inline size_t CountLines(const std::string& text, const std::string& start) {
   size_t count = 0;
-  for (const std::string& line : Lines(text)) {
+  for (const std::string& line : LinesWithEnds(text)) {
     if (line.starts_with(start)) ++count;
   }
   return count;

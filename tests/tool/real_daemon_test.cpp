@@ -51,7 +51,7 @@ class RealDaemonTest : public SandboxTest {
     const RunResult run = sandbox_.RunTool(arguments, options);
     EXPECT_EQ(run.status, 0) << run;
     EXPECT_EQ(run.err, "");
-    const std::vector<std::string> lines = Lines(run.out);
+    const std::vector<std::string> lines = LinesWithEnds(run.out);
     Json::Value reply;
     if (lines.empty()) {
       ADD_FAILURE() << "no reply";
@@ -158,7 +158,7 @@ TEST_F(RealDaemonTest, StreamsTheProgressOfALoad) {
   const RunResult run =
       sandbox_.RunTool({"--action", "command", "--string",
                         R"({"command":"document_bulk","data":{"id":"books","file":"books.ndjson"}})"});
-  const std::vector<std::string> replies = Lines(run.out);
+  const std::vector<std::string> replies = LinesWithEnds(run.out);
   ASSERT_GE(replies.size(), 6u);
   for (size_t i = 0; i + 1 < replies.size(); ++i) {
     EXPECT_THAT(replies[i], AllOf(HasSubstr("\"progress\""), ::testing::Not(HasSubstr("\"success\""))));

@@ -64,7 +64,8 @@ class RepairTest : public ::testing::Test {
       }
     }
     std::string found;
-    for (const std::string& line : Lines(Inspect("term", path(), {"-i", "-f", "id", "-m", "100"}).out)) {
+    for (const std::string& line :
+         LinesWithEnds(Inspect("term", path(), {"-i", "-f", "id", "-m", "100"}).out)) {
       if (line.starts_with("field: ")) found += line;
     }
     EXPECT_EQ(found, ids);

@@ -177,7 +177,7 @@ class TwoSegmentDumpTest : public TermDumpTest {
     const RunResult run = Inspect(action, folder_.path(), all);
     EXPECT_THAT(run, Printed(EndsWith("total terms: 8\nsuggest divisor:1\n")));
     std::string listed;
-    for (const std::string& line : Lines(run.out)) {
+    for (const std::string& line : LinesWithEnds(run.out)) {
       if (line == "segment: _0, terms count: 5\n" || line == "segment: _1, terms count: 3\n") listed += "/";
       if (line.starts_with("field: ")) listed += line.substr(7, line.size() - 8) + ";";
     }
@@ -298,7 +298,7 @@ TEST_F(TermDumpTest, WritesOutEveryLineAsItIsFound) {
   }
   const RunResult run = Inspect("allterm", folder_.path(), {"-i"}, {.record_writes = true});
   EXPECT_THAT(run, Printed(StartsWith("segment: _0")));
-  EXPECT_EQ(run.writes, Lines(run.out));
+  EXPECT_EQ(run.writes, LinesWithEnds(run.out));
   EXPECT_EQ(run.writes.size(), 7U);
 }
 

@@ -73,7 +73,7 @@ TEST_F(TermSuggestTest, WithoutATokenEveryTermIsACompletion) {
   EXPECT_THAT(Suggest({"-f", "body"}),
               Printed(AllOf(StartsWith("type: prefix, {\"doc_freq\":3,\"term\":\"team\"}\n"),
                             EndsWith(",\"term\":\"\xe4\xb8\xad\xe6\x96\x87\"}\n"))));
-  EXPECT_EQ(Lines(Suggest({"-f", "body"}).out).size(), 5U);
+  EXPECT_EQ(LinesWithEnds(Suggest({"-f", "body"}).out).size(), 5U);
 }
 
 TEST_F(TermSuggestTest, PrintsTenAtMostWhateverTheOptionsSay) {
@@ -84,7 +84,7 @@ TEST_F(TermSuggestTest, PrintsTenAtMostWhateverTheOptionsSay) {
     index.Add({{.name = "body", .value = text}});
   }
   const std::string ten = Suggest({"-f", "body"}).out;
-  EXPECT_EQ(Lines(ten).size(), 10U);
+  EXPECT_EQ(LinesWithEnds(ten).size(), 10U);
   EXPECT_THAT(Suggest({"-f", "body", "-m", "2", "-si", "3", "-o", "4", "-i"}), Printed(ten));
   EXPECT_THAT(Suggest({"-f", "body", "-m", "-1", "-si", "-1", "-o", "-1"}), Printed(ten));
 }

@@ -27,7 +27,8 @@ class Folder {
 
   virtual bool Exists(const std::string& name) const = 0;
 
-  // Opens a file for reading. Throws IndexIoError: missing, unreadable, or no regular file.
+  // Opens a file for reading. Throws IndexIoError where it is missing, unreadable or a folder, IndexError where it is
+  // something else than a file.
   virtual std::shared_ptr<const ByteSource> Open(const std::string& name) const = 0;
 };
 

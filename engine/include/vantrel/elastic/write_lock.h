@@ -24,7 +24,7 @@ class VANTREL_ELASTIC_EXPORT WriteLock {
   static constexpr const char* kFileName = "quorelastic.lock";
 
   // Takes the lock without waiting. Throws IndexLockedError where another holds it, IndexIoError where the
-  // file can be neither opened nor created.
+  // file can be neither opened nor created, IndexError where something else than a file bears its name.
   explicit WriteLock(const std::string& folder);
   WriteLock(WriteLock&& other) noexcept;
   WriteLock& operator=(WriteLock&& other) noexcept;
