@@ -46,8 +46,11 @@ bool StopFailingReads() {
 
 }  // namespace
 
-extern "C" __attribute__((visibility("default"))) ssize_t pread(int descriptor, void* bytes, size_t count,
-                                                                off_t offset) {
+// By its symbol alone: the C library's headers may define the function themselves.
+extern "C" __attribute__((visibility("default"))) ssize_t StandInForPread(int descriptor, void* bytes,
+                                                                          size_t count,
+                                                                          off_t offset) __asm__("pread");
+ssize_t StandInForPread(int descriptor, void* bytes, size_t count, off_t offset) {
   const int read = reads++;
   if (first_failing >= 0 && read >= first_failing && read < first_failing + failing) {
     errno = EIO;
@@ -217,6 +220,7 @@ TEST_P(SystemFailureTest, SearchesThatFailTogetherEachTellTheSystemsReason) {
     const auto index = Index::Open(path_);
     FailReads(round % 12, kSearches);
     std::vector<std::thread> threads;
+    threads.reserve(kSearches);
     for (int i = 0; i < kSearches; ++i) {
       threads.emplace_back([&] { IsRefused(EIO, [&] { EXPECT_EQ(CountWords(*index), 2U); }); });
     }
