@@ -46,15 +46,22 @@ class VmTouchTest : public SandboxTest {
 TEST_F(VmTouchTest, BringsEveryPageOfEveryIndexInAndPrintsNothing) {
   WriteIndex(Index("plain"), false);
   WriteIndex(Index("compound"), true);
-  if (!ThrowOutOfPageCache(sandbox_.data_root()))
-    GTEST_SKIP() << "this file system keeps its files in memory";
-  for (const char* name : {"plain", "compound"}) EXPECT_EQ(CountFolder(Index(name)).resident, 0U);
-  EXPECT_THAT(Touch(), Printed(""));
-  for (const char* name : {"plain", "compound"}) {
-    const PageCount pages = CountFolder(Index(name));
-    EXPECT_GT(pages.all, 300U);
-    EXPECT_EQ(pages.resident, pages.all) << name;
+  const auto count = [this] {
+    const PageCount plain = CountFolder(Index("plain"));
+    const PageCount compound = CountFolder(Index("compound"));
+    return PageCount{.resident = plain.resident + compound.resident, .all = plain.all + compound.all};
+  };
+  // The kernel may take pages back at any time, which is no fault of the run.
+  PageCount pages;
+  for (int tries = 0; tries < 5 && (tries == 0 || pages.resident < pages.all); ++tries) {
+    if (!ThrowOutOfPageCache(sandbox_.data_root()))
+      GTEST_SKIP() << "this file system keeps its files in memory";
+    EXPECT_EQ(count().resident, 0U);
+    EXPECT_THAT(Touch(), Printed(""));
+    pages = count();
   }
+  EXPECT_GT(pages.all, 600U);
+  EXPECT_EQ(pages.resident, pages.all);
 }
 
 TEST_F(VmTouchTest, PassesOverWhatItCannotRead) {
