@@ -18,6 +18,7 @@
 
 #include "read_back.h"
 #include "support/as_nobody.h"
+#include "support/sanitized.h"
 #include "support/temporary_folder.h"
 #include "vantrel/elastic/index.h"
 #include "vantrel/elastic/index_error.h"
@@ -65,6 +66,7 @@ namespace {
 namespace fs = std::filesystem;
 using ::quorelastic::testing::AsNobody;
 using ::quorelastic::testing::IdAndBody;
+using ::quorelastic::testing::kIsSanitized;
 using ::quorelastic::testing::MakeDocument;
 using ::quorelastic::testing::TemporaryFolder;
 using ::testing::HasSubstr;
@@ -87,6 +89,9 @@ class FewDescriptors {
  private:
   rlimit before_{};
 };
+
+// It opens a pipe to see whether an object's memory is there, and takes a bad look for a bad object.
+constexpr const char* kSanitizerNeedsDescriptors = "the sanitizer needs descriptors of its own";
 
 // Two segments of several files each, with a manifest or without.
 class SystemFailureTest : public ::testing::TestWithParam<bool> {
@@ -160,6 +165,7 @@ INSTANTIATE_TEST_SUITE_P(, SystemFailureTest, ::testing::Bool(),
                          [](const auto& test) { return test.param ? "WithAManifest" : "WithoutOne"; });
 
 TEST_P(SystemFailureTest, ASearchThatCannotOpenAFileTellsTheSystemsReason) {
+  if (kIsSanitized) GTEST_SKIP() << kSanitizerNeedsDescriptors;
   const int refusals = CountRefusalsOfDescriptors([&](rlim_t more) {
     const auto index = Index::Open(path_);
     const FewDescriptors few(more);
@@ -169,6 +175,7 @@ TEST_P(SystemFailureTest, ASearchThatCannotOpenAFileTellsTheSystemsReason) {
 }
 
 TEST_P(SystemFailureTest, AMergeThatCannotOpenAFileTellsTheSystemsReasonAndLosesNothing) {
+  if (kIsSanitized) GTEST_SKIP() << kSanitizerNeedsDescriptors;
   const int refusals = CountRefusalsOfDescriptors([&](rlim_t more) {
     const auto index = Index::Open(path_);
     const FewDescriptors few(more);
@@ -239,6 +246,7 @@ TEST_P(SystemFailureTest, ARepairThatCannotReadChangesNothing) {
 }
 
 TEST_P(SystemFailureTest, ARepairThatCannotOpenAFileChangesNothing) {
+  if (kIsSanitized) GTEST_SKIP() << kSanitizerNeedsDescriptors;
   const int refusals = CountRefusalsOfDescriptors([&](rlim_t more) {
     const FewDescriptors few(more);
     EXPECT_TRUE(RepairIndex(path_).is_clean);
