@@ -16,6 +16,13 @@ JsonValue DaemonClient::Receive() {
   return reply;
 }
 
+JsonValue DaemonClient::ReceiveFinal() {
+  for (;;) {
+    JsonValue reply = Receive();
+    if (reply.isMember("success")) return reply;
+  }
+}
+
 std::vector<JsonValue> DaemonClient::Exchange(const std::string& request) {
   if (!Send(request)) throw std::runtime_error("cannot send a request");
   std::vector<JsonValue> replies;

@@ -20,6 +20,9 @@ class DaemonClient : public quordaemon::DomainSockConnection {
   // One reply; it must be JSON.
   JsonValue Receive();
 
+  // The final reply of those to come to one request; what comes before it is dropped.
+  JsonValue ReceiveFinal();
+
   // Sends a request and collects its replies, the final one last.
   std::vector<JsonValue> Exchange(const std::string& request);
 

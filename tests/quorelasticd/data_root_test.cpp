@@ -10,17 +10,17 @@
 #include <string>
 
 #include "data_root/index_name.h"
-#include "support/as_nobody.h"
 #include "support/files.h"
 #include "support/temporary_folder.h"
+#include "support/without_rights.h"
 
 namespace quorelasticd {
 namespace {
 
 namespace fs = std::filesystem;
-using quorelastic::testing::AsNobody;
 using quorelastic::testing::ListFolder;
 using quorelastic::testing::TemporaryFolder;
+using quorelastic::testing::WithoutRights;
 using quorelastic::testing::WriteFile;
 using ::testing::ElementsAre;
 
@@ -124,7 +124,7 @@ TEST(DataRoot, ALeftoverThatCannotBeRemovedKeepsNoDaemonFromStarting) {
   }
   fs::create_directory(folder / ".old-c");
   {
-    const AsNobody nobody;
+    const WithoutRights rights;
     EXPECT_NO_THROW(DataRoot{folder.path()});
   }
   EXPECT_THAT(ListFolder(folder.path()), ElementsAre(".new-b", ".old-a", "daemon.lock", "import"));

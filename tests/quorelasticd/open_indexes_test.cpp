@@ -4,23 +4,15 @@
 
 #include <algorithm>
 #include <chrono>
-#include <filesystem>
-#include <iterator>
 #include <string>
 
 #include "daemon_client.h"
 #include "daemon_process.h"
+#include "support/open_files.h"
 #include "support/temporary_folder.h"
 
 namespace quorelastic::testing {
 namespace {
-
-namespace fs = std::filesystem;
-
-size_t CountDescriptors(pid_t pid) {
-  const fs::directory_iterator entries("/proc/" + std::to_string(pid) + "/fd");
-  return static_cast<size_t>(std::distance(fs::begin(entries), fs::end(entries)));
-}
 
 TEST(OpenIndexes, MoreThanMayBeOpenAreAllServedWithFewDescriptors) {
   const TemporaryFolder folder;
@@ -46,10 +38,10 @@ TEST(OpenIndexes, MoreThanMayBeOpenAreAllServedWithFewDescriptors) {
                                  (i % 2 == 0 ? "true" : "false") + "}}"),
               "");
     EXPECT_GE(search(client, i), i % 2 == 0 ? 2 : 1);
-    most = std::max(most, CountDescriptors(daemon.pid()));
+    most = std::max(most, CountOpenFiles(daemon.pid()));
   }
   for (int i = 0; i < kIndexes; ++i) EXPECT_GE(search(client, i), i % 2 == 0 ? 2 : 1) << i;
-  most = std::max(most, CountDescriptors(daemon.pid()));
+  most = std::max(most, CountOpenFiles(daemon.pid()));
   EXPECT_LT(most, 200U);
   // What has changes is committed in the background, and closed when the next index is opened.
   const auto give_up = std::chrono::steady_clock::now() + std::chrono::seconds(60);

@@ -23,6 +23,7 @@ namespace {
 constexpr const char* kCreate =
     R"({"command":"index_create","data":{"id":"x","settings":{"fields":[{"name":"t","type":"text"}]}}})";
 constexpr const char* kCountRequest = R"({"command":"index_list","data":{"id":"x"}})";
+constexpr const char* kAllTerms = R"({"command":"terms","data":{"id":"x","max":1000000}})";
 
 int Count(DaemonClient& client) {
   return client.Ask(kCountRequest)["result"]["indexes"][0]["documents"].asInt();
@@ -31,6 +32,12 @@ int Count(DaemonClient& client) {
 std::string AddRequest(const std::string& id, bool commit) {
   return R"({"command":"document_bulk","data":{"id":"x","documents":[{"id":")" + id + R"("}],"commit":)" +
          (commit ? "true" : "false") + "}}";
+}
+
+// So many terms that their replies fill a socket many times over.
+std::string AddManyWordsRequest() {
+  return R"({"command":"document_bulk","data":{"id":"x","documents":[{"id":"1","t":")" + ManyWords(50000) +
+         "\"}]}}";
 }
 
 TEST(Shutdown, CommittedDocumentsOutliveARestartAndAKill) {
@@ -95,19 +102,13 @@ TEST(Shutdown, RequestsThatWaitForTheirTurnAreRefusedOnceTheStreamBeforeThemIsDo
   DaemonProcess daemon(folder.path());
   DaemonClient client(daemon.socket());
   ASSERT_EQ(client.AskForError(kCreate), "");
-  ASSERT_EQ(client.AskForError(R"({"command":"document_bulk","data":{"id":"x","documents":[{"id":"1","t":")" +
-                               ManyWords(50000) + "\"}]}}"),
-            "");
-  ASSERT_TRUE(client.Send(R"({"command":"terms","data":{"id":"x","max":1000000}})"));
+  ASSERT_EQ(client.AskForError(AddManyWordsRequest()), "");
+  ASSERT_TRUE(client.Send(kAllTerms));
   ASSERT_TRUE(client.Send(R"({"command":"status"})"));
   client.Receive();
   daemon.Signal(SIGTERM);
   while (daemon.Notifications().size() < 2) std::this_thread::sleep_for(std::chrono::milliseconds(5));
-  JsonValue reply;
-  do {
-    reply = client.Receive();
-  } while (!reply.isMember("success"));
-  EXPECT_TRUE(reply["success"].asBool());
+  EXPECT_TRUE(client.ReceiveFinal()["success"].asBool());
   EXPECT_EQ(client.Receive()["error"]["code"].asString(), "shutting_down");
   EXPECT_TRUE(client.IsHungUp());
   EXPECT_EQ(daemon.Wait(), 0);
@@ -118,18 +119,11 @@ TEST(Shutdown, AStreamUnderWayIsFinishedFirst) {
   DaemonProcess daemon(folder.path());
   DaemonClient client(daemon.socket());
   ASSERT_EQ(client.AskForError(kCreate), "");
-  const std::string words = ManyWords(50000);
-  ASSERT_EQ(client.AskForError(R"({"command":"document_bulk","data":{"id":"x","documents":[{"id":"1","t":")" +
-                               words + "\"}]}}"),
-            "");
-  ASSERT_TRUE(client.Send(R"({"command":"terms","data":{"id":"x","max":1000000}})"));
+  ASSERT_EQ(client.AskForError(AddManyWordsRequest()), "");
+  ASSERT_TRUE(client.Send(kAllTerms));
   client.Receive();
   daemon.Signal(SIGTERM);
-  JsonValue reply;
-  do {
-    reply = client.Receive();
-  } while (!reply.isMember("success"));
-  EXPECT_EQ(reply["result"]["count"].asInt(), 50001);
+  EXPECT_EQ(client.ReceiveFinal()["result"]["count"].asInt(), 50001);
   EXPECT_TRUE(client.IsHungUp());
   EXPECT_EQ(daemon.Wait(), 0);
 }
@@ -139,11 +133,8 @@ TEST(Shutdown, AClientThatNeverReadsIsCutOffAtTheEnd) {
   DaemonProcess daemon(folder.path(), {"--shutdown-timeout", "1"});
   DaemonClient client(daemon.socket());
   ASSERT_EQ(client.AskForError(kCreate), "");
-  const std::string words = ManyWords(50000);
-  ASSERT_EQ(client.AskForError(R"({"command":"document_bulk","data":{"id":"x","documents":[{"id":"1","t":")" +
-                               words + "\"}]}}"),
-            "");
-  ASSERT_TRUE(client.Send(R"({"command":"terms","data":{"id":"x","max":1000000}})"));
+  ASSERT_EQ(client.AskForError(AddManyWordsRequest()), "");
+  ASSERT_TRUE(client.Send(kAllTerms));
   client.Receive();
   EXPECT_EQ(daemon.Stop(), 0);
 }

@@ -9,4 +9,8 @@ inline constexpr bool kIsSanitized = true;
 inline constexpr bool kIsSanitized = false;
 #endif
 
+// Why a test that takes all descriptors away is skipped then: to see whether the memory of an object is there, it opens a
+// pipe, and takes a look that fails for an object that is bad.
+inline constexpr const char* kSanitizerNeedsDescriptors = "the sanitizer needs descriptors of its own";
+
 }  // namespace quorelastic::testing

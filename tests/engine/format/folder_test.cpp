@@ -7,10 +7,8 @@
 #include <sys/un.h>
 #include <unistd.h>
 
-#include <cstdlib>
 #include <cstring>
 #include <filesystem>
-#include <stdexcept>
 
 #include "elastic/format/byte_reader.h"
 #include "elastic/format/term_cursor.h"
@@ -18,6 +16,7 @@
 #include "support/expect_damage.h"
 #include "support/files.h"
 #include "support/temporary_folder.h"
+#include "support/without_rights.h"
 
 namespace vantrel::elastic::format {
 namespace {
@@ -26,6 +25,7 @@ using ::quorelastic::testing::ByteWriter;
 using ::quorelastic::testing::ExpectDamage;
 using ::quorelastic::testing::ExpectIndexError;
 using ::quorelastic::testing::TemporaryFolder;
+using ::quorelastic::testing::WithoutRights;
 using ::quorelastic::testing::WriteFile;
 using ::testing::UnorderedElementsAre;
 
@@ -90,23 +90,6 @@ TEST(DiskFolderTest, SaysWhichFileItCannotOpenAndWhy) {
   ExpectIndexError(folder / "loop: cannot open file: Too many levels", [&] { disk.Open("loop"); });
   ExpectIndexError(folder / "dangling: cannot open file: No such file", [&] { disk.Open("dangling"); });
 }
-
-// Acts as a user without rights while it lives, where the test is run by one who has them all.
-class WithoutRights {
- public:
-  WithoutRights() {
-    if (before_ == 0 && seteuid(kNobody) != 0) throw std::runtime_error("cannot become another user");
-  }
-  WithoutRights(const WithoutRights&) = delete;
-  WithoutRights& operator=(const WithoutRights&) = delete;
-  ~WithoutRights() {
-    if (seteuid(before_) != 0) std::abort();
-  }
-
- private:
-  static constexpr uid_t kNobody = 65534;
-  uid_t before_ = geteuid();
-};
 
 TEST(DiskFolderTest, SaysWhichFileOrFolderItMayNotRead) {
   const TemporaryFolder folder;

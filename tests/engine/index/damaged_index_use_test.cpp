@@ -8,6 +8,7 @@
 
 #include "read_back.h"
 #include "support/files.h"
+#include "support/open_files.h"
 #include "support/temporary_folder.h"
 #include "vantrel/elastic/index.h"
 #include "vantrel/elastic/index_error.h"
@@ -18,6 +19,7 @@ namespace vantrel::elastic {
 namespace {
 
 using ::quorelastic::testing::CopyFolder;
+using ::quorelastic::testing::CountOpenFiles;
 using ::quorelastic::testing::FindFile;
 using ::quorelastic::testing::ListFolder;
 using ::quorelastic::testing::MakeDocument;
@@ -58,11 +60,6 @@ void FlipBit(const std::string& path, size_t offset) {
   std::string bytes = ReadFile(path);
   bytes.at(offset) = static_cast<char>(bytes.at(offset) ^ 0x04);
   WriteFile(path, bytes);
-}
-
-size_t OpenDescriptors() {
-  const std::filesystem::directory_iterator all("/proc/self/fd");
-  return static_cast<size_t>(std::distance(begin(all), end(all)));
 }
 
 // Two segments with a deleted document and a manifest, and nobody who writes.
@@ -140,9 +137,9 @@ TEST_P(DamagedIndexUseTest, SearchesThatFailLeaveNoFileOpen) {
   const auto index = Index::Open(path());
   FlipBit(path() + (GetParam() ? "/_1.cfs" : "/_1.nrm"), 5);
   ErrorOf([&] { Answer(*index); });
-  const size_t before = OpenDescriptors();
+  const size_t before = CountOpenFiles();
   for (int i = 0; i < 50; ++i) EXPECT_NE(ErrorOf([&] { Answer(*index); }), "no error");
-  EXPECT_LE(OpenDescriptors(), before);
+  EXPECT_LE(CountOpenFiles(), before);
 }
 
 TEST_P(DamagedIndexUseTest, AFileThatIsCutIsToldWithItsSize) {

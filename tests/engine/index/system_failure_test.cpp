@@ -3,7 +3,6 @@
 
 #include <gmock/gmock.h>
 #include <gtest/gtest.h>
-#include <sys/resource.h>
 #include <sys/syscall.h>
 #include <unistd.h>
 
@@ -11,15 +10,15 @@
 #include <cerrno>
 #include <cstdint>
 #include <filesystem>
-#include <iterator>
 #include <string>
 #include <thread>
 #include <vector>
 
 #include "read_back.h"
-#include "support/as_nobody.h"
+#include "support/open_files.h"
 #include "support/sanitized.h"
 #include "support/temporary_folder.h"
+#include "support/without_rights.h"
 #include "vantrel/elastic/index.h"
 #include "vantrel/elastic/index_error.h"
 #include "vantrel/elastic/index_repair.h"
@@ -64,34 +63,15 @@ namespace vantrel::elastic {
 namespace {
 
 namespace fs = std::filesystem;
-using ::quorelastic::testing::AsNobody;
+using ::quorelastic::testing::CountOpenFiles;
+using ::quorelastic::testing::FewOpenFiles;
 using ::quorelastic::testing::IdAndBody;
 using ::quorelastic::testing::kIsSanitized;
+using ::quorelastic::testing::kSanitizerNeedsDescriptors;
 using ::quorelastic::testing::MakeDocument;
 using ::quorelastic::testing::TemporaryFolder;
+using ::quorelastic::testing::WithoutRights;
 using ::testing::HasSubstr;
-
-// As long as it lives, this process opens no more than `more` files beside those that are open.
-class FewDescriptors {
- public:
-  explicit FewDescriptors(rlim_t more) {
-    const fs::directory_iterator open("/proc/self/fd");
-    const auto count = std::distance(begin(open), end(open)) - 1;  // without the listing's own
-    getrlimit(RLIMIT_NOFILE, &before_);
-    rlimit few = before_;
-    few.rlim_cur = static_cast<rlim_t>(count) + more;
-    setrlimit(RLIMIT_NOFILE, &few);
-  }
-  FewDescriptors(const FewDescriptors&) = delete;
-  FewDescriptors& operator=(const FewDescriptors&) = delete;
-  ~FewDescriptors() { setrlimit(RLIMIT_NOFILE, &before_); }
-
- private:
-  rlimit before_{};
-};
-
-// It opens a pipe to see whether an object's memory is there, and takes a bad look for a bad object.
-constexpr const char* kSanitizerNeedsDescriptors = "the sanitizer needs descriptors of its own";
 
 // Two segments of several files each, with a manifest or without.
 class SystemFailureTest : public ::testing::TestWithParam<bool> {
@@ -168,7 +148,7 @@ TEST_P(SystemFailureTest, ASearchThatCannotOpenAFileTellsTheSystemsReason) {
   if (kIsSanitized) GTEST_SKIP() << kSanitizerNeedsDescriptors;
   const int refusals = CountRefusalsOfDescriptors([&](rlim_t more) {
     const auto index = Index::Open(path_);
-    const FewDescriptors few(more);
+    const FewOpenFiles few(CountOpenFiles() + more);
     EXPECT_EQ(CountWords(*index), 2U);
   });
   EXPECT_GT(refusals, 5);
@@ -178,7 +158,7 @@ TEST_P(SystemFailureTest, AMergeThatCannotOpenAFileTellsTheSystemsReasonAndLoses
   if (kIsSanitized) GTEST_SKIP() << kSanitizerNeedsDescriptors;
   const int refusals = CountRefusalsOfDescriptors([&](rlim_t more) {
     const auto index = Index::Open(path_);
-    const FewDescriptors few(more);
+    const FewOpenFiles few(CountOpenFiles() + more);
     index->Optimize();
   });
   EXPECT_GT(refusals, 5);
@@ -248,7 +228,7 @@ TEST_P(SystemFailureTest, ARepairThatCannotReadChangesNothing) {
 TEST_P(SystemFailureTest, ARepairThatCannotOpenAFileChangesNothing) {
   if (kIsSanitized) GTEST_SKIP() << kSanitizerNeedsDescriptors;
   const int refusals = CountRefusalsOfDescriptors([&](rlim_t more) {
-    const FewDescriptors few(more);
+    const FewOpenFiles few(CountOpenFiles() + more);
     EXPECT_TRUE(RepairIndex(path_).is_clean);
   });
   EXPECT_GT(refusals, 5);
@@ -259,7 +239,7 @@ TEST_P(SystemFailureTest, ARepairByWhoMayNotReadASegmentChangesNothing) {
   const std::string file = path_ + "/_1.tis";
   fs::permissions(file, fs::perms::none);
   for (const auto repair : {RepairIndex, PlanRepair}) {
-    const AsNobody nobody;
+    const WithoutRights rights;
     EXPECT_TRUE(IsRefused(EACCES, [&] { repair(path_); }));
   }
   fs::permissions(file, fs::perms::owner_all);

@@ -1,6 +1,5 @@
 #include <gmock/gmock.h>
 #include <gtest/gtest.h>
-#include <sys/resource.h>
 
 #include <filesystem>
 
@@ -8,6 +7,7 @@
 #include "support/byte_writer.h"
 #include "support/expect_damage.h"
 #include "support/files.h"
+#include "support/open_files.h"
 #include "support/temporary_folder.h"
 
 namespace vantrel::elastic {
@@ -17,6 +17,7 @@ using ::quorelastic::testing::ByteWriter;
 using ::quorelastic::testing::ExpectDamage;
 using ::quorelastic::testing::ExpectIndexError;
 using ::quorelastic::testing::ExpectSameTerms;
+using ::quorelastic::testing::FewOpenFiles;
 using ::quorelastic::testing::TemporaryFolder;
 using ::quorelastic::testing::WriteFile;
 
@@ -117,22 +118,6 @@ TEST(SuggestDivisorTest, ADamagedTermIndexIsAnError) {
   const auto info = newClassInit<IndexInfo>(folder.path());
   ExpectDamage(4, "term count 5 does not fit", [&] { info->GetSuggestDivisor(); });
 }
-
-// Lowers the limit on open files while it lives.
-class FewOpenFiles {
- public:
-  explicit FewOpenFiles(rlim_t most) {
-    getrlimit(RLIMIT_NOFILE, &before_);
-    const rlimit lower = {most, before_.rlim_max};
-    setrlimit(RLIMIT_NOFILE, &lower);
-  }
-  FewOpenFiles(const FewOpenFiles&) = delete;
-  FewOpenFiles& operator=(const FewOpenFiles&) = delete;
-  ~FewOpenFiles() { setrlimit(RLIMIT_NOFILE, &before_); }
-
- private:
-  rlimit before_{};
-};
 
 TEST(HandMadeIndexTest, ACommitOfTooManySegmentsIsAnErrorThatSaysSoAndLeavesNothingOpen) {
   const TemporaryFolder folder;
