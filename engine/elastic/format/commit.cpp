@@ -8,6 +8,7 @@
 #include <utility>
 
 #include "elastic/format/byte_reader.h"
+#include "elastic/format/field_infos.h"
 #include "elastic/format/file_names.h"
 #include "elastic/format/quoted.h"
 #include "vantrel/elastic/index_error.h"
@@ -24,9 +25,9 @@ constexpr int32_t kWithDeletionCount = -6;
 constexpr int32_t kWithHasPositions = -7;
 constexpr int32_t kWithUserData = -8;
 constexpr int32_t kWithDiagnostics = -9;
+static_assert(kWithDiagnostics == kNewestCommitFormat);
 
 constexpr int32_t kMostSegments = int32_t{1} << 16;
-constexpr int32_t kMostFields = int32_t{1} << 18;
 
 void SkipString(ByteReader& reader) { reader.Skip(reader.ReadVInt()); }
 
@@ -165,8 +166,9 @@ Commit ReadCommit(const std::shared_ptr<const ByteSource>& source, int64_t gener
   Commit commit;
   commit.generation = generation;
   int32_t format = reader.ReadInt();
-  if (format < kWithDiagnostics) {
-    reader.Damaged(0, "format is " + std::to_string(format) + ", but -9 is the newest known");
+  if (format < kNewestCommitFormat) {
+    reader.Damaged(0, "format is " + std::to_string(format) + ", but " + std::to_string(kNewestCommitFormat) +
+                          " is the newest known");
   }
   commit.format = std::min(format, 0);
   commit.counter = format;

@@ -56,6 +56,8 @@ struct Commit {
 // Room for any commit, in bytes; a hole in a file that is larger could be taken for endless user data.
 inline constexpr uint64_t kLargestCommit = uint64_t{256} << 20;
 
+inline constexpr int32_t kNewestCommitFormat = -9;
+
 // Decodes a file segments_N. Layout, by format number F (the newer the smaller; -9 is written today):
 //
 //   Int F                       absent, with the Long, when the first Int is 0 or more: that is the oldest

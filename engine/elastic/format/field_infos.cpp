@@ -11,8 +11,7 @@
 namespace vantrel::elastic::format {
 namespace {
 
-constexpr auto kFormat = static_cast<uint32_t>(-2);
-constexpr uint32_t kMostFields = uint32_t{1} << 18;
+constexpr auto kFormat = static_cast<uint32_t>(kFieldInfosFormat);
 constexpr uint64_t kShortestField = 2;  // an empty name, the flags
 
 // The flags.
@@ -51,13 +50,16 @@ std::vector<FieldInfo> ReadAll(ByteReader& reader, Names names) {
     count_start = reader.offset();
     count = reader.ReadVInt();
   } else if (static_cast<int32_t>(count) < 0) {
-    reader.Damaged(0, "format is " + std::to_string(static_cast<int32_t>(count)) + ", but only -2 is known");
+    reader.Damaged(0, "format is " + std::to_string(static_cast<int32_t>(count)) + ", but only " +
+                          std::to_string(kFieldInfosFormat) + " is known");
   }
   if (count > reader.remaining() / kShortestField) {
     reader.Damaged(count_start,
                    std::to_string(count) + " fields, but the file ends at " + std::to_string(reader.size()));
   }
-  if (count > kMostFields) reader.Damaged(count_start, std::to_string(count) + " fields are too many");
+  if (count > uint32_t{kMostFields}) {
+    reader.Damaged(count_start, std::to_string(count) + " fields are too many");
+  }
   std::vector<FieldInfo> fields;
   // No writer makes two fields of one name; a hole in the file would be full of them.
   std::unordered_set<std::string> seen;

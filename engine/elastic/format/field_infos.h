@@ -22,6 +22,11 @@ struct FieldInfo {
   uint8_t flags = 0;    // as they stand there
 };
 
+inline constexpr int32_t kFieldInfosFormat = -2;
+
+// More than any index has.
+inline constexpr int32_t kMostFields = int32_t{1} << 18;
+
 // The fields of a segment (.fnm), by their number. Layout:
 //
 //   VInt -2, VInt count   or, the older layout: VInt count

@@ -13,6 +13,9 @@ namespace vantrel::elastic::format {
 // Dictionaries of this format and newer ones (smaller numbers) have skip data of the layout below.
 inline constexpr int32_t kFormatWithSkipLists = -2;
 
+// More levels than a term can have with any interval. The writer allows 10.
+inline constexpr int32_t kMostSkipLevels = 32;
+
 // The skip data of a term, which lets a reader jump ahead in its postings (.frq, behind the term's documents).
 // With a skip interval of n, level 0 has an entry at each n-th document, level 1 at each n*n-th, and so on, as far
 // as the document frequency reaches and the dictionary's header allows. Layout:

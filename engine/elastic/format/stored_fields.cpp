@@ -76,6 +76,10 @@ bool StoredFieldsReader::Next() {
   return true;
 }
 
+uint8_t StoredFieldsReader::known_flags() const {
+  return format_ < kWithoutCompression ? kCut | kBinary | kCompressed : kCut | kBinary;
+}
+
 void StoredFieldsReader::PassValue() {
   const uint64_t start = records_.offset();
   const uint64_t length = records_.ReadVInt();

@@ -21,13 +21,13 @@ namespace vantrel::elastic::format {
 // For one thread at a time.
 class StoredFieldsReader {
  public:
+  static constexpr uint8_t kCut = 1;
   static constexpr uint8_t kBinary = 2;
   static constexpr uint8_t kCompressed = 4;
 
   // The headers are read and checked. Throws IndexDamagedError, IndexIoError, as does everything below.
   StoredFieldsReader(std::shared_ptr<const ByteSource> index, std::shared_ptr<const ByteSource> records);
 
-  int32_t format() const { return format_; }
   uint64_t documents() const { return (index_.size() - header_) / kPointerSize; }
   uint64_t header_size() const { return header_; }
   const ByteReader& index() const { return index_; }
@@ -48,6 +48,7 @@ class StoredFieldsReader {
   uint64_t field_offset() const { return field_offset_; }
   uint32_t number() const { return number_; }
   uint8_t flags() const { return flags_; }
+  uint8_t known_flags() const;  // those that the format has
 
   // Moves past the value. It must lie within the record, be valid UTF-8 where it is text, and whole where it is
   // compressed.

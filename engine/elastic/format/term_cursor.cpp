@@ -12,6 +12,8 @@ namespace {
 // Format numbers, each named after what it brought.
 constexpr int32_t kWithFormat = -1;
 constexpr int32_t kWithSkipLevels = -3;
+constexpr int32_t kWithUtf8 = -4;
+static_assert(kWithUtf8 == TermCursor::kNewestFormat);
 
 constexpr int32_t kNeverSkips = std::numeric_limits<int32_t>::max();
 constexpr size_t kBufferSize = size_t{64} << 10;
@@ -29,8 +31,9 @@ TermCursor::TermCursor(std::shared_ptr<const ByteSource> source, File file, uint
 
 void TermCursor::ReadHeader() {
   const int32_t first = reader_.ReadInt();
-  if (first < kUtf8Format) {
-    reader_.Damaged(0, "format is " + std::to_string(first) + ", but -4 is the newest known");
+  if (first < kNewestFormat) {
+    reader_.Damaged(0, "format is " + std::to_string(first) + ", but " + std::to_string(kNewestFormat) +
+                           " is the newest known");
   }
   format_ = first < 0 ? first : 0;
   const uint64_t count_start = first < 0 ? reader_.offset() : 0;
@@ -56,6 +59,15 @@ void TermCursor::ReadHeader() {
   }
   count_ = static_cast<uint64_t>(count);
 }
+
+bool TermCursor::is_utf8() const { return format_ <= kWithUtf8; }
+
+uint64_t TermCursor::index_entries() const {
+  const auto interval = static_cast<uint64_t>(index_interval_);
+  return count_ / interval + (count_ % interval != 0 ? 1 : 0);
+}
+
+bool TermCursor::index_repeats_skips() const { return format_ < kWithFormat; }
 
 bool TermCursor::Next() {
   term_offset_ = reader_.offset();
@@ -166,6 +178,23 @@ uint64_t TermCursor::Advanced(uint64_t pointer) {
             " does not fit 63 bits");
   }
   return pointer + delta;
+}
+
+std::optional<HeaderConflict> FindHeaderConflict(const TermCursor& dictionary, const TermCursor& index) {
+  std::optional<HeaderConflict> conflict;
+  const auto compare = [&](const char* what, int64_t in_dictionary, int64_t in_index) {
+    if (!conflict.has_value() && in_dictionary != in_index) conflict = {what, in_dictionary, in_index};
+  };
+  compare("format", dictionary.format(), index.format());
+  if (dictionary.index_repeats_skips()) {
+    compare("index interval", dictionary.index_interval(), index.index_interval());
+    compare("skip interval", dictionary.skip_interval(), index.skip_interval());
+    compare("number of skip levels", dictionary.most_skip_levels(), index.most_skip_levels());
+  }
+  // A count is below the size of its file.
+  compare("number of entries", static_cast<int64_t>(dictionary.index_entries()),
+          static_cast<int64_t>(index.count()));
+  return conflict;
 }
 
 }  // namespace vantrel::elastic::format

@@ -2,6 +2,7 @@
 
 #include <cstdint>
 #include <memory>
+#include <optional>
 #include <string>
 #include <string_view>
 
@@ -46,6 +47,8 @@ class TermCursor {
  public:
   enum class File { kDictionary, kIndex };
 
+  static constexpr int32_t kNewestFormat = -4;
+
   // The header is read and checked. `field_count` and `document_count` are the segment's. Throws
   // IndexDamagedError, IndexIoError, as does Next().
   TermCursor(std::shared_ptr<const ByteSource> source, File file, uint32_t field_count,
@@ -55,10 +58,15 @@ class TermCursor {
   uint64_t count() const { return count_; }
   int32_t index_interval() const { return index_interval_; }
   int32_t skip_interval() const { return skip_interval_; }
-  bool is_utf8() const { return format_ == kUtf8Format; }  // the layout of today, sorted by bytes
+  bool is_utf8() const;  // the layout of today, sorted by bytes
   int32_t most_skip_levels() const { return most_skip_levels_; }
   int32_t format() const { return format_; }  // 0 for the oldest layout
   const std::string& name() const { return reader_.name(); }
+
+  // How many entries the index over this dictionary has, and whether in this layout it repeats the intervals and
+  // the skip offsets of the dictionary.
+  uint64_t index_entries() const;
+  bool index_repeats_skips() const;
 
   // Moves to the next term, at first to the first one; false at the end. At the end it is checked that the
   // file ends there too.
@@ -98,8 +106,6 @@ class TermCursor {
   bool HasSkipOffset() const;
   uint64_t Advanced(uint64_t pointer);
 
-  static constexpr int32_t kUtf8Format = -4;
-
   ByteReader reader_;
   File file_;
   uint32_t field_count_;
@@ -121,5 +127,13 @@ class TermCursor {
   TermInfo info_;
   uint64_t dictionary_pointer_ = 0;
 };
+
+// What the header of an index over a dictionary tells otherwise than the dictionary's own.
+struct HeaderConflict {
+  const char* what;
+  int64_t in_dictionary;
+  int64_t in_index;
+};
+std::optional<HeaderConflict> FindHeaderConflict(const TermCursor& dictionary, const TermCursor& index);
 
 }  // namespace vantrel::elastic::format

@@ -40,11 +40,13 @@ TermVectorsReader::TermVectorsReader(std::shared_ptr<const ByteSource> index,
           0, "format is " + std::to_string(again) + ", but the index has format " + std::to_string(format_));
     }
   }
-  entry_size_ = format_ >= kWithTermsPointer ? 16 : 8;
+  entry_size_ = index_tells_terms_start() ? 16 : 8;
   if ((index_.size() - kHeader) % entry_size_ != 0) {
     index_.Damaged(index_.size(), "the file ends within an entry");
   }
 }
+
+bool TermVectorsReader::index_tells_terms_start() const { return format_ >= kWithTermsPointer; }
 
 void TermVectorsReader::Seek(uint64_t document) {
   index_.Seek(PointerOffset(document));
@@ -54,7 +56,7 @@ void TermVectorsReader::Seek(uint64_t document) {
                                                 ", but the documents' fields end at " +
                                                 std::to_string(documents_.size()));
   }
-  terms_start_ = format_ >= kWithTermsPointer ? static_cast<uint64_t>(index_.ReadLong()) : 0;
+  terms_start_ = index_tells_terms_start() ? static_cast<uint64_t>(index_.ReadLong()) : 0;
   list_start_ = pointer;
   documents_.Seek(pointer);
   const uint32_t count = documents_.ReadVInt();
@@ -86,7 +88,7 @@ void TermVectorsReader::ReadFieldNumbers(uint32_t count) {
 void TermVectorsReader::ReadTermsStarts() {
   terms_starts_.clear();
   if (list_.empty()) return;
-  if (format_ < kWithTermsPointer) terms_start_ = documents_.ReadVLong();
+  if (!index_tells_terms_start()) terms_start_ = documents_.ReadVLong();
   uint64_t start = terms_start_;
   for (size_t i = 0; i < list_.size(); ++i) {
     const uint64_t offset = documents_.offset();

@@ -46,7 +46,8 @@ class TermVectorsReader {
   TermVectorsReader(std::shared_ptr<const ByteSource> index, std::shared_ptr<const ByteSource> documents,
                     std::shared_ptr<const ByteSource> fields, uint32_t field_count);
 
-  int32_t format() const { return format_; }
+  // Whether .tvx tells where a document's first field begins in .tvf, be there one or not.
+  bool index_tells_terms_start() const;
   uint64_t documents() const { return (index_.size() - kHeader) / entry_size_; }
   const ByteReader& index() const { return index_; }
   const ByteReader& document_list() const { return documents_; }

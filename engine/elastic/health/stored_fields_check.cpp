@@ -38,8 +38,7 @@ void StoredFieldsCheck::CheckDocument(uint64_t document) {
       Refuse(Grade::kUnsafe, file, reader_.field_offset(),
              "field number below " + std::to_string(fields_.size()), std::to_string(reader_.number()));
     }
-    const uint8_t known = reader_.format() < 2 ? 0x07 : 0x03;
-    if ((reader_.flags() & ~known) != 0) {
+    if ((reader_.flags() & ~reader_.known_flags()) != 0) {
       Refuse(Grade::kUnsafe, file, reader_.field_offset(), "flags of a stored field",
              std::to_string(reader_.flags()));
     }

@@ -1,16 +1,11 @@
 #include "elastic/health/terms_check.h"
 
 #include "elastic/format/quoted.h"
+#include "elastic/format/skip_list.h"
 #include "elastic/format/text.h"
 #include "elastic/health/mismatch.h"
 
 namespace vantrel::elastic::health {
-namespace {
-
-// The writer allows 10, which is enough for any index.
-constexpr int32_t kMostSkipLevels = 32;
-
-}  // namespace
 
 TermsCheck::TermsCheck(const TermSources& sources, const std::vector<format::FieldInfo>& fields,
                        int32_t document_count)
@@ -25,27 +20,18 @@ TermsCheck::TermsCheck(const TermSources& sources, const std::vector<format::Fie
 }
 
 void TermsCheck::CheckHeaders() const {
-  const auto require_same = [&](const char* what, int32_t expected, int32_t found) {
-    if (expected == found) return;
-    Refuse(Grade::kUnsafe, index_.name(), 0,
-           std::string(what) + " " + std::to_string(expected) + ", as in the dictionary",
-           std::to_string(found));
-  };
   const int32_t levels = dictionary_.most_skip_levels();
-  if (levels < 1 || levels > kMostSkipLevels || dictionary_.skip_interval() < 2) {
-    Refuse(Grade::kUnsafe, dictionary_.name(), 0, "skip interval of 2 or more, and 1 to 32 skip levels",
+  if (levels < 1 || levels > format::kMostSkipLevels || dictionary_.skip_interval() < 2) {
+    Refuse(Grade::kUnsafe, dictionary_.name(), 0,
+           "skip interval of 2 or more, and 1 to " + std::to_string(format::kMostSkipLevels) + " skip levels",
            "interval " + std::to_string(dictionary_.skip_interval()) + ", " + std::to_string(levels) +
                " levels");
   }
-  require_same("format", dictionary_.format(), index_.format());
-  if (dictionary_.format() < -1) {
-    require_same("index interval", dictionary_.index_interval(), index_.index_interval());
-    require_same("skip interval", dictionary_.skip_interval(), index_.skip_interval());
-    require_same("skip levels", dictionary_.most_skip_levels(), index_.most_skip_levels());
-  }
-  const auto interval = static_cast<uint64_t>(dictionary_.index_interval());
-  const uint64_t entries = dictionary_.count() / interval + (dictionary_.count() % interval != 0 ? 1 : 0);
-  RequireEqual(Grade::kUnsafe, index_.name(), 0, "index entries", entries, index_.count());
+  const auto conflict = FindHeaderConflict(dictionary_, index_);
+  if (!conflict.has_value()) return;
+  Refuse(Grade::kUnsafe, index_.name(), 0,
+         conflict->what + (" " + std::to_string(conflict->in_dictionary)) + ", by the dictionary",
+         std::to_string(conflict->in_index));
 }
 
 void TermsCheck::Run() {
@@ -110,7 +96,7 @@ void TermsCheck::CheckIndexEntry() {
   RequireEqual(Grade::kUnsafe, file, index_.offset(), "document frequency",
                static_cast<uint64_t>(info_before_.document_frequency),
                static_cast<uint64_t>(info.document_frequency));
-  if (dictionary_.format() < -1) {
+  if (dictionary_.index_repeats_skips()) {
     RequireEqual(Grade::kUnsafe, file, index_.offset(), "offset of skip data", info_before_.skip_offset,
                  info.skip_offset);
   }

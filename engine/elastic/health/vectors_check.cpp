@@ -6,12 +6,6 @@
 #include "elastic/health/mismatch.h"
 
 namespace vantrel::elastic::health {
-namespace {
-
-// Since this format the index tells where a document's terms begin, even where it has none.
-constexpr int32_t kWithTermsPointer = 3;
-
-}  // namespace
 
 VectorsCheck::VectorsCheck(const VectorSources& sources, const std::vector<format::FieldInfo>& fields,
                            const StoreSlice& slice)
@@ -33,7 +27,7 @@ void VectorsCheck::Run() {
     list_end_ = reader_.list_end();
     if (!reader_.fields().empty()) {
       terms_end_ = reader_.terms_end();
-    } else if (reader_.format() >= kWithTermsPointer) {
+    } else if (reader_.index_tells_terms_start()) {
       terms_end_ = reader_.terms_start();
     }
     knows_ends_ = true;
@@ -46,7 +40,7 @@ void VectorsCheck::CheckStart(uint64_t document) const {
   const uint64_t offset = reader_.PointerOffset(slice_.first + document);
   RequireEqual(Grade::kUnsafe, reader_.index().name(), offset, "the document's fields at", list_end_,
                reader_.list_start());
-  if (reader_.format() < kWithTermsPointer && reader_.fields().empty()) return;
+  if (!reader_.index_tells_terms_start() && reader_.fields().empty()) return;
   RequireEqual(Grade::kUnsafe, reader_.index().name(), offset, "the document's terms at", terms_end_,
                reader_.terms_start());
 }

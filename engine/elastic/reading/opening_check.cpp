@@ -6,8 +6,11 @@
 #include <utility>
 
 #include "elastic/format/byte_reader.h"
+#include "elastic/format/commit.h"
+#include "elastic/format/field_infos.h"
 #include "elastic/format/file_names.h"
 #include "elastic/format/quoted.h"
+#include "elastic/format/term_cursor.h"
 #include "elastic/format/text.h"
 #include "elastic/reading/term_place.h"
 #include "vantrel/elastic/index_error.h"
@@ -18,13 +21,8 @@ namespace {
 using format::ByteReader;
 using format::SegmentInfo;
 
-// The newest versions that the library knows; it refuses newer ones before it reads on.
-constexpr int32_t kCommitFormat = -9;
-constexpr int32_t kFieldsFormat = -2;
-constexpr int32_t kTermsFormat = -4;
-
 // Runs the check of a file that the library will read in the same order: where the file ends too early, it will find
-// that out itself.
+// that out itself. Formats newer than it knows, which the checks pass over, it refuses before it reads on.
 template <typename Check>
 void ReadAlong(Check check) {
   try {
@@ -111,7 +109,7 @@ void OpeningCheck::Check(const std::string& name, const Source& source) {
 void OpeningCheck::CheckCommit(const Source& source, int64_t generation) {
   segments_.clear();
   current_ = nullptr;
-  if (FirstInt(source) < kCommitFormat) return;
+  if (FirstInt(source) < format::kNewestCommitFormat) return;
   format::Commit commit = ReadCommit(source, generation, format::CommitChecksum::kPassOver);
   std::set<std::string> names;
   int64_t documents = 0;
@@ -143,11 +141,11 @@ void OpeningCheck::CheckFields(const Source& source) {
   ByteReader start(source, 16);
   if (start.remaining() == 0) return;
   const auto format = static_cast<int32_t>(start.ReadVInt());
-  if (format < 0 && format != kFieldsFormat) return;
+  if (format < 0 && format != format::kFieldInfosFormat) return;
   try {
     current_->fields = format::ReadFieldInfos(source);
   } catch (const format::EndOfFileError& error) {
-    if (format == kFieldsFormat) throw;
+    if (format == format::kFieldInfosFormat) throw;
     // The library would try again as if it were of a still older layout.
     start.Damaged(error.offset(), "the fields go on past the end of the file");
   }
@@ -165,13 +163,13 @@ void OpeningCheck::CheckFields(const Source& source) {
 }
 
 void OpeningCheck::CheckDictionary(const Source& source) const {
-  if (FirstInt(source) < kTermsFormat) return;
+  if (FirstInt(source) < format::TermCursor::kNewestFormat) return;
   format::TermCursor(source, format::TermCursor::File::kDictionary,
                      static_cast<uint32_t>(current_->fields.size()), current_->info.document_count);
 }
 
 void OpeningCheck::CheckTermsIndex(const Source& source) {
-  if (FirstInt(source) < kTermsFormat) return;
+  if (FirstInt(source) < format::TermCursor::kNewestFormat) return;
   current_->place = FindPlace(source, current_->fields, current_->info.document_count, term_);
 }
 

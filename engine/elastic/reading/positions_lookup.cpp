@@ -23,9 +23,6 @@ using format::TermInfo;
 
 constexpr size_t kBufferSize = 4096;
 
-// The writer allows 10, which is enough for any index.
-constexpr int32_t kMostSkipLevels = 32;
-
 // The lookup in one segment.
 class SegmentLookup {
  public:
@@ -122,7 +119,7 @@ class SegmentLookup {
         interval > 1
             ? static_cast<int32_t>(std::floor(std::log(info.document_frequency) / std::log(interval)))
             : 0;
-    if (interval > 1 && most >= 1 && most <= kMostSkipLevels && by_division == by_logarithm) return;
+    if (interval > 1 && most >= 1 && most <= format::kMostSkipLevels && by_division == by_logarithm) return;
     throw IndexDamagedError(dictionary_.name(), 0,
                             "skip interval " + std::to_string(interval) + " and " + std::to_string(most) +
                                 " skip levels cannot be read");

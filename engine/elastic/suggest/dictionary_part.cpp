@@ -6,21 +6,10 @@ namespace vantrel::elastic {
 namespace {
 
 void CheckHeaders(const format::TermCursor& dictionary, const format::TermCursor& index) {
-  const auto require_same = [&](const char* what, int64_t in_dictionary, int64_t in_index) {
-    if (in_dictionary == in_index) return;
-    std::string problem = what;
-    problem.append(" is ").append(std::to_string(in_index));
-    problem.append(", but by the dictionary it is ").append(std::to_string(in_dictionary));
-    index.Damaged(problem);
-  };
-  require_same("format", dictionary.format(), index.format());
-  if (HasSkipOffset(dictionary)) {
-    require_same("index interval", dictionary.index_interval(), index.index_interval());
-    require_same("skip interval", dictionary.skip_interval(), index.skip_interval());
-  }
-  const auto interval = static_cast<uint64_t>(dictionary.index_interval());
-  const uint64_t entries = dictionary.count() / interval + (dictionary.count() % interval != 0 ? 1 : 0);
-  require_same("number of entries", static_cast<int64_t>(entries), static_cast<int64_t>(index.count()));
+  const auto conflict = FindHeaderConflict(dictionary, index);
+  if (!conflict.has_value()) return;
+  index.Damaged(conflict->what + (" is " + std::to_string(conflict->in_index)) +
+                ", but by the dictionary it is " + std::to_string(conflict->in_dictionary));
 }
 
 // Follows the index up to the terms that are looked for.
@@ -68,7 +57,8 @@ class PartFinder {
   };
 
   void AddEntry(int32_t field, Fingerprint& entries) const {
-    entries.Add(index_.text(), field, index_.info(), HasSkipOffset(index_), index_.dictionary_pointer());
+    entries.Add(index_.text(), field, index_.info(), index_.index_repeats_skips(),
+                index_.dictionary_pointer());
   }
 
   // Where no entry but the first is before the terms, the dictionary is read from its begin.
@@ -105,9 +95,6 @@ void Fingerprint::Add(std::string_view text, int32_t field, const format::TermIn
   if (has_skip_offset) Mix(info.skip_offset);
   Mix(dictionary_pointer);
 }
-
-// The layouts before hold it in the dictionary alone.
-bool HasSkipOffset(const format::TermCursor& cursor) { return cursor.format() < -1; }
 
 std::vector<DictionaryPart> FindDictionaryParts(const format::TermCursor& dictionary,
                                                 format::TermCursor& index, const TermOrder& order) {

@@ -50,7 +50,4 @@ struct DictionaryPart {
 std::vector<DictionaryPart> FindDictionaryParts(const format::TermCursor& dictionary,
                                                 format::TermCursor& index, const TermOrder& order);
 
-// Whether entries of the index tell the skip offset of their term.
-bool HasSkipOffset(const format::TermCursor& cursor);
-
 }  // namespace vantrel::elastic

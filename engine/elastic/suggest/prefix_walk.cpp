@@ -70,7 +70,8 @@ bool PrefixWalk::Advance() {
 void PrefixWalk::CheckEntry() {
   if (number_ % static_cast<uint64_t>(cursor_.index_interval()) != 0) return;
   if (number_ == part_.begin_number && number_ != 0) return;
-  entries_.Add(passed_.text(), passed_.field(), passed_.info(), HasSkipOffset(cursor_), cursor_.offset());
+  entries_.Add(passed_.text(), passed_.field(), passed_.info(), cursor_.index_repeats_skips(),
+               cursor_.offset());
 }
 
 void PrefixWalk::CheckEntries() const {

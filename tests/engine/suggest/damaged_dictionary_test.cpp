@@ -122,6 +122,7 @@ TEST_F(LettersTest, HeadersThatContradictEachOtherAreDamage) {
                      "number of entries is 3, but by the dictionary it is 4"},
            std::pair{ByteWriter().Int(-4).Long(4).Int(3).Int(16).Int(10), "index interval is 3"},
            std::pair{ByteWriter().Int(-4).Long(4).Int(2).Int(17).Int(10), "skip interval is 17"},
+           std::pair{ByteWriter().Int(-4).Long(4).Int(2).Int(16).Int(9), "number of skip levels is 9"},
            std::pair{ByteWriter().Int(-3).Long(4).Int(2).Int(16).Int(10), "format is -3"},
        }) {
     std::string index = Index("dhl");
