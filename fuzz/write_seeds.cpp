@@ -160,6 +160,26 @@ void AddSkipsAndPositions(const Corpus& corpus) {
   }
 }
 
+// Postings of numbers of one byte to five, enough of them to be decoded in blocks.
+void AddLongPostings(const Corpus& corpus) {
+  constexpr int kDocuments = 400;
+  for (const bool omits_frequencies : {false, true}) {
+    ByteWriter postings = ByteWriter().Byte(omits_frequencies ? 1 : 0).Byte(0xff).Byte(0xff);
+    postings.Byte(kDocuments & 0xff).Byte(kDocuments >> 8).Byte(0);
+    for (int document = 0; document < kDocuments; ++document) {
+      const int distance = document % 100 == 99 ? 9000 : 1 + document % 90;
+      if (omits_frequencies) {
+        postings.VInt(distance);
+      } else if (document % 3 == 0) {
+        postings.VInt(int64_t{2} * distance).VInt(document % 60 == 0 ? int64_t{1} << 29 : 2 + document);
+      } else {
+        postings.VInt(int64_t{2} * distance + 1);
+      }
+    }
+    corpus.Add("postings", omits_frequencies ? "long-omitted" : "long", postings.bytes());
+  }
+}
+
 void AddManifests(const Corpus& corpus) {
   const std::string digest = " 0123456789abcdef";
   corpus.Add("manifest", "files",
@@ -217,6 +237,7 @@ int main(int argc, char** argv) {
   AddIndex(corpus, {.seed = 1, .documents = 12, .deletions = 3, .compound = false, .term_index_interval = 3},
            "plain");
   AddIndex(corpus, {.seed = 2, .documents = 5, .deletions = 3}, "compound");
+  AddLongPostings(corpus);
   AddManifests(corpus);
   AddOlderLayouts(corpus);
   AddWholeIndexes(corpus);
