@@ -71,6 +71,11 @@ TEST_F(ServiceUnits, LeaveRoomForTheMostThreadsThatTheDaemonTakes) {
   EXPECT_GT(std::atoi(unit.c_str() + place + key.size()), 3 * 256 + 16);
 }
 
+TEST_F(ServiceUnits, LetTheDaemonOutliveAProcessOfItsOwnThatMemoryRunsOutFor) {
+  EXPECT_THAT(SplitLines(Installed("usr/lib/systemd/system/quorelasticd.service")),
+              ::testing::Contains("OOMPolicy=continue"));
+}
+
 TEST_F(ServiceUnits, ListenWhereTheToolConnectsAndForTheGroupAlone) {
   const auto lines = SplitLines(Installed("usr/lib/systemd/system/quorelasticd.socket"));
   for (const char* line :
@@ -105,7 +110,7 @@ TEST_F(ServiceUnits, AConfigurationThatIsThereAlreadyStays) {
   EXPECT_EQ(ReadFile(prefix / "etc/default/quorelasticd"), "QUORELASTICD_OPTIONS=--verbose\n");
 }
 
-TEST_F(ServiceUnits, TheFoldersAreTheGroupsAsFarAsItNeedsThemAndAChangedModeStays) {
+TEST_F(ServiceUnits, TheFoldersAreTheGroupsAsFarAsItNeedsThemAndAChangedModeOfTheImportFolderStays) {
   // The file's lines with a user that there is on this machine, whose owner need not be set.
   const std::string root = root_.path();
   const std::string id = std::to_string(geteuid());

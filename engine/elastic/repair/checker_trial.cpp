@@ -67,6 +67,10 @@ bool SurvivesTrial(uint64_t index_bytes, const std::function<void()>& operation)
     if (errno != EINTR)
       throw std::system_error(errno, std::generic_category(), "cannot wait for a child process");
   }
+  // Nothing of ours sends that. Somebody wanted its memory, or its end; of the operation it tells nothing.
+  if (WIFSIGNALED(status) && WTERMSIG(status) == SIGKILL) {
+    throw std::system_error(ECANCELED, std::generic_category(), "a child process was killed");
+  }
   return WIFEXITED(status) && WEXITSTATUS(status) == 0;
 }
 
