@@ -1,7 +1,6 @@
 #include "damage/limited_run.h"
 
 #include <sys/mman.h>
-#include <sys/resource.h>
 #include <sys/wait.h>
 #include <unistd.h>
 
@@ -9,13 +8,11 @@
 #include <stdexcept>
 #include <system_error>
 
+#include "support/child_limits.h"
 #include "support/sanitized.h"
 
 namespace quorelastic::testing {
 namespace {
-
-constexpr rlim_t kMostMemory = rlim_t{2} << 30;
-constexpr unsigned kMostSeconds = 10;
 
 // A file in memory that takes what the program prints.
 class Capture {
@@ -42,13 +39,9 @@ class Capture {
 };
 
 [[noreturn]] void BecomeProgram(std::vector<char*> arguments, const Capture& output, const Capture& errors) {
-  const rlimit no_core = {0, 0};
-  setrlimit(RLIMIT_CORE, &no_core);
-  const rlimit memory = {kMostMemory, kMostMemory};
-  if (!kIsSanitized) setrlimit(RLIMIT_AS, &memory);
   dup2(output.descriptor(), STDOUT_FILENO);
   dup2(errors.descriptor(), STDERR_FILENO);
-  alarm(kMostSeconds);
+  LimitChild();
   execv(arguments[0], arguments.data());
   _exit(127);
 }

@@ -2,7 +2,6 @@
 
 #include <fcntl.h>
 #include <lucene++/LuceneHeaders.h>
-#include <sys/resource.h>
 #include <sys/wait.h>
 #include <unistd.h>
 
@@ -14,13 +13,11 @@
 #include <lucene++/CheckIndex.h>
 #include <lucene++/SegmentInfos.h>
 
-#include "support/sanitized.h"
+#include "support/child_limits.h"
 
 namespace quorelastic::testing {
 namespace {
 
-constexpr rlim_t kMostMemory = rlim_t{2} << 30;
-constexpr unsigned kMostSeconds = 10;
 constexpr int kCleanStatus = 0;
 constexpr int kNotCleanStatus = 1;
 constexpr int kThrewStatus = 2;
@@ -38,14 +35,10 @@ int Check(const std::string& path) {
 
 [[noreturn]] void RunChecker(const std::string& path) {
   for (const int signal : {SIGSEGV, SIGABRT, SIGBUS, SIGFPE}) std::signal(signal, SIG_DFL);
-  const rlimit no_core = {0, 0};
-  setrlimit(RLIMIT_CORE, &no_core);
-  const rlimit memory = {kMostMemory, kMostMemory};
-  if (!kIsSanitized) setrlimit(RLIMIT_AS, &memory);
   // What the C library says of a corrupt heap belongs to nobody.
   const int nothing = open("/dev/null", O_WRONLY | O_CLOEXEC);
   dup2(nothing, STDERR_FILENO);
-  alarm(kMostSeconds);
+  LimitChild();
   _exit(Check(path));
 }
 
