@@ -1,6 +1,6 @@
 # Where things are installed, in components that bear the names of the packages. Libraries go where Debian looks for
 # them, under /usr/local too: into the folder of the architecture.
-set(CMAKE_INSTALL_LIBDIR "lib/${CMAKE_LIBRARY_ARCHITECTURE}" CACHE PATH "Libraries")
+set(CMAKE_INSTALL_LIBDIR "lib/${CMAKE_LIBRARY_ARCHITECTURE}" CACHE STRING "Libraries")
 include(GNUInstallDirs)
 include(CMakePackageConfigHelpers)
 set(CMAKE_INSTALL_DEFAULT_DIRECTORY_PERMISSIONS
