@@ -1,6 +1,7 @@
 #include "elastic/index/settings_file.h"
 
 #include <cstddef>
+#include <optional>
 #include <set>
 #include <span>
 #include <stdexcept>
@@ -113,48 +114,50 @@ std::string ReadWholeFile(const std::string& folder) {
   return text;
 }
 
-void CheckIdField(const std::string& folder, const IndexSettings& settings) {
+// What is wrong, if anything is. Whose fault that is depends on where the settings are from.
+using Problem = std::optional<std::string>;
+
+Problem FindIdFieldProblem(const IndexSettings& settings) {
   for (const FieldSettings& field : settings.fields) {
     if (field.name != settings.id_field) continue;
-    if (!field.pre_processors.empty()) {
-      throw IndexValueError(folder, "the id field " + format::Quoted(field.name) + " has pre-processors");
-    }
-    if (field.type == FieldType::kKeyword && field.stored) return;
-    throw IndexValueError(folder, "the id field " + format::Quoted(field.name) + " is no stored keyword");
+    if (!field.pre_processors.empty())
+      return "the id field " + format::Quoted(field.name) + " has pre-processors";
+    if (field.type == FieldType::kKeyword && field.stored) return std::nullopt;
+    return "the id field " + format::Quoted(field.name) + " is no stored keyword";
   }
-  throw IndexValueError(folder, "the settings lack the id field " + format::Quoted(settings.id_field));
+  return "the settings lack the id field " + format::Quoted(settings.id_field);
 }
 
-void CheckPreProcessors(const std::string& folder, const FieldSettings& field) {
+Problem FindPreProcessorProblem(const FieldSettings& field) {
   try {
     BuildPreProcChain(field.pre_processors);
   } catch (const std::invalid_argument& error) {
-    throw IndexValueError(folder, "field " + format::Quoted(field.name) + ": " + error.what());
+    return "field " + format::Quoted(field.name) + ": " + error.what();
   }
-  if (!field.frequencies && MakesPhrases(field.pre_processors)) {
-    throw IndexValueError(folder,
-                          "field " + format::Quoted(field.name) +
-                              ": \"ngram\" needs frequencies: a word is found as a phrase of its grams");
+  if (field.frequencies || !MakesPhrases(field.pre_processors)) return std::nullopt;
+  return "field " + format::Quoted(field.name) +
+         ": \"ngram\" needs frequencies: a word is found as a phrase of its grams";
+}
+
+Problem FindProblem(const IndexSettings& settings) {
+  if (settings.fields.empty()) return "the settings have no field";
+  std::set<std::string_view> names;
+  for (const FieldSettings& field : settings.fields) {
+    if (field.name.empty()) return "the settings have a field without a name";
+    std::wstring wide;
+    if (const char* problem = ToIndexText(field.name, wide))
+      return "the field name " + format::Quoted(field.name) + " " + problem;
+    if (!names.insert(field.name).second)
+      return "the settings have two fields of the name " + format::Quoted(field.name);
+    if (Problem problem = FindPreProcessorProblem(field)) return problem;
   }
+  return FindIdFieldProblem(settings);
 }
 
 }  // namespace
 
 void CheckSettings(const std::string& folder, const IndexSettings& settings) {
-  if (settings.fields.empty()) throw IndexValueError(folder, "the settings have no field");
-  std::set<std::string_view> names;
-  for (const FieldSettings& field : settings.fields) {
-    if (field.name.empty()) throw IndexValueError(folder, "the settings have a field without a name");
-    std::wstring wide;
-    if (const char* problem = ToIndexText(field.name, wide)) {
-      throw IndexValueError(folder, "the field name " + format::Quoted(field.name) + " " + problem);
-    }
-    if (!names.insert(field.name).second) {
-      throw IndexValueError(folder, "the settings have two fields of the name " + format::Quoted(field.name));
-    }
-    CheckPreProcessors(folder, field);
-  }
-  CheckIdField(folder, settings);
+  if (const Problem problem = FindProblem(settings)) throw IndexValueError(folder, *problem);
 }
 
 void WriteSettings(const std::string& folder, const IndexSettings& settings) {
@@ -196,7 +199,7 @@ IndexSettings ReadSettings(const std::string& folder) {
     settings.fields.push_back(ReadField(path, field, settings.fields.size() + 1));
   }
   object.RefuseOthers();
-  CheckSettings(path, settings);
+  if (const Problem problem = FindProblem(settings)) throw IndexError(path, *problem);
   return settings;
 }
 

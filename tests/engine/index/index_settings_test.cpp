@@ -108,6 +108,8 @@ class SettingsFileTest : public ::testing::Test {
   std::string Problem() const {
     try {
       Index::Open(folder_.path());
+    } catch (const IndexValueError& error) {
+      ADD_FAILURE() << "blames the call: " << error.what();
     } catch (const IndexError& error) {
       EXPECT_THAT(error.what(), StartsWith(file() + ": "));
       return std::string(error.what()).substr(file().size() + 2);
@@ -190,6 +192,14 @@ TEST_F(SettingsFileTest, WithAnUnknownMemberIsRefused) {
 TEST_F(SettingsFileTest, WithFieldsThatContradictEachOtherIsRefused) {
   settings()["fields"].append(settings()["fields"][0]);
   EXPECT_EQ(ProblemWithSettings(), "the settings have two fields of the name \"id\"");
+}
+
+TEST_F(SettingsFileTest, WithAPreProcessorThatIsNoneIsRefused) {
+  JsonValue step(Json::objectValue);
+  step["name"] = "stem";
+  step["argument"] = "";
+  settings()["fields"][1]["pre_processors"].append(step);
+  EXPECT_THAT(ProblemWithSettings(), StartsWith("field \"body\": "));
 }
 
 }  // namespace
