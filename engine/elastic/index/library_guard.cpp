@@ -35,6 +35,10 @@ bool LibraryGuard::Identity::operator==(const Identity& other) const {
          changed.tv_sec == other.changed.tv_sec && changed.tv_nsec == other.changed.tv_nsec;
 }
 
+bool LibraryGuard::KnownFile::Is(const Identity& file) const {
+  return identity.has_value() ? *identity == file : is_written_here;
+}
+
 int64_t LibraryGuard::AdmitNewestCommit() {
   const std::lock_guard lock(admission_mutex_);
   const format::DiskFolder folder(folder_);
@@ -72,14 +76,21 @@ bool LibraryGuard::AdmitByManifest(const format::Folder& folder, const format::C
   if (manifest_.has_value() && manifest_->BelongsTo(folder, commit)) return true;
   std::optional<format::Manifest> manifest = format::FindManifest(folder, commit);
   if (!manifest.has_value()) return false;
-  // The library takes some files for such as were never written where they are missing.
-  for (const format::Manifest::File& file : manifest->files) RequireSize(*folder.Open(file.name), file);
+  Identities files;
+  for (const format::Manifest::File& file : manifest->files) {
+    // The library takes some files for such as were never written where they are missing.
+    RequireSize(*folder.Open(file.name), file);
+    files.emplace(file.name, Identify(file.name));
+  }
   Take(*manifest);
   manifest_ = std::move(manifest);
+  KeepOnly(files);
+  // So that it is seen where another takes the place of a file that was never opened.
   const std::lock_guard lock(files_mutex_);
-  std::erase_if(files_, [this](const auto& entry) {
-    return !entry.second.is_written_here && manifest_->Find(entry.first) == nullptr;
-  });
+  for (auto& [name, known] : files_) {
+    const auto identity = files.find(name);
+    if (identity != files.end() && !known.identity.has_value()) known.identity = identity->second;
+  }
   return true;
 }
 
@@ -87,20 +98,17 @@ void LibraryGuard::AdmitUnknownSegments(const format::Folder& folder, const form
   manifest_.reset();
   format::Commit unknown = commit;
   unknown.segments.clear();
-  std::map<std::string, Identity> files;
+  Identities files;
   for (const format::SegmentInfo& segment : commit.segments) {
     // As they are before the check: who changes one meanwhile makes it unknown.
-    std::map<std::string, Identity> of_segment = IdentifyAll(format::FilesOf(folder, segment));
-    if (Knows(of_segment)) continue;
-    unknown.segments.push_back(segment);
+    Identities of_segment = IdentifyAll(format::FilesOf(folder, segment));
+    if (!Knows(of_segment)) unknown.segments.push_back(segment);
     files.merge(of_segment);
   }
-  if (unknown.segments.empty()) return;
+  if (unknown.segments.empty()) return KeepOnly(files);
   CheckSegments(folder, unknown);
-  {
-    const std::lock_guard lock(files_mutex_);
-    for (const auto& [name, identity] : files) files_.try_emplace(name, KnownFile{.identity = identity});
-  }
+  NoteChecked(files);
+  KeepOnly(files);
   // It may have come meanwhile.
   AdmitByManifest(folder, commit);
 }
@@ -145,19 +153,35 @@ LibraryGuard::Identity LibraryGuard::Identify(const std::string& name) const {
   return {status.st_dev, status.st_ino, status.st_size, status.st_mtim};
 }
 
-std::map<std::string, LibraryGuard::Identity> LibraryGuard::IdentifyAll(
-    const std::set<std::string>& names) const {
-  std::map<std::string, Identity> files;
+LibraryGuard::Identities LibraryGuard::IdentifyAll(const std::set<std::string>& names) const {
+  Identities files;
   for (const std::string& name : names) files.emplace(name, Identify(name));
   return files;
 }
 
-bool LibraryGuard::Knows(const std::map<std::string, Identity>& files) const {
+bool LibraryGuard::Knows(const Identities& files) const {
   const std::lock_guard lock(files_mutex_);
   return std::all_of(files.begin(), files.end(), [this](const auto& file) {
     const auto known = files_.find(file.first);
-    if (known == files_.end()) return false;
-    return !known->second.identity.has_value() || *known->second.identity == file.second;
+    return known != files_.end() && known->second.Is(file.second);
+  });
+}
+
+// What was known already stays, with its digests.
+void LibraryGuard::NoteChecked(const Identities& files) {
+  const std::lock_guard lock(files_mutex_);
+  for (const auto& [name, identity] : files) {
+    const auto known = files_.find(name);
+    if (known != files_.end() && known->second.Is(identity)) continue;
+    files_.insert_or_assign(name, KnownFile{.identity = identity});
+  }
+}
+
+// Readers of an older commit have their files open by now.
+void LibraryGuard::KeepOnly(const Identities& files) {
+  const std::lock_guard lock(files_mutex_);
+  std::erase_if(files_, [&](const auto& entry) {
+    return !entry.second.is_written_here && !files.contains(entry.first);
   });
 }
 

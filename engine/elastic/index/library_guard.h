@@ -68,7 +68,12 @@ class LibraryGuard {
     bool operator==(const Identity& other) const;
   };
 
+  using Identities = std::map<std::string, Identity>;  // by name
+
   struct KnownFile {
+    // Whether the file that bears the name now is this one.
+    bool Is(const Identity& file) const;
+
     std::shared_ptr<FileVerification> verification = std::make_shared<FileVerification>();
     std::optional<Identity> identity = {};  // nothing as long as it has not been opened
     bool is_written_here = false;           // and then it has no identity before it has digests
@@ -86,8 +91,10 @@ class LibraryGuard {
   void AdmitUnknownSegments(const format::Folder& folder, const format::Commit& commit);
   void CheckSegments(const format::Folder& folder, const format::Commit& commit);
   Identity Identify(const std::string& name) const;
-  std::map<std::string, Identity> IdentifyAll(const std::set<std::string>& names) const;
-  bool Knows(const std::map<std::string, Identity>& files) const;
+  Identities IdentifyAll(const std::set<std::string>& names) const;
+  bool Knows(const Identities& files) const;
+  void NoteChecked(const Identities& files);
+  void KeepOnly(const Identities& files);
   std::shared_ptr<FileVerification> Find(const std::string& name);
 
   const std::string folder_;

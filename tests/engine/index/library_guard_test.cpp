@@ -3,6 +3,7 @@
 #include <gtest/gtest.h>
 
 #include <filesystem>
+#include <string>
 #include <vector>
 
 #include "read_back.h"
@@ -50,6 +51,27 @@ class LibraryGuardTest : public ::testing::Test {
     std::filesystem::rename(Segment() + ".new", Segment());
   }
 
+  // Without a change of anything by which a file is known again: only who reads it sees.
+  void DamageUnseen() const {
+    const auto changed = std::filesystem::last_write_time(Segment());
+    WriteFile(Segment(), Damaged());
+    std::filesystem::last_write_time(Segment(), changed);
+  }
+
+  // Replaces the index by a whole one with a file of the same name, as its third commit and without a manifest.
+  // Returns what the file holds.
+  std::string PutAnotherIndexInPlace() const {
+    const std::string other = folder_ / "other";
+    const auto index = Index::Create(other, ::quorelastic::testing::IdAndBody());
+    index->Add(MakeDocument("b", "a longer word"));
+    index->Commit();
+    std::filesystem::remove(Manifest());
+    const std::string bytes = ReadFile(other + "/_0.cfs");
+    PutInPlace(bytes);
+    WriteFile(path_ + "/segments_3", ReadFile(other + "/segments_2"));
+    return bytes;
+  }
+
   std::string Read(const std::string& name = "_0.cfs") {
     const auto file = guard_.Open(name);
     std::string bytes(file->size(), '\0');
@@ -95,6 +117,42 @@ TEST_F(LibraryGuardTest, ChecksAFileAnewThatTookAnothersPlaceWhereThereIsNoManif
   EXPECT_EQ(Read(), whole_);
   PutInPlace(Damaged());
   ExpectIndexError(kUnsafe, [&] { Read(); });
+}
+
+TEST_F(LibraryGuardTest, ChecksAFileThatTookAnothersPlaceButOnce) {
+  std::filesystem::remove(Manifest());
+  EXPECT_EQ(guard_.AdmitNewestCommit(), 2);
+  PutInPlace(whole_);
+  EXPECT_EQ(guard_.AdmitNewestCommit(), 2);
+  DamageUnseen();
+  EXPECT_EQ(guard_.AdmitNewestCommit(), 2);
+}
+
+TEST_F(LibraryGuardTest, HandsOutWhatPassedTheCheckThoughAnOlderManifestHadAnotherFileOfThatName) {
+  EXPECT_EQ(guard_.AdmitNewestCommit(), 2);
+  Read();
+  const std::string another = PutAnotherIndexInPlace();
+  EXPECT_EQ(guard_.AdmitNewestCommit(), 3);
+  EXPECT_EQ(Read(), another);
+}
+
+TEST_F(LibraryGuardTest, ChecksWhatHasNoManifestThoughAnOlderOneHadAFileOfThatName) {
+  EXPECT_EQ(guard_.AdmitNewestCommit(), 2);
+  const std::string another = PutAnotherIndexInPlace();
+  EXPECT_EQ(guard_.AdmitNewestCommit(), 3);
+  EXPECT_EQ(Read(), another);
+  PutInPlace(Damaged());
+  ExpectIndexError(kUnsafe, [&] { guard_.AdmitNewestCommit(); });
+}
+
+TEST_F(LibraryGuardTest, ForgetsTheFilesThatTheNewestCommitDoesNotHave) {
+  std::filesystem::remove(Manifest());
+  EXPECT_EQ(Read(), whole_);
+  const std::string empty = folder_ / "empty";
+  Index::Create(empty, ::quorelastic::testing::IdAndBody());
+  WriteFile(path_ + "/segments_3", ReadFile(empty + "/segments_1"));
+  EXPECT_EQ(guard_.AdmitNewestCommit(), 3);
+  ExpectIndexError("neither of the newest commit nor of its manifest", [&] { Read(); });
 }
 
 TEST_F(LibraryGuardTest, TakesAManifestThatComesLate) {
