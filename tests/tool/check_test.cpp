@@ -10,8 +10,10 @@
 #include <string>
 #include <thread>
 
+#include "support/byte_writer.h"
 #include "support/files.h"
 #include "support/sandbox_test.h"
+#include "support/sanitized.h"
 #include "tool/inspection.h"
 #include "tool/outcome.h"
 
@@ -106,6 +108,21 @@ TEST_F(CheckTest, NeedsLittleMemory) {
   if (run.err.find("Sanitizer") != std::string::npos)
     GTEST_SKIP() << "a sanitizer needs more memory than the limit";
   EXPECT_THAT(run, Clean());
+}
+
+// Each segment takes memory as long as it is under way, also where none of its files is there.
+TEST_F(CheckTest, NeedsLittleMemoryForManySegmentsWithoutFiles) {
+  constexpr int kSegments = 30'000;
+  ByteWriter commit;
+  commit.Int(-4).Long(1).Int(kSegments).Int(kSegments);
+  for (int number = 0; number < kSegments; ++number) {
+    commit.String("_" + std::to_string(number)).Int(1);
+    commit.Long(-1).Int(-1).Byte(1).Int(-1).Byte(-1);  // nothing deleted, nothing shared, no compound file
+  }
+  WriteFile(folder_ / "segments_1", commit.bytes());
+  const RunOptions limited{.limits = {{RLIMIT_AS, rlim_t{256} << 20}}};
+  if (kIsSanitized) GTEST_SKIP() << "a sanitizer needs more memory than the limit";
+  EXPECT_THAT(Inspect("check", folder_.path(), {}, limited), NotClean());
 }
 
 TEST_F(CheckTest, IsNotMistakenBesideABusyWriter) {

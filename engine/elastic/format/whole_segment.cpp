@@ -44,10 +44,9 @@ void RethrowOpening(const IndexError& error) {
 }
 
 WholeSegment::Slot WholeSegment::OpenPlain(const Folder& folder, const std::string& name) {
+  ++files_tried_;
   try {
-    auto source = folder.Open(name);
-    ++open_files_;
-    return {std::move(source), nullptr};
+    return {folder.Open(name), nullptr};
   } catch (const IndexIoError& error) {
     if (!IsMissingError(error)) throw;
     return {nullptr, Missing(error)};

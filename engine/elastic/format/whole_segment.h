@@ -67,8 +67,8 @@ class WholeSegment {
   };
   std::vector<Compound> Compounds() const;
 
-  // How many files it holds open.
-  size_t open_files() const { return open_files_; }
+  // How many files it holds open, or could not open: one at least.
+  size_t files_tried() const { return files_tried_; }
 
  private:
   // A file or why it is not there.
@@ -93,7 +93,7 @@ class WholeSegment {
   std::optional<CompoundSlot> compound_;
   std::optional<CompoundSlot> store_;
   bool has_deletions_ = false;
-  size_t open_files_ = 0;
+  size_t files_tried_ = 0;
   std::string folder_path_;
 };
 

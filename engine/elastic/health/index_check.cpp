@@ -25,8 +25,8 @@ namespace vantrel::elastic::health {
 namespace {
 
 // Segments whose files are opened together, so that a writer cannot take them away: as many as stay below the usual
-// limit of open files.
-constexpr size_t kMostOpenFiles = 512;
+// limit of open files. Those that are missing count: why they are takes memory.
+constexpr size_t kMostFiles = 512;
 
 // How many newer commits are taken up before the index is given up as one that does not hold still.
 constexpr int kMostCommits = 100;
@@ -116,9 +116,9 @@ class CommitRun {
     meter_.SetSegments(commit_.segments.size());
     for (size_t next = 0; next < commit_.segments.size();) {
       std::vector<std::unique_ptr<SegmentCheck>> batch;
-      for (size_t open = 0; next < commit_.segments.size() && open < kMostOpenFiles; ++next) {
+      for (size_t files = 0; next < commit_.segments.size() && files < kMostFiles; ++next) {
         batch.push_back(std::make_unique<SegmentCheck>(folder_, commit_.segments[next]));
-        open += batch.back()->files().open_files();
+        files += batch.back()->files().files_tried();
         meter_.AddSegmentOpened();
       }
       RunBatch(batch);
