@@ -71,11 +71,12 @@ FileDigestCheck::Claimed FileDigestCheck::Claim(uint64_t block, uint64_t from, u
 
 void FileDigestCheck::Return(uint64_t block, uint64_t to, DigestPtr digest) {
   const std::lock_guard lock(mutex_);
-  done_[block] = static_cast<uint32_t>(to);
   if (to < LengthOf(block)) {
-    begun_[block] = std::move(digest);
+    begun_[block] = std::move(digest);  // first: where there is no memory for it, nobody goes on with it
+    done_[block] = static_cast<uint32_t>(to);
     return;
   }
+  done_[block] = static_cast<uint32_t>(to);
   const uint64_t found = digest->value();
   if (found == expected_.digests[block]) return;
   if (differing_++ > 0 && first_differing_ < block) return;

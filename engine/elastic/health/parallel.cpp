@@ -4,6 +4,7 @@
 #include <atomic>
 #include <exception>
 #include <mutex>
+#include <new>
 #include <system_error>
 #include <thread>
 
@@ -24,15 +25,17 @@ void RunParallel(const std::vector<std::function<void()>>& tasks, unsigned threa
       }
     }
   };
-  std::vector<std::thread> started;
+  std::vector<std::jthread> started;
   const size_t wanted = std::min<size_t>(threads, tasks.size());
+  // One thread suffices.
   try {
+    started.reserve(wanted);
     while (started.size() + 1 < wanted) started.emplace_back(work);
   } catch (const std::system_error&) {
-    // One thread suffices.
+  } catch (const std::bad_alloc&) {
   }
   work();
-  for (std::thread& thread : started) thread.join();
+  started.clear();  // joins
   if (failure != nullptr) std::rethrow_exception(failure);
 }
 
