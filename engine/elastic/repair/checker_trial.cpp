@@ -10,7 +10,8 @@
 #include <cerrno>
 #include <csignal>
 #include <limits>
-#include <system_error>
+
+#include "vantrel/elastic/index_error.h"
 
 namespace vantrel::elastic {
 namespace {
@@ -58,18 +59,17 @@ int32_t SecondsFor(uint64_t bytes) {
 
 }  // namespace
 
-bool SurvivesTrial(uint64_t index_bytes, const std::function<void()>& operation) {
+bool SurvivesTrial(const std::string& path, uint64_t index_bytes, const std::function<void()>& operation) {
   const pid_t child = fork();
-  if (child < 0) throw std::system_error(errno, std::generic_category(), "cannot start a child process");
+  if (child < 0) throw IndexIoError(path, "cannot start a process to try the index library in", errno);
   if (child == 0) RunTrial(operation, index_bytes);
   int status = 0;
   while (waitpid(child, &status, 0) < 0) {
-    if (errno != EINTR)
-      throw std::system_error(errno, std::generic_category(), "cannot wait for a child process");
+    if (errno != EINTR) throw IndexIoError(path, "cannot wait for the trial of the index library", errno);
   }
   // Nothing of ours sends that. Somebody wanted its memory, or its end; of the operation it tells nothing.
   if (WIFSIGNALED(status) && WTERMSIG(status) == SIGKILL) {
-    throw std::system_error(ECANCELED, std::generic_category(), "a child process was killed");
+    throw IndexIoError(path, "somebody killed the trial of the index library", ECANCELED);
   }
   return WIFEXITED(status) && WEXITSTATUS(status) == 0;
 }

@@ -68,7 +68,7 @@ struct UnsafeSegments {
 };
 
 bool CheckerSurvives(const std::string& path, const std::string& segment, uint64_t index_bytes) {
-  return SurvivesTrial(index_bytes, [&] {
+  return SurvivesTrial(path, index_bytes, [&] {
     auto only = Lucene::Collection<Lucene::String>::newInstance();
     only.add(Lucene::StringUtils::toUnicode(segment));
     const auto directory = Lucene::newLucene<CheckedDirectory>(path, std::set<std::string>());
@@ -106,7 +106,7 @@ class Checker {
     };
     // Reading past the end of a table ends well in one memory and badly in another: so it is rehearsed in this one, and
     // where that fails, segments are given up until it does not.
-    while (!unsafe.survived.empty() && !SurvivesTrial(unsafe.index_bytes, check)) {
+    while (!unsafe.survived.empty() && !SurvivesTrial(path_, unsafe.index_bytes, check)) {
       condemned_.insert(unsafe.survived.extract(unsafe.survived.begin()));
       directory_ = Lucene::newLucene<CheckedDirectory>(path_, condemned_);
     }
