@@ -44,7 +44,8 @@ void Meter::AddRead(uint64_t bytes) {
   const uint64_t read = read_ += bytes;
   if (!callback_) return;
   uint64_t told = told_;
-  if (read - told >= kStep && told_.compare_exchange_strong(told, read)) Tell();
+  // Another thread may have read, and told, more since.
+  if (read > told && read - told >= kStep && told_.compare_exchange_strong(told, read)) Tell();
 }
 
 void Meter::Tell() {
