@@ -22,7 +22,9 @@ class VANTREL_ELASTIC_EXPORT IndexError : public std::runtime_error {
 };
 
 // The operating system refused: what is asked for is missing, unreadable or of the wrong kind, the medium failed, no more
-// files can be opened. A file that is not there although the index refers to it is damage instead, a plain IndexError.
+// files can be opened. A file of a segment that is not there although the index refers to it is damage instead, a plain
+// IndexError, to what goes through the index library (searches, changes); what reads on its own, such as IndexInfo,
+// SuggestTerms and Index::Statistics, tells it by this.
 class VANTREL_ELASTIC_EXPORT IndexIoError : public IndexError {
  public:
   // `problem` says what could not be done; the text of `error_number` (an errno value) is added to it.
