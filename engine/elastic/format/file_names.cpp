@@ -43,6 +43,14 @@ bool IsSegmentName(std::string_view name) {
   return name.size() <= kMostDigits + 1 && name.starts_with('_') && IsBase36(name.substr(1));
 }
 
+bool IsCoreExtension(std::string_view extension) {
+  return std::find(kCoreExtensions.begin(), kCoreExtensions.end(), extension) != kCoreExtensions.end();
+}
+
+bool IsStoreExtension(std::string_view extension) {
+  return std::find(kStoreExtensions.begin(), kStoreExtensions.end(), extension) != kStoreExtensions.end();
+}
+
 std::string_view SegmentOfFile(std::string_view name) {
   return name.starts_with('_') ? name.substr(0, name.find_first_of("._", 1)) : std::string_view();
 }

@@ -1,5 +1,6 @@
 #pragma once
 
+#include <array>
 #include <cstddef>
 #include <cstdint>
 #include <optional>
@@ -19,6 +20,12 @@ namespace vantrel::elastic::format {
 inline constexpr std::string_view kSegments = "segments";
 inline constexpr std::string_view kSegmentsGen = "segments.gen";
 
+// What a segment may have of its own beside single norms and deletions, and what its document store has, which it may
+// share with others.
+inline constexpr std::array<std::string_view, 6> kCoreExtensions = {".fnm", ".tis", ".tii",
+                                                                    ".frq", ".prx", ".nrm"};
+inline constexpr std::array<std::string_view, 5> kStoreExtensions = {".fdx", ".fdt", ".tvx", ".tvd", ".tvf"};
+
 // The generation of a commit's file; nothing when `name` is no such name.
 std::optional<int64_t> CommitGeneration(std::string_view name);
 
@@ -26,6 +33,9 @@ std::string CommitFileName(int64_t generation);
 
 // "_" and a number in base 36: what may stand for a segment in a path without leaving the folder.
 bool IsSegmentName(std::string_view name);
+
+bool IsCoreExtension(std::string_view extension);
+bool IsStoreExtension(std::string_view extension);
 
 // Which segment a file belongs to, by its name; empty for others.
 std::string_view SegmentOfFile(std::string_view name);

@@ -8,6 +8,7 @@
 
 #include "elastic/format/block_digest.h"
 #include "elastic/format/file_names.h"
+#include "elastic/format/opening_error.h"
 #include "elastic/format/quoted.h"
 #include "elastic/format/whole_segment.h"
 #include "vantrel/elastic/index_error.h"

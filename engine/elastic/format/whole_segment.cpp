@@ -1,24 +1,14 @@
 #include "elastic/format/whole_segment.h"
 
 #include <algorithm>
-#include <array>
-#include <cerrno>
-#include <string_view>
 #include <utility>
 
 #include "elastic/format/file_names.h"
+#include "elastic/format/opening_error.h"
+#include "vantrel/elastic/index_error.h"
 
 namespace vantrel::elastic::format {
 namespace {
-
-const std::vector<std::string> kCoreExtensions = {".fnm", ".tis", ".tii", ".frq", ".prx", ".nrm"};
-const std::vector<std::string> kStoreExtensions = {".fdx", ".fdt", ".tvx", ".tvd", ".tvf"};
-
-std::exception_ptr Missing(const IndexError& error) {
-  const std::string what = error.what();
-  return std::make_exception_ptr(
-      FileMissingError(error.path(), what.substr(std::min(what.size(), error.path().size() + 2))));
-}
 
 // ".s12" and the like: the letter and a field number.
 bool IsNumbered(std::string_view extension, char letter) {
@@ -28,30 +18,15 @@ bool IsNumbered(std::string_view extension, char letter) {
 
 }  // namespace
 
-bool IsMissingError(const IndexIoError& error) {
-  return error.error_number() == EACCES || error.error_number() == EPERM || IsAbsenceError(error);
-}
-
-bool IsAbsenceError(const IndexIoError& error) {
-  constexpr std::array kErrors = {ENOENT, EISDIR, ENOTDIR, ELOOP, ENAMETOOLONG};
-  return std::find(kErrors.begin(), kErrors.end(), error.error_number()) != kErrors.end();
-}
-
-void RethrowOpening(const IndexError& error) {
-  const auto* system_error = dynamic_cast<const IndexIoError*>(&error);
-  if (system_error != nullptr && !IsMissingError(*system_error)) throw IndexIoError(*system_error);
-  std::rethrow_exception(Missing(error));
-}
-
 WholeSegment::Slot WholeSegment::OpenPlain(const Folder& folder, const std::string& name) {
   ++files_tried_;
   try {
     return {folder.Open(name), nullptr};
   } catch (const IndexIoError& error) {
     if (!IsMissingError(error)) throw;
-    return {nullptr, Missing(error)};
+    return {nullptr, std::make_exception_ptr(AsMissing(error))};
   } catch (const IndexError& error) {
-    return {nullptr, Missing(error)};
+    return {nullptr, std::make_exception_ptr(AsMissing(error))};
   }
 }
 
@@ -67,17 +42,18 @@ void WholeSegment::OpenCompound(const Folder& folder, const std::string& name, C
 }
 
 void WholeSegment::OpenParts(const Folder& folder, const std::string& segment, const CompoundSlot* compound,
-                             const std::vector<std::string>& extensions) {
-  for (const std::string& extension : extensions) {
-    const std::string name = segment + extension;
+                             std::span<const std::string_view> extensions) {
+  for (const std::string_view extension : extensions) {
+    const std::string name = segment + std::string(extension);
+    Slot& slot = slots_[std::string(extension)];
     if (compound == nullptr) {
-      slots_[extension] = OpenPlain(folder, name);
+      slot = OpenPlain(folder, name);
     } else if (!compound->file.has_value()) {
-      slots_[extension].failure = compound->failure;
+      slot.failure = compound->failure;
     } else if (compound->file->Exists(name)) {
-      slots_[extension].source = compound->file->Open(name);
+      slot.source = compound->file->Open(name);
     } else {
-      slots_[extension].failure = std::make_exception_ptr(
+      slot.failure = std::make_exception_ptr(
           FileMissingError(compound->file->source().name(), "compound file holds no '" + name + "'"));
     }
   }

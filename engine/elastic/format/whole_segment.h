@@ -4,32 +4,17 @@
 #include <map>
 #include <memory>
 #include <optional>
+#include <span>
 #include <string>
+#include <string_view>
 #include <vector>
 
 #include "elastic/format/byte_source.h"
 #include "elastic/format/commit.h"
 #include "elastic/format/compound_file.h"
 #include "elastic/format/folder.h"
-#include "vantrel/elastic/index_error.h"
 
 namespace vantrel::elastic::format {
-
-// A file of a segment is not there, or may not be opened. what() and path() are those of the failed opening.
-class FileMissingError : public IndexError {
- public:
-  using IndexError::IndexError;
-};
-
-// Whether the index can be blamed for a failed opening. Anything else (no memory, no more open files, a failing disk)
-// says nothing about it.
-bool IsMissingError(const IndexIoError& error);
-
-// Whether a failed opening means that there is no such file: none of that name, or something else in its place.
-bool IsAbsenceError(const IndexIoError& error);
-
-// Throws a failed opening on: as FileMissingError where the index can be blamed for it, else as it is.
-[[noreturn]] void RethrowOpening(const IndexError& error);
 
 // Every file of a segment, plain, out of a compound file (.cfs), or out of a document store that it shares with
 // others (of its own name, plain or as .cfx). What is there is opened at once and stays open, so that a writer may
@@ -84,7 +69,7 @@ class WholeSegment {
   Slot OpenPlain(const Folder& folder, const std::string& name);
   void OpenCompound(const Folder& folder, const std::string& name, CompoundSlot& slot);
   void OpenParts(const Folder& folder, const std::string& segment, const CompoundSlot* compound,
-                 const std::vector<std::string>& extensions);
+                 std::span<const std::string_view> extensions);
   void OpenOldNorms(const Folder& folder);
   void OpenOwnNorms(const Folder& folder);
 

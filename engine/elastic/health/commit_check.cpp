@@ -8,8 +8,8 @@
 #include <utility>
 
 #include "elastic/format/file_names.h"
+#include "elastic/format/opening_error.h"
 #include "elastic/format/quoted.h"
-#include "elastic/format/whole_segment.h"
 #include "elastic/health/mismatch.h"
 #include "vantrel/elastic/index_error.h"
 

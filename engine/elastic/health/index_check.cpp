@@ -11,8 +11,7 @@
 
 #include "elastic/format/file_names.h"
 #include "elastic/format/manifest.h"
-#include "elastic/format/quoted.h"
-#include "elastic/format/whole_segment.h"
+#include "elastic/format/opening_error.h"
 #include "elastic/health/commit_check.h"
 #include "elastic/health/digest_check.h"
 #include "elastic/health/metered_folder.h"

@@ -1,11 +1,11 @@
 #include "elastic/health/segment_check.h"
 
 #include <algorithm>
-#include <array>
 #include <string_view>
 
 #include "elastic/format/byte_reader.h"
 #include "elastic/format/deletions.h"
+#include "elastic/format/file_names.h"
 #include "elastic/format/quoted.h"
 #include "elastic/format/text.h"
 #include "elastic/health/mismatch.h"
@@ -44,11 +44,9 @@ void RequireSize(const ByteSource& source, uint64_t expected) {
 }
 
 bool IsKnownPart(std::string_view extension, bool is_store) {
-  constexpr std::array<std::string_view, 5> kStore = {".fdx", ".fdt", ".tvx", ".tvd", ".tvf"};
-  constexpr std::array<std::string_view, 6> kCore = {".fnm", ".tis", ".tii", ".frq", ".prx", ".nrm"};
-  if (std::find(kStore.begin(), kStore.end(), extension) != kStore.end()) return true;
+  if (format::IsStoreExtension(extension)) return true;
   if (is_store) return false;
-  if (std::find(kCore.begin(), kCore.end(), extension) != kCore.end()) return true;
+  if (format::IsCoreExtension(extension)) return true;
   return extension.size() > 2 && extension.starts_with(".f") && extension[2] >= '0' && extension[2] <= '9';
 }
 

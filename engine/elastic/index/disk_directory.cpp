@@ -15,7 +15,7 @@
 #include "elastic/format/file_descriptor.h"
 #include "elastic/format/file_names.h"
 #include "elastic/format/folder.h"
-#include "elastic/format/whole_segment.h"
+#include "elastic/format/opening_error.h"
 #include "elastic/index/durable_file.h"
 
 namespace vantrel::elastic {

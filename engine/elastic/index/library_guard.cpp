@@ -6,7 +6,7 @@
 #include <vector>
 
 #include "elastic/format/file_names.h"
-#include "elastic/format/whole_segment.h"
+#include "elastic/format/opening_error.h"
 #include "elastic/health/index_check.h"
 #include "vantrel/elastic/index_error.h"
 

@@ -58,11 +58,6 @@ void CheckSegment(const std::string& file, const SegmentInfo& segment) {
   }
 }
 
-bool IsStoreFile(const std::string& extension) {
-  return extension == ".tvx" || extension == ".tvd" || extension == ".tvf" || extension == ".fdx" ||
-         extension == ".fdt";
-}
-
 }  // namespace
 
 OpeningCheck::OpeningCheck(std::optional<WantedTerm> term) : term_(std::move(term)) {}
@@ -88,7 +83,7 @@ void OpeningCheck::Check(const std::string& name, const Source& source) {
   const std::string extension = name.substr(dot);
   if (extension == ".cfs" || extension == ".fnm") current_ = FindSegment(name.substr(0, dot));
   if (current_ == nullptr) return;
-  (IsStoreFile(extension) ? current_->plain_store : current_->plain)[extension] = source;
+  (format::IsStoreExtension(extension) ? current_->plain_store : current_->plain)[extension] = source;
   if (extension == ".cfs") {
     CheckCompound(source);
   } else if (extension == ".cfx") {

@@ -1,7 +1,6 @@
 #include "elastic/repair/checked_directory.h"
 
 #include <algorithm>
-#include <array>
 #include <string_view>
 #include <utility>
 
@@ -10,14 +9,10 @@
 namespace vantrel::elastic {
 namespace {
 
-constexpr std::array<std::string_view, 6> kSharedExtensions = {"cfx", "fdt", "fdx", "tvx", "tvd", "tvf"};
-
 // The segment that a file belongs to alone; empty where there is none.
 std::string_view OwnSegment(std::string_view name) {
-  const std::string_view extension = name.substr(std::min(name.find('.'), name.size() - 1) + 1);
-  if (std::find(kSharedExtensions.begin(), kSharedExtensions.end(), extension) != kSharedExtensions.end()) {
-    return {};
-  }
+  const std::string_view extension = name.substr(std::min(name.find('.'), name.size()));
+  if (extension == ".cfx" || format::IsStoreExtension(extension)) return {};
   return format::SegmentOfFile(name);
 }
 
@@ -25,11 +20,6 @@ std::string_view OwnSegment(std::string_view name) {
 
 CheckedDirectory::CheckedDirectory(const std::string& path, std::set<std::string> condemned)
     : DiskDirectory(path), condemned_(std::move(condemned)) {}
-
-Lucene::IndexInputPtr CheckedDirectory::openInput(const Lucene::String& name) {
-  Refuse(name);
-  return DiskDirectory::openInput(name);
-}
 
 Lucene::IndexInputPtr CheckedDirectory::openInput(const Lucene::String& name, int32_t buffer_size) {
   Refuse(name);

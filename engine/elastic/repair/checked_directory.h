@@ -15,7 +15,7 @@ class CheckedDirectory : public DiskDirectory {
   // `path` is as DiskDirectory takes it; `condemned` holds names of segments, such as "_3".
   CheckedDirectory(const std::string& path, std::set<std::string> condemned);
 
-  Lucene::IndexInputPtr openInput(const Lucene::String& name) override;
+  using DiskDirectory::openInput;  // comes down to the other
   Lucene::IndexInputPtr openInput(const Lucene::String& name, int32_t buffer_size) override;
 
  private:
