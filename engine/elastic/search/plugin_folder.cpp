@@ -7,8 +7,8 @@
 
 #include <algorithm>
 #include <cerrno>
-#include <cstring>
 #include <mutex>
+#include <system_error>
 #include <utility>
 
 #include "elastic/format/folder.h"
@@ -20,7 +20,7 @@ namespace {
 using format::FileDescriptor;
 
 [[noreturn]] void FailBySystem(const std::string& path, const std::string& problem, int error_number) {
-  throw PluginLoadError(path, problem + ": " + std::strerror(error_number));
+  throw PluginLoadError(path, problem + ": " + std::generic_category().message(error_number));
 }
 
 // The opened file or folder is the business of nobody but root and us.
@@ -97,8 +97,10 @@ std::vector<std::string> PluginFolder::List() const {
     FailBySystem(path_, "cannot read the folder", failure);
   }
   std::vector<std::string> names;
-  errno = 0;
-  while (const dirent* const entry = readdir(stream.get())) {
+  for (;;) {
+    errno = 0;
+    const dirent* const entry = readdir(stream.get());
+    if (entry == nullptr) break;
     const std::string name = entry->d_name;
     if (name.ends_with(".so")) names.push_back(name);
   }
