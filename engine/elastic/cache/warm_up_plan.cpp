@@ -34,11 +34,8 @@ bool PlanParts(const format::DiskFolder& folder, const std::string& name, Ranked
   try {
     const auto source = folder.Open(name);
     const format::CompoundFile compound(source);
-    const auto& parts = compound.parts();
-    uint64_t parts_begin = source->size();
-    for (const auto& [part_name, part] : parts) parts_begin = std::min(parts_begin, part.offset);
-    plan[0].push_back({source->name(), 0, parts_begin});  // the table
-    for (const auto& [part_name, part] : parts) {
+    plan[0].push_back({source->name(), 0, compound.first_offset()});  // the table
+    for (const auto& [part_name, part] : compound.parts()) {
       plan[RankOf(part_name)].push_back({source->name(), part.offset, part.size});
     }
     return true;
