@@ -10,11 +10,9 @@
 #include <utility>
 
 #include "elastic/format/commit.h"
-#include "elastic/format/deletions.h"
 #include "elastic/format/file_names.h"
 #include "elastic/format/folder.h"
 #include "elastic/format/quoted.h"
-#include "elastic/format/segment_files.h"
 #include "elastic/index/document_builder.h"
 #include "elastic/index/durable_file.h"
 #include "elastic/index/index_statistics.h"

@@ -8,7 +8,6 @@
 #include <chrono>
 #include <memory>
 #include <mutex>
-#include <vector>
 
 #include "elastic/index/text_analyzer.h"
 #include "elastic/search/hit_collector.h"

@@ -3,7 +3,6 @@
 #include <limits>
 
 #include "elastic/format/term_vectors.h"
-#include "vantrel/elastic/index_error.h"
 
 namespace vantrel::elastic::reading {
 namespace {

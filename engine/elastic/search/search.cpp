@@ -3,8 +3,6 @@
 #include <algorithm>
 #include <exception>
 #include <functional>
-#include <limits>
-#include <map>
 #include <set>
 #include <utility>
 
