@@ -23,7 +23,7 @@ inline constexpr uint32_t kLongestText = uint32_t{1} << 20;
 // where it does not begin with well-formed UTF-8.
 bool TakeCodePoint(std::string_view& text, char32_t& code_point);
 
-// `code_point` must be one, and no surrogate.
+// Well-formed where `code_point` is one, and no surrogate.
 void AppendUtf8(char32_t code_point, std::string& out);
 
 // Well-formed UTF-8: shortest forms only, no surrogates, nothing above U+10FFFF.

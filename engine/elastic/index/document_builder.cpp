@@ -104,9 +104,10 @@ std::wstring DocumentBuilder::CheckedValue(const Field& field, std::string_view 
     Refuse(field.settings.name, std::string("the value ") + problem);
   }
   const bool is_keyword = field.settings.type == FieldType::kKeyword;
-  if (is_keyword && wide.size() > kLongestTerm) {
+  if (is_keyword && wide.size() > kMostWordCharacters) {
     Refuse(field.settings.name, "the value has " + std::to_string(wide.size()) +
-                                    " characters; a keyword has at most " + std::to_string(kLongestTerm));
+                                    " characters; a keyword has at most " +
+                                    std::to_string(kMostWordCharacters));
   }
   if (IsAnalyzed(field.settings) && wide.find(L'\0') != std::wstring::npos) {
     Refuse(field.settings.name, "the value holds U+0000, after which a text is not indexed");
@@ -114,7 +115,7 @@ std::wstring DocumentBuilder::CheckedValue(const Field& field, std::string_view 
   if (is_keyword) return wide;
   if (const size_t length = FindTooLongWord(wide); length > 0) {
     Refuse(field.settings.name, "the value holds a word of " + std::to_string(length) +
-                                    " characters; a word has at most " + std::to_string(kLongestTerm));
+                                    " characters; a word has at most " + std::to_string(kMostWordCharacters));
   }
   return wide;
 }

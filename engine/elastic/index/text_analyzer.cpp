@@ -15,7 +15,7 @@ constexpr int32_t kValueGap = 100;
 class TextAnalyzer : public Lucene::StandardAnalyzer {
  public:
   TextAnalyzer() : StandardAnalyzer(kVersion, Lucene::HashSet<Lucene::String>::newInstance()) {
-    setMaxTokenLength(static_cast<int32_t>(kLongestTerm));
+    setMaxTokenLength(static_cast<int32_t>(kMostWordCharacters));
   }
 
   int32_t getPositionIncrementGap(const Lucene::String& /*field*/) override { return kValueGap; }
@@ -26,7 +26,7 @@ bool HasLongRun(const std::wstring& text) {
   size_t run = 0;
   for (const wchar_t character : text) {
     run = character == L' ' || character == L'\n' ? 0 : run + 1;
-    if (run > kLongestTerm) return true;
+    if (run > kMostWordCharacters) return true;
   }
   return false;
 }
@@ -43,7 +43,7 @@ size_t FindTooLongWord(const std::wstring& text) {
   const auto word = words->getAttribute<Lucene::TermAttribute>();
   while (words->incrementToken()) {
     const auto length = static_cast<size_t>(word->termLength());
-    if (length > kLongestTerm) return length;
+    if (length > kMostWordCharacters) return length;
   }
   return 0;
 }
