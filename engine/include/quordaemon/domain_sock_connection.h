@@ -10,6 +10,7 @@ namespace quordaemon {
 // A connection to a server that listens on a Unix domain socket.
 class QUORDAEMON_EXPORT DomainSockConnection : public SockConnection {
  public:
+  // Not connected yet.
   explicit DomainSockConnection(const std::string& path);
   ~DomainSockConnection() override;
 

@@ -20,13 +20,15 @@ namespace vantrel::elastic {
 // thread at a time.
 class VANTREL_ELASTIC_EXPORT CheckedReader {
  public:
-  // For positions of a term, or for a term vector. `path` is used byte for byte. Throws what the library throws.
+  // For positions of a term. `path` is used byte for byte. Throws what the library throws.
   CheckedReader(const std::string& path, const Lucene::TermPtr& term);
+  // For term vectors.
   explicit CheckedReader(const std::string& path);
   CheckedReader(const CheckedReader&) = delete;
   CheckedReader& operator=(const CheckedReader&) = delete;
   ~CheckedReader();
 
+  // The library's own, whose lookups are not checked but for those below.
   const Lucene::IndexReaderPtr& reader() const { return reader_; }
 
   // The positions of the term, to be moved with skipTo(document) at once and read for the document reached, but no

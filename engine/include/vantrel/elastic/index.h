@@ -15,6 +15,7 @@ namespace vantrel::elastic {
 
 class Snapshot;
 
+// Documents that searches find, and those that they no longer do.
 struct DocumentCounts {
   uint64_t live = 0;
   uint64_t deleted = 0;  // still taking space until their segments are merged
@@ -81,6 +82,7 @@ class VANTREL_ELASTIC_EXPORT Index {
   Index& operator=(const Index&) = delete;
   ~Index();
 
+  // What the index was opened or made with; valid for as long as it is.
   const std::string& path() const;
   const IndexSettings& settings() const;
 
@@ -105,6 +107,7 @@ class VANTREL_ELASTIC_EXPORT Index {
   // disk space, up to the next commit.
   void Optimize();
 
+  // Whether a commit may go on to merge segments.
   enum class Merging { kAllowed, kNone };
 
   // Makes every change durable and visible: once this has returned, a crash or a loss of power does not undo
@@ -117,6 +120,7 @@ class VANTREL_ELASTIC_EXPORT Index {
   // The documents of the newest commit, whoever made it.
   DocumentCounts CountDocuments() const;
 
+  // The newest commit, whoever made it, and what the folder takes on disk. Throws IndexError.
   IndexStatistics Statistics() const;
 
   // What becomes of a value of a field: the terms that are indexed. A keyword is one. Throws IndexValueError for

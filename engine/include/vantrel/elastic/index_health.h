@@ -36,6 +36,7 @@ struct HealthProgress {
       0;  // of the files opened so far; a little more may be read where parts are read twice
 };
 
+// How a check goes about it.
 struct HealthOptions {
   // How many threads read, the calling one among them; 0: as many as there are processors.
   unsigned threads = 0;
@@ -45,6 +46,7 @@ struct HealthOptions {
   std::function<void(const HealthProgress&)> progress = {};
 };
 
+// What a check has found.
 struct HealthReport {
   // What every commit of an Index leaves beside its files: their sizes and digests.
   enum class Manifest {
@@ -58,6 +60,7 @@ struct HealthReport {
   std::vector<HealthFinding> findings;
   Manifest manifest = Manifest::kNone;
 
+  // Whether nothing was found.
   bool clean() const { return findings.empty(); }
 };
 

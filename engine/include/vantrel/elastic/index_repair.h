@@ -10,6 +10,7 @@ namespace vantrel::elastic {
 
 // What a repair has dropped, or would.
 struct RepairReport {
+  // A segment that goes, with all of its documents.
   struct Loss {
     std::string segment;        // such as "_3"
     uint64_t documents = 0;     // in it that were not deleted

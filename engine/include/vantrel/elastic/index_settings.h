@@ -40,6 +40,7 @@ struct FieldSettings {
   std::vector<PreProcSettings> pre_processors = {};
 };
 
+// How an index is made; kept in its folder, in quorelastic.json.
 struct IndexSettings {
   std::vector<FieldSettings> fields;  // at least one, no two of one name
 

@@ -67,6 +67,7 @@ struct FieldValues {
   std::vector<std::string> values;
 };
 
+// A document that was found.
 struct SearchHit {
   size_t index = 0;  // which of the searched indexes it is from, counted from 0
   std::string id;    // empty where the document was added without one
@@ -74,6 +75,7 @@ struct SearchHit {
   std::vector<FieldValues> fields;  // the loaded ones that the document has, in the settings' order
 };
 
+// What a search has found.
 struct SearchResult {
   uint64_t total = 0;           // documents found
   double max_score = 0;         // of all of them; 0 where there is none

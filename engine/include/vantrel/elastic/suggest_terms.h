@@ -9,6 +9,7 @@
 
 namespace vantrel::elastic {
 
+// Which terms are wanted.
 struct SuggestRequest {
   std::string field;   // may be empty: a field can bear that name
   std::string prefix;  // bytes of UTF-8; may be empty, and may end within a character
@@ -19,6 +20,7 @@ struct SuggestRequest {
   std::chrono::milliseconds time_limit{0};
 };
 
+// A term that begins with the prefix.
 struct SuggestedTerm {
   std::string term;  // UTF-8
   // In how many documents of all the indexes it is by their dictionaries: deleted documents count until they are
