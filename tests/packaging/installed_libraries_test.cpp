@@ -10,12 +10,14 @@
 #include "daemon_process.h"
 #include "packaging/command_output.h"
 #include "support/files.h"
+#include "support/manual_page.h"
 #include "support/temporary_folder.h"
 
 namespace quorelastic::testing {
 namespace {
 
 using ::testing::HasSubstr;
+using ::testing::StartsWith;
 
 class InstalledLibrary : public ::testing::Test {
  protected:
@@ -56,6 +58,18 @@ class InstalledLibrary : public ::testing::Test {
   std::string source_ = work_ / "example";
 };
 
+// A program of the manual's examples, counted from 0, with what stands in a place of its own put elsewhere.
+std::string ManualProgram(size_t number, const std::string& place, const std::string& instead) {
+  const ManualPage page = ReadManualPage("libquorelastic.3");
+  std::vector<std::string> programs;
+  for (const std::string& line : page.Find("EXAMPLES").displayed) {
+    if (line == "#include <iostream>") programs.emplace_back();
+    programs.back() += line + "\n";
+  }
+  std::string program = programs.at(number);
+  return program.replace(program.find(place), place.size(), instead);
+}
+
 class InstalledEngine : public InstalledLibrary {
  protected:
   InstalledEngine() : InstalledLibrary("quorelastic") {}
@@ -70,6 +84,11 @@ TEST_F(InstalledEngine, IsFoundByCMake) { ExpectToFindLines(BuildWithCMake("line
 
 TEST_F(InstalledEngine, IsFoundByPkgConfig) {
   ExpectToFindLines(BuildWithPkgConfig("quorelastic", "line_search"));
+}
+
+TEST_F(InstalledEngine, TheManualsProgramFindsWhatItHasAdded) {
+  WriteFile(source_ + "/manual.cpp", ManualProgram(0, "/tmp/books", work_ / "books"));
+  EXPECT_THAT(Run({BuildWithPkgConfig("quorelastic", "manual")}), StartsWith("1 0."));
 }
 
 TEST_F(InstalledEngine, IsNotFoundWhereALibraryOfItsHeadersIsMissing) {
@@ -93,6 +112,14 @@ class InstalledConnection : public InstalledLibrary {
     EXPECT_THAT(Run({program, daemon.socket(), R"({"command":"status"})"}), HasSubstr(R"("success":true)"));
   }
 };
+
+TEST_F(InstalledConnection, TheManualsProgramAsksTheDaemon) {
+  const TemporaryFolder folder;
+  DaemonProcess daemon(folder.path());
+  ASSERT_TRUE(daemon.is_ready()) << daemon.Log();
+  WriteFile(source_ + "/manual.cpp", ManualProgram(1, "/var/run/quorelasticd.sock", daemon.socket()));
+  EXPECT_THAT(Run({BuildWithPkgConfig("quordaemon", "manual")}), HasSubstr(R"("success":true)"));
+}
 
 TEST_F(InstalledConnection, IsFoundByCMake) { ExpectToAskADaemon(BuildWithCMake("ask")); }
 

@@ -112,6 +112,8 @@ TEST_F(DaemonManual, HasWhatKeepsItFromStarting) {
   messages.merge(FindInSources("quorelasticd/server", R"re(Fail\(path, "([^"]+)")re"));
   messages.merge(FindInSources("engine/elastic/search",
                                R"re(PluginLoadError\(path, (std::string\()?"([a-z ]+[a-z]))re"));
+  messages.merge(FindInSources("engine/elastic/search", R"re(FailBySystem\(\w+, "([^"]+)")re"));
+  EXPECT_THAT(messages, Contains("cannot open the folder"));
   EXPECT_THAT(messages, Contains("exists, and is no socket"));
   EXPECT_THAT(messages, Contains("cannot listen"));
   EXPECT_THAT(messages, Contains("offers no plugin"));
