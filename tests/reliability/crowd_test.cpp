@@ -12,7 +12,7 @@
 #include "crowd_client.h"
 #include "daemon_process.h"
 #include "index_checkers.h"
-#include "run_size.h"
+#include "support/run_size.h"
 #include "support/temporary_folder.h"
 
 namespace quorelastic::testing {

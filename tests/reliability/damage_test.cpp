@@ -13,6 +13,7 @@
 #include <filesystem>
 #include <map>
 #include <random>
+#include <stdexcept>
 #include <string>
 #include <utility>
 #include <vector>
@@ -23,8 +24,8 @@
 #include "elastic/format/folder.h"
 #include "elastic/format/manifest.h"
 #include "engine/health/health_shapes.h"
-#include "run_size.h"
 #include "support/files.h"
+#include "support/run_size.h"
 #include "support/temporary_folder.h"
 #include "vantrel/elastic/library_setup.h"
 
@@ -50,7 +51,12 @@ constexpr std::array kActions = {
 // Whether a run is not of another action alone.
 bool IsWanted(const Action& action) {
   const char* only = std::getenv("QUORELASTIC_TOOL_ACTION");
-  return only == nullptr || action.word == std::string(only);
+  if (only == nullptr) return true;
+  if (std::none_of(kActions.begin(), kActions.end(),
+                   [&](const auto& known) { return known.word == std::string(only); })) {
+    throw std::runtime_error("QUORELASTIC_TOOL_ACTION: there is no action " + std::string(only));
+  }
+  return action.word == std::string(only);
 }
 
 // What there is to look up in an index.

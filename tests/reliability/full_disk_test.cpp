@@ -9,8 +9,8 @@
 
 #include "daemon_client.h"
 #include "index_checkers.h"
-#include "run_size.h"
 #include "small_disk_daemon.h"
+#include "support/run_size.h"
 #include "support/sandbox_test.h"
 
 namespace quorelastic::testing {

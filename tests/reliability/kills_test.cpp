@@ -17,7 +17,7 @@
 #include "daemon_process.h"
 #include "document_model.h"
 #include "index_checkers.h"
-#include "run_size.h"
+#include "support/run_size.h"
 #include "support/temporary_folder.h"
 
 namespace quorelastic::testing {

@@ -16,7 +16,7 @@
 #include "daemon_client.h"
 #include "daemon_process.h"
 #include "quordaemon/wire.h"
-#include "run_size.h"
+#include "support/run_size.h"
 #include "support/sanitized.h"
 #include "support/temporary_folder.h"
 

@@ -16,6 +16,7 @@
 #include "engine/health/health_shapes.h"
 #include "support/files.h"
 #include "support/library_checker.h"
+#include "support/run_size.h"
 #include "support/temporary_folder.h"
 #include "vantrel/elastic/index_health.h"
 #include "vantrel/elastic/library_setup.h"
@@ -32,12 +33,6 @@ constexpr int kCases = 20;  // a child takes many times as long
 #else
 constexpr int kCases = 100;
 #endif
-
-// QUORELASTIC_DAMAGES makes it a longer campaign, QUORELASTIC_SEED another one.
-int Setting(const char* name, int otherwise) {
-  const char* value = std::getenv(name);
-  return value == nullptr ? otherwise : std::atoi(value);
-}
 
 void WriteIndex(const std::string& folder, const HealthShape& shape) {
   if (shape.older_layout == nullptr) return WriteVariedIndex(folder, shape.index);
@@ -94,9 +89,10 @@ bool HoldsUnsafe(const HealthReport& report) {
   });
 }
 
+// QUORELASTIC_DAMAGES makes it a longer campaign, QUORELASTIC_SEED another one.
 TEST_P(DamagedHealthTest, WhatTheLibrarysCheckerReportsIsFound) {
-  std::mt19937 random(static_cast<uint32_t>(Setting("QUORELASTIC_SEED", 20240517)) + GetParam().index.seed);
-  const int cases = Setting("QUORELASTIC_DAMAGES", kCases);
+  std::mt19937 random(RunSeed(20240517) + GetParam().index.seed);
+  const int cases = RunSize("QUORELASTIC_DAMAGES", kCases);
   int counts[4] = {};
   int more = 0;
   for (int i = 0; i < cases; ++i) {

@@ -12,6 +12,7 @@
 #include "support/files.h"
 #include "support/library_checker.h"
 #include "support/random_index.h"
+#include "support/run_size.h"
 #include "support/temporary_folder.h"
 #include "support/varied_index.h"
 #include "vantrel/elastic/index_health.h"
@@ -33,6 +34,7 @@ using ::quorelastic::testing::LibraryVerdict;
 using ::quorelastic::testing::RandomIndexShape;
 using ::quorelastic::testing::RandomShape;
 using ::quorelastic::testing::ReadFile;
+using ::quorelastic::testing::RunSize;
 using ::quorelastic::testing::TemporaryFolder;
 using ::quorelastic::testing::WriteFile;
 using ::quorelastic::testing::WriteRandomIndex;
@@ -44,11 +46,6 @@ void ExpectClean(const std::string& path) {
   EXPECT_FALSE(IsIndexCorrupted(path));
 }
 
-int Count(const char* name, int otherwise) {
-  const char* value = std::getenv(name);
-  return value == nullptr ? otherwise : std::atoi(value);
-}
-
 class HealthyIndexTest : public ::testing::Test {
  protected:
   static void SetUpTestSuite() { PrepareIndexLibrary(); }
@@ -56,7 +53,7 @@ class HealthyIndexTest : public ::testing::Test {
 
 // QUORELASTIC_HEALTHY_INDEXES makes it a longer campaign.
 TEST_F(HealthyIndexTest, RandomIndexesOfEveryKindAreClean) {
-  const int count = Count("QUORELASTIC_HEALTHY_INDEXES", 150);
+  const int count = RunSize("QUORELASTIC_HEALTHY_INDEXES", 150);
   for (int seed = 1; seed <= count; ++seed) {
     SCOPED_TRACE("seed " + std::to_string(seed));
     const TemporaryFolder folder;

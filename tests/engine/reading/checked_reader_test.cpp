@@ -14,6 +14,7 @@
 #include <vector>
 
 #include "engine/health/health_shapes.h"
+#include "support/run_size.h"
 #include "support/temporary_folder.h"
 #include "support/varied_index.h"
 #include "vantrel/elastic/library_setup.h"
@@ -144,8 +145,7 @@ TEST(CheckedReaderSkipTest, JumpsAsTheLibraryDoes) {
 // QUORELASTIC_HEALTHY_INDEXES makes it a longer campaign.
 TEST(CheckedReaderRandomTest, AnswersAsTheLibraryDoesOnAnyIndex) {
   vantrel::elastic::PrepareIndexLibrary();
-  const char* setting = std::getenv("QUORELASTIC_HEALTHY_INDEXES");
-  const int indexes = setting == nullptr ? 12 : std::atoi(setting);
+  const int indexes = RunSize("QUORELASTIC_HEALTHY_INDEXES", 12);
   for (int i = 0; i < indexes; ++i) {
     SCOPED_TRACE("seed " + std::to_string(31000 + i));
     const TemporaryFolder folder;

@@ -1,4 +1,4 @@
-#include "run_size.h"
+#include "support/run_size.h"
 
 #include <cstdlib>
 #include <iostream>
@@ -7,6 +7,8 @@
 
 namespace quorelastic::testing {
 namespace {
+
+constexpr const char* kSeedName = "QUORELASTIC_SEED";
 
 unsigned long ToNumber(const char* name, const std::string& text) {
   size_t used = 0;
@@ -26,15 +28,18 @@ unsigned long ToNumber(const char* name, const std::string& text) {
 
 int RunSize(const char* name, int by_default) {
   const char* text = std::getenv(name);
-  return text == nullptr ? by_default : static_cast<int>(ToNumber(name, text));
+  if (text == nullptr) return by_default;
+  const auto size = static_cast<int>(ToNumber(name, text));
+  if (size <= 0) throw std::runtime_error(std::string(name) + ": a run of that size tries nothing: " + text);
+  return size;
 }
 
-uint32_t RunSeed() {
-  const char* name = "QUORELASTIC_SEED";
-  const char* text = std::getenv(name);
-  const uint32_t seed =
-      text == nullptr ? std::random_device()() : static_cast<uint32_t>(ToNumber(name, text));
-  Tell("repeat with", std::string(name) + "=" + std::to_string(seed));
+uint32_t RunSeed() { return RunSeed(std::random_device()()); }
+
+uint32_t RunSeed(uint32_t by_default) {
+  const char* text = std::getenv(kSeedName);
+  const uint32_t seed = text == nullptr ? by_default : static_cast<uint32_t>(ToNumber(kSeedName, text));
+  Tell("repeat with", std::string(kSeedName) + "=" + std::to_string(seed));
   return seed;
 }
 
