@@ -52,6 +52,13 @@ class MemorySource : public vantrel::elastic::format::ByteSource {
   MemoryFile file_;
 };
 
+// All bytes of a source.
+inline std::string ContentOf(const vantrel::elastic::format::ByteSource& source) {
+  std::string bytes(source.size(), '\0');
+  source.ReadAt(0, std::span(reinterpret_cast<uint8_t*>(bytes.data()), bytes.size()));
+  return bytes;
+}
+
 inline std::shared_ptr<const vantrel::elastic::format::ByteSource> SourceOf(
     const std::string& bytes, uint64_t zeros_after = 0, std::optional<uint64_t> broken_from = {}) {
   return std::make_shared<MemorySource>("memory", MemoryFile{bytes, zeros_after, broken_from});

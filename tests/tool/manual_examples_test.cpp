@@ -3,12 +3,9 @@
 #include <gmock/gmock.h>
 #include <gtest/gtest.h>
 
-#include <chrono>
-#include <csignal>
 #include <filesystem>
 #include <optional>
 #include <string>
-#include <thread>
 #include <vector>
 
 #include "support/files.h"
@@ -16,6 +13,7 @@
 #include "support/sandbox_test.h"
 #include "support/text_search.h"
 #include "support/tool_run.h"
+#include "tool/sandboxed_daemon.h"
 
 namespace quorelastic::testing {
 namespace {
@@ -58,23 +56,7 @@ class ManualExamplesTest : public SandboxTest {
     fs::create_directory(sandbox_.folder() + "/bin");
     fs::create_directory(sandbox_.folder() + "/srv");
     fs::create_symlink(ToolPath(), sandbox_.folder() + "/bin/quorelastic");
-    StartDaemon();
-  }
-
-  void StartDaemon() {
-    daemon_.emplace(sandbox_.Start({QUORELASTICD_PROGRAM}));
-    const auto give_up = std::chrono::steady_clock::now() + std::chrono::seconds(20);
-    while (daemon_->Err().find("serves on") == std::string::npos) {
-      ASSERT_LT(std::chrono::steady_clock::now(), give_up) << daemon_->Err();
-      std::this_thread::sleep_for(std::chrono::milliseconds(10));
-    }
-    daemon_pid_ = std::stoi(ReadFile(sandbox_.folder() + "/pid"));  // of what was started last
-  }
-
-  void StopDaemon() {
-    ASSERT_EQ(kill(daemon_pid_, SIGTERM), 0);
-    EXPECT_EQ(daemon_->Wait().status, 0);
-    daemon_.reset();
+    daemon_.emplace(sandbox_, QUORELASTICD_PROGRAM);
   }
 
   // Runs the commands in one shell, so that each finds the folder and the status that the one before left.
@@ -120,8 +102,7 @@ class ManualExamplesTest : public SandboxTest {
 
   const ManualPage page_ = ReadManualPage("quorelastic.8");
   Sandbox sandbox_;
-  std::optional<Process> daemon_;
-  pid_t daemon_pid_ = 0;
+  std::optional<SandboxedDaemon> daemon_;
 };
 
 TEST_F(ManualExamplesTest, GoAsTheManualShowsThemAndSoDoesARecovery) {
@@ -134,7 +115,7 @@ TEST_F(ManualExamplesTest, GoAsTheManualShowsThemAndSoDoesARecovery) {
   DamageBooks();
   Replay({recovery.begin(), recovery.begin() + 4});  // through the daemon
 
-  StopDaemon();
+  EXPECT_EQ(daemon_->Stop(), 0);
   PutTheCopyBack();
   Replay({recovery.begin() + 4, recovery.end()});  // without it
 }

@@ -82,7 +82,7 @@ TEST_F(ToolManualTest, DescribesEachActionAndNoOther) {
   std::set<std::string> described;
   for (const ManualPage::Item& item : page_.Find("DESCRIPTION").items) described.insert(item.Word("Cm"));
   described.erase("");
-  EXPECT_THAT(ReadActions(), SizeIs(13));
+  EXPECT_THAT(ReadActions(), Not(IsEmpty()));
   EXPECT_EQ(described, ReadActions());
   EXPECT_THAT(page_.AllCommands(), IsSubsetOf(ReadActions()));
 }

@@ -4,12 +4,9 @@
 #include <gtest/gtest.h>
 #include <json/json.h>
 
-#include <chrono>
-#include <csignal>
 #include <memory>
 #include <optional>
 #include <string>
-#include <thread>
 #include <vector>
 
 #include "support/files.h"
@@ -17,6 +14,7 @@
 #include "support/tool_run.h"
 #include "tool/inspection.h"
 #include "tool/outcome.h"
+#include "tool/sandboxed_daemon.h"
 
 namespace quorelastic::testing {
 namespace {
@@ -37,13 +35,7 @@ class RealDaemonTest : public SandboxTest {
   void SetUp() override {
     SandboxTest::SetUp();
     if (IsSkipped()) return;
-    daemon_.emplace(sandbox_.Start({QUORELASTICD_PROGRAM}));
-    const auto give_up = std::chrono::steady_clock::now() + std::chrono::seconds(20);
-    while (daemon_->Err().find("serves on /var/run/quorelasticd.sock") == std::string::npos) {
-      ASSERT_LT(std::chrono::steady_clock::now(), give_up) << daemon_->Err();
-      std::this_thread::sleep_for(std::chrono::milliseconds(10));
-    }
-    daemon_pid_ = std::stoi(ReadFile(sandbox_.folder() + "/pid"));
+    daemon_.emplace(sandbox_, QUORELASTICD_PROGRAM);
   }
 
   // The last line of what the tool printed of an exchange, which has to go well as such.
@@ -87,8 +79,7 @@ class RealDaemonTest : public SandboxTest {
   static constexpr const char* kBooksFolder = "/var/lib/quorelastic/books";
 
   Sandbox sandbox_;
-  std::optional<Process> daemon_;
-  pid_t daemon_pid_ = 0;
+  std::optional<SandboxedDaemon> daemon_;
 };
 
 TEST_F(RealDaemonTest, TakesRequestsFromFilesStandardInputAndTheCommandLine) {
@@ -183,8 +174,7 @@ TEST_F(RealDaemonTest, EndsOnASignalAndIsGone) {
   MakeBooks();
   Command(
       R"({"command":"document_bulk","data":{"id":"books","documents":[{"id":"3","title":"x"}],"commit":false}})");
-  EXPECT_EQ(kill(daemon_pid_, SIGTERM), 0);
-  EXPECT_EQ(daemon_->Wait().status, 0);
+  EXPECT_EQ(daemon_->Stop(), 0);
   EXPECT_THAT(sandbox_.RunTool({"--action", "dump", "--Index", "books"}),
               Ended(0, "", "Connect to daemon fail\n"));
   EXPECT_THAT(sandbox_.RunTool({"--action", "term", "--db", kBooksFolder, "--info", "--field", "title"}).out,

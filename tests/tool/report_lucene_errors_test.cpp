@@ -8,6 +8,7 @@
 #include <functional>
 #include <iostream>
 #include <sstream>
+#include <stdexcept>
 
 #include "error/error.h"
 #include "vantrel/elastic/index_container.h"
@@ -81,6 +82,18 @@ TEST(ReportLuceneErrorsTest, AnIndexThatIsNotThereFailsWhenSuggestionsAreAskedFo
   EXPECT_EQ(
       Report(std::make_shared<vantrel::elastic::PrefixTermSuggester>(indexes, 10)),
       (Printed{"Exception:/nowhere/at/all: cannot open index folder: No such file or directory\n", L""}));
+}
+
+TEST(ReportLuceneErrorsTest, LetsOtherKindsOfExceptionsPass) {
+  EXPECT_THROW(ReportLuceneErrors([] { throw 42; }), int);
+}
+
+TEST(ReportLuceneErrorsTest, AFailureComesBehindWhatWasPrinted) {
+  const Printed printed = ReportThrown([] {
+    std::cout << "pos: 1" << std::endl;
+    throw std::out_of_range("too far");
+  });
+  EXPECT_EQ(printed, (Printed{"pos: 1\nException:too far\n", L""}));
 }
 
 TEST(ReportLuceneErrorsTest, WhereNothingFailsNothingIsAdded) {

@@ -11,15 +11,10 @@ namespace vantrel::elastic::format {
 namespace {
 
 using ::quorelastic::testing::ByteWriter;
+using ::quorelastic::testing::ContentOf;
 using ::quorelastic::testing::ExpectDamage;
 using ::quorelastic::testing::ExpectIndexError;
 using ::quorelastic::testing::SourceOf;
-
-std::string Content(const ByteSource& source) {
-  std::string bytes(source.size(), '\0');
-  source.ReadAt(0, std::span(reinterpret_cast<uint8_t*>(bytes.data()), bytes.size()));
-  return bytes;
-}
 
 // The table takes 1 + 3 * (8 + 7) = 46 bytes.
 ByteWriter ThreeParts(int64_t first, int64_t second, int64_t third) {
@@ -31,9 +26,9 @@ TEST(CompoundFileTest, OffersEachSubFileByItsName) {
   const CompoundFile file(SourceOf(ThreeParts(46, 49, 49).Raw("onethird").bytes()));
   EXPECT_TRUE(file.Exists("_0.fnm"));
   EXPECT_FALSE(file.Exists("_0.frq"));
-  EXPECT_EQ(Content(*file.Open("_0.fnm")), "one");
-  EXPECT_EQ(Content(*file.Open("_0.tis")), "");
-  EXPECT_EQ(Content(*file.Open("_0.tii")), "third");
+  EXPECT_EQ(ContentOf(*file.Open("_0.fnm")), "one");
+  EXPECT_EQ(ContentOf(*file.Open("_0.tis")), "");
+  EXPECT_EQ(ContentOf(*file.Open("_0.tii")), "third");
   EXPECT_EQ(file.Open("_0.tii")->name(), "memory (_0.tii)");
   ExpectIndexError("memory: compound file holds no '_0.frq'", [&] { file.Open("_0.frq"); });
 }
@@ -52,7 +47,7 @@ TEST(CompoundFileTest, ASubFileOutlivesTheTable) {
     const CompoundFile file(SourceOf(ThreeParts(46, 46, 46).Raw("third").bytes()));
     part = file.Open("_0.tii");
   }
-  EXPECT_EQ(Content(*part), "third");
+  EXPECT_EQ(ContentOf(*part), "third");
 }
 
 TEST(CompoundFileTest, MayBeEmpty) { EXPECT_FALSE(CompoundFile(SourceOf(std::string(1, '\0'))).Exists("")); }

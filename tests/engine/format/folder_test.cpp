@@ -15,6 +15,7 @@
 #include "support/byte_writer.h"
 #include "support/expect_damage.h"
 #include "support/files.h"
+#include "support/memory_folder.h"
 #include "support/temporary_folder.h"
 #include "support/without_rights.h"
 
@@ -22,18 +23,13 @@ namespace vantrel::elastic::format {
 namespace {
 
 using ::quorelastic::testing::ByteWriter;
+using ::quorelastic::testing::ContentOf;
 using ::quorelastic::testing::ExpectDamage;
 using ::quorelastic::testing::ExpectIndexError;
 using ::quorelastic::testing::TemporaryFolder;
 using ::quorelastic::testing::WithoutRights;
 using ::quorelastic::testing::WriteFile;
 using ::testing::UnorderedElementsAre;
-
-std::string Content(const ByteSource& source) {
-  std::string bytes(source.size(), '\0');
-  source.ReadAt(0, std::span(reinterpret_cast<uint8_t*>(bytes.data()), bytes.size()));
-  return bytes;
-}
 
 TEST(DiskFolderTest, ListsAndOpensItsFilesWhateverTheirNames) {
   const TemporaryFolder folder;
@@ -44,9 +40,9 @@ TEST(DiskFolderTest, ListsAndOpensItsFilesWhateverTheirNames) {
   EXPECT_THAT(disk.List(), UnorderedElementsAre("a", "\xff\xfe", "empty"));
   EXPECT_TRUE(disk.Exists("\xff\xfe"));
   EXPECT_FALSE(disk.Exists("b"));
-  EXPECT_EQ(Content(*disk.Open("a")), "one");
-  EXPECT_EQ(Content(*disk.Open("\xff\xfe")), "two");
-  EXPECT_EQ(Content(*disk.Open("empty")), "");
+  EXPECT_EQ(ContentOf(*disk.Open("a")), "one");
+  EXPECT_EQ(ContentOf(*disk.Open("\xff\xfe")), "two");
+  EXPECT_EQ(ContentOf(*disk.Open("empty")), "");
   EXPECT_EQ(disk.Open("a")->name(), folder / "a");
   EXPECT_EQ(DiskFolder(folder.path() + "/").Open("a")->name(), folder / "a");
 }
@@ -128,7 +124,7 @@ TEST(DiskFolderTest, FollowsASymbolicLinkToAFile) {
   const TemporaryFolder folder;
   WriteFile(folder / "file", "content");
   std::filesystem::create_symlink("file", folder / "link");
-  EXPECT_EQ(Content(*DiskFolder(folder.path()).Open("link")), "content");
+  EXPECT_EQ(ContentOf(*DiskFolder(folder.path()).Open("link")), "content");
 }
 
 TEST(DiskFolderTest, AnOpenFileStaysReadableWhenItIsDeletedOrReplaced) {
@@ -137,7 +133,7 @@ TEST(DiskFolderTest, AnOpenFileStaysReadableWhenItIsDeletedOrReplaced) {
   const auto source = DiskFolder(folder.path()).Open("file");
   std::filesystem::remove(folder / "file");
   WriteFile(folder / "file", "new");
-  EXPECT_EQ(Content(*source), "content");
+  EXPECT_EQ(ContentOf(*source), "content");
 }
 
 TEST(DiskFolderTest, AFileThatShrinksWhileItIsReadIsAnErrorNotASignal) {
@@ -159,7 +155,7 @@ TEST(DiskFolderTest, AFileThatGrowsWhileItIsReadKeepsItsLength) {
   const auto source = DiskFolder(folder.path()).Open("file");
   WriteFile(folder / "file", "12345");
   EXPECT_EQ(source->size(), 3U);
-  EXPECT_EQ(Content(*source), "123");
+  EXPECT_EQ(ContentOf(*source), "123");
 }
 
 TEST(DiskFolderTest, AHoleOfATebibyteIsNeitherReadNorHeld) {

@@ -17,7 +17,7 @@ using ::quorelastic::testing::LibraryIndex;
 using ::quorelastic::testing::TemporaryFolder;
 
 // How many files of a folder this process has open, by their endings.
-std::map<std::string, int> CountOpenFiles(const std::string& folder) {
+std::map<std::string, int> OpenFilesByEnding(const std::string& folder) {
   std::map<std::string, int> counts;
   for (const auto& entry : std::filesystem::directory_iterator("/proc/self/fd")) {
     std::error_code error;
@@ -48,7 +48,7 @@ TEST(PrefixWalkTest, HoldsOnlyTheFilesOpenThatItStillReads) {
   }
   ASSERT_EQ(walks.size(), static_cast<size_t>(kSegments));
   const std::map<std::string, int> expected = {{".tis", kSegments}, {".frq", 1}, {".del", 1}};
-  EXPECT_EQ(CountOpenFiles(folder.path()), expected);
+  EXPECT_EQ(OpenFilesByEnding(folder.path()), expected);
   for (const auto& walk : walks) {
     EXPECT_TRUE(walk->Next());
     EXPECT_EQ(walk->text(), "tea");
@@ -58,7 +58,7 @@ TEST(PrefixWalkTest, HoldsOnlyTheFilesOpenThatItStillReads) {
     EXPECT_FALSE(walk->Next());
   }
   walks.clear();
-  EXPECT_TRUE(CountOpenFiles(folder.path()).empty());
+  EXPECT_TRUE(OpenFilesByEnding(folder.path()).empty());
 }
 
 }  // namespace

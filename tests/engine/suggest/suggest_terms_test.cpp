@@ -14,6 +14,7 @@
 #include "support/expect_damage.h"
 #include "support/files.h"
 #include "support/library_index.h"
+#include "support/numbered.h"
 #include "support/temporary_folder.h"
 #include "vantrel/elastic/search_error.h"
 
@@ -24,6 +25,7 @@ using ::quorelastic::testing::ByteWriter;
 using ::quorelastic::testing::ExpectIndexError;
 using ::quorelastic::testing::LibraryIndex;
 using ::quorelastic::testing::ListFolder;
+using ::quorelastic::testing::Numbered;
 using ::quorelastic::testing::ReadFile;
 using ::quorelastic::testing::TemporaryFolder;
 using ::quorelastic::testing::WriteFile;
@@ -31,12 +33,6 @@ using ::testing::IsEmpty;
 using ::testing::SizeIs;
 
 using Terms = std::vector<SuggestedTerm>;
-
-std::string Numbered(const char* start, int number) {
-  std::string text = start;
-  text += std::to_string(number);
-  return text;
-}
 
 class SuggestTermsTest : public ::testing::Test {
  protected:

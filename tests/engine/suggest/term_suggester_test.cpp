@@ -9,6 +9,7 @@
 
 #include "support/expect_damage.h"
 #include "support/library_index.h"
+#include "support/numbered.h"
 #include "support/temporary_folder.h"
 #include "vantrel/elastic/index.h"
 #include "vantrel/elastic/index_container.h"
@@ -19,6 +20,7 @@ namespace {
 
 using ::quorelastic::testing::ExpectIndexError;
 using ::quorelastic::testing::LibraryIndex;
+using ::quorelastic::testing::Numbered;
 using ::quorelastic::testing::TemporaryFolder;
 using ::testing::ElementsAre;
 using ::testing::IsEmpty;
@@ -69,12 +71,6 @@ Suggestion MakeSuggestion(const std::string& type, const Json::Value& frequency,
   payload["doc_freq"] = frequency;
   payload["term"] = term;
   return {type, payload};
-}
-
-std::string Numbered(const char* start, int number) {
-  std::string text = start;
-  text += std::to_string(number);
-  return text;
 }
 
 class TermSuggesterTest : public ::testing::Test {
