@@ -29,15 +29,14 @@ class DocumentBulk : public RunningCommand {
   boost::asio::any_io_executor executor() const override { return open_->writing_turn(); }
 
   Outcome Step() override {
+    bool is_committed = false;
     try {
       if (!at_end_) return AddSome();
       commits_ ? changes_.Commit() : changes_.Promise();
+      is_committed = commits_;
       return Finish();
     } catch (...) {
-      Json::Value details(Json::objectValue);
-      details["committed"] = false;
-      const RequestError error = ToRequestError();
-      throw RequestError(error.code(), error.reason(), std::move(details));
+      throw ToRequestError(is_committed);
     }
   }
 

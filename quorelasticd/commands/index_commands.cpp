@@ -116,13 +116,20 @@ class Commit : public RunningCommand {
   boost::asio::any_io_executor executor() const override { return open_->writing_turn(); }
 
   Outcome Step() override {
-    Prepare(changes_);
-    changes_.Commit();
-    changes_.ReportBrokenPromise();
-    Json::Value result(Json::objectValue);
-    result["committed"] = true;
-    AddCounts(open_->index().CountDocuments(), result);
-    return Result(std::move(result));
+    // What fails after the commit does not undo it.
+    bool is_committed = false;
+    try {
+      Prepare(changes_);
+      changes_.Commit();
+      is_committed = true;
+      changes_.ReportBrokenPromise();
+      Json::Value result(Json::objectValue);
+      result["committed"] = true;
+      AddCounts(open_->index().CountDocuments(), result);
+      return Result(std::move(result));
+    } catch (...) {
+      throw ToRequestError(is_committed);
+    }
   }
 
  protected:

@@ -89,4 +89,11 @@ RequestError ToRequestError() {
   }
 }
 
+RequestError ToRequestError(bool is_committed) {
+  const RequestError error = ToRequestError();
+  Json::Value details = error.details();
+  details["committed"] = is_committed;
+  return RequestError(error.code(), error.reason(), std::move(details));
+}
+
 }  // namespace quorelasticd

@@ -37,4 +37,7 @@ RequestError LimitExceeded(const std::string& limit, int64_t most, const std::st
 // What the exception being handled, any, means to a client. Called within a catch block.
 RequestError ToRequestError();
 
+// The same for a request that commits, with whether it had done so in the member "committed".
+RequestError ToRequestError(bool is_committed);
+
 }  // namespace quorelasticd

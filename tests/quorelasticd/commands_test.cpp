@@ -9,6 +9,7 @@
 
 #include "served_index.h"
 #include "support/files.h"
+#include "vantrel/elastic/index.h"
 
 namespace quorelastic::testing {
 namespace {
@@ -174,6 +175,26 @@ TEST_F(CommandsTest, WithoutACommitTheDocumentsWaitForOne) {
   EXPECT_TRUE(commit["result"]["committed"].asBool());
   EXPECT_EQ(commit["result"]["documents"].asInt(), 1);
   EXPECT_EQ(CountBooks(client_), 1);
+}
+
+TEST_F(CommandsTest, WhatFailsAfterACommitDoesNotHideThatItIsCommitted) {
+  AddBooks();
+  const std::string segment = daemon_.data() + "/books/_0.cfs";  // which is opened to be counted
+  ASSERT_TRUE(fs::exists(segment));
+  fs::remove(segment);
+  for (const std::string command : {"commit", "optimize"}) {
+    const JsonValue reply = Ask(R"({"command":")" + command + R"(","data":{"id":"books"}})");
+    EXPECT_EQ(reply["error"]["code"].asString(), "io_error") << reply.toString();
+    EXPECT_TRUE(reply["error"]["committed"].asBool()) << reply.toString();
+  }
+}
+
+TEST_F(CommandsTest, WhatFailsBeforeACommitIsNotCommitted) {
+  const auto writer = vantrel::elastic::Index::Open(daemon_.data() + "/books");
+  writer->DeleteById("1");  // from now on it has the lock
+  const JsonValue reply = Ask(R"({"command":"optimize","data":{"id":"books"}})");
+  EXPECT_EQ(reply["error"]["code"].asString(), "locked") << reply.toString();
+  EXPECT_FALSE(reply["error"].get("committed", true).asBool()) << reply.toString();
 }
 
 TEST_F(CommandsTest, BadDocumentsAreReportedAndTheOthersStay) {
