@@ -60,6 +60,7 @@ class CommandExecution : public Execution {
     running_.reset();  // lets go of its index before the client can know
     if (!outcome.failure.has_value()) return {replies_.Result(std::move(outcome.value)), true};
     std::string reply = replies_.Partial(std::move(outcome.value), *outcome.failure);
+    Log(*outcome.failure);
     ++daemon_.statistics().failed_requests;
     return {std::move(reply), true};
   }
@@ -78,14 +79,18 @@ class CommandExecution : public Execution {
 
   Step Fail(const RequestError& error) {
     running_.reset();
+    Log(error);
+    std::string reply = replies_.Error(error);
+    ++daemon_.statistics().failed_requests;
+    return {std::move(reply), true};
+  }
+
+  void Log(const RequestError& error) const {
     const bool is_our_fault = error.code() == ErrorCode::kInternal || error.code() == ErrorCode::kIoError ||
                               error.code() == ErrorCode::kCorrupt;
     spdlog::log(is_our_fault ? spdlog::level::err : spdlog::level::debug, "{}: {}: {}",
                 command_ == nullptr ? "request" : command_->name.c_str(), ToText(error.code()),
                 error.reason());
-    std::string reply = replies_.Error(error);
-    ++daemon_.statistics().failed_requests;
-    return {std::move(reply), true};
   }
 
   const Daemon& daemon_;

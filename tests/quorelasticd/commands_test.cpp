@@ -9,12 +9,14 @@
 
 #include "served_index.h"
 #include "support/files.h"
+#include "support/text_search.h"
 #include "vantrel/elastic/index.h"
 
 namespace quorelastic::testing {
 namespace {
 
 namespace fs = std::filesystem;
+using ::testing::_;
 using ::testing::ElementsAre;
 using ::testing::IsEmpty;
 
@@ -386,6 +388,23 @@ TEST_F(CommandsTest, AnIdThatNoDocumentCanHaveIsPassedOver) {
       "{\"command\":\"document_delete\",\"data\":{\"id\":\"books\",\"ids\":[\"1\",\"\xef\xbf\xbf\",\"2\"]}}");
   EXPECT_TRUE(reply["success"].asBool()) << reply.toString();
   EXPECT_EQ(CountBooks(client_), 0);
+}
+
+class DebugLogTest : public ServedIndex {
+ protected:
+  DebugLogTest() : ServedIndex({"--log-level", "debug"}) {}
+};
+
+TEST_F(DebugLogTest, HasEveryRequestThatEndsInAnError) {
+  DaemonClient client = Connect();
+  client.Ask(R"({"command":"terms","data":{"id":"nope"}})");
+  client.Ask(
+      R"({"command":"document_bulk","data":{"id":"books","documents":[{"id":"1"},{"title":"no id"}]}})");
+  client.Ask(R"({"command":"nope"})");
+  EXPECT_THAT(
+      FindAll(daemon_.Log(), "debug: ([a-z_]+: [a-z_]+): "),
+      ElementsAre(ElementsAre(_, "terms: index_not_found"), ElementsAre(_, "document_bulk: bad_request"),
+                  ElementsAre(_, "request: unknown_command")));
 }
 
 }  // namespace
