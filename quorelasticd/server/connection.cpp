@@ -57,7 +57,10 @@ void Connection::ReadHeader() {
   const auto missing = [self = shared_from_this(), has_begun = false](error_code error,
                                                                       size_t got) mutable -> size_t {
     if (!error && got > 0 && got < self->header_.size()) {
-      if (!std::exchange(has_begun, true)) self->BeginMessage(0);
+      if (!std::exchange(has_begun, true)) {
+        self->awaiting_request_ = false;
+        self->BeginMessage(0);
+      }
     }
     return error ? 0 : self->header_.size() - got;
   };

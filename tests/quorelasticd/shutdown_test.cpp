@@ -77,24 +77,43 @@ TEST(Shutdown, WhatWasNotCommittedIsCommittedAtTheEnd) {
   EXPECT_EQ(Count(client), 1);
 }
 
-TEST(Shutdown, ARequestThatComesTooLateIsRefused) {
+// Of a request, so many bytes come before the signal.
+class ShutdownWithin : public ::testing::TestWithParam<size_t> {};
+
+TEST_P(ShutdownWithin, ARequestThatComesTooLateIsRefused) {
   const TemporaryFolder folder;
   DaemonProcess daemon(folder.path());
   DaemonClient client(daemon.socket());
   const std::string request = R"({"command":"status"})";
   const auto header = quordaemon::EncodeHeader(static_cast<uint32_t>(request.size()));
   const std::string bytes = std::string(header.begin(), header.end()) + request;
-  ASSERT_EQ(send(client.descriptor(), bytes.data(), 10, MSG_NOSIGNAL), 10);
+  ASSERT_EQ(send(client.descriptor(), bytes.data(), GetParam(), MSG_NOSIGNAL),
+            static_cast<ssize_t>(GetParam()));
   // Once another client that came later is served, ours has been accepted too.
   ASSERT_EQ(DaemonClient(daemon.socket()).AskForError(request), "");
   daemon.Signal(SIGTERM);
   while (daemon.Notifications().size() < 2) std::this_thread::sleep_for(std::chrono::milliseconds(5));
   std::this_thread::sleep_for(std::chrono::milliseconds(50));
-  ASSERT_EQ(send(client.descriptor(), bytes.data() + 10, bytes.size() - 10, MSG_NOSIGNAL),
-            static_cast<ssize_t>(bytes.size()) - 10);
+  ASSERT_EQ(send(client.descriptor(), bytes.data() + GetParam(), bytes.size() - GetParam(), MSG_NOSIGNAL),
+            static_cast<ssize_t>(bytes.size() - GetParam()));
   EXPECT_EQ(client.Receive()["error"]["code"].asString(), "shutting_down");
   EXPECT_TRUE(client.IsHungUp());
   EXPECT_EQ(daemon.Wait(), 0);
+}
+
+INSTANTIATE_TEST_SUITE_P(Header, ShutdownWithin, ::testing::Values(1, 3));
+INSTANTIATE_TEST_SUITE_P(Payload, ShutdownWithin, ::testing::Values(4, 10));
+
+TEST(Shutdown, AClientThatStopsWithinAHeaderHoldsUpNobodyForLong) {
+  const TemporaryFolder folder;
+  DaemonProcess daemon(folder.path(), {"--stall-timeout", "1"});
+  DaemonClient client(daemon.socket());
+  ASSERT_EQ(send(client.descriptor(), "\0", 1, MSG_NOSIGNAL), 1);
+  ASSERT_EQ(DaemonClient(daemon.socket()).AskForError(R"({"command":"status"})"), "");
+  const auto start = std::chrono::steady_clock::now();
+  EXPECT_EQ(daemon.Stop(), 0);
+  EXPECT_LT(std::chrono::steady_clock::now() - start, std::chrono::seconds(20));
+  EXPECT_TRUE(client.IsHungUp());
 }
 
 TEST(Shutdown, RequestsThatWaitForTheirTurnAreRefusedOnceTheStreamBeforeThemIsDone) {
