@@ -30,8 +30,11 @@ class Turns {
 
  private:
   bool TryTake() {
-    if (--left_ >= 0) return true;
-    ++left_;
+    // Never below zero, not even for a moment: another's try would fail though a turn has come free.
+    int left = left_;
+    while (left > 0) {
+      if (left_.compare_exchange_weak(left, left - 1)) return true;
+    }
     return false;
   }
 
