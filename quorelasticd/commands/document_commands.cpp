@@ -3,7 +3,6 @@
 #include <utility>
 
 #include "base/limits.h"
-#include "base/text.h"
 #include "commands/commands.h"
 #include "commands/daemon.h"
 #include "commands/document_source.h"

@@ -9,7 +9,6 @@
 #include "commands/daemon.h"
 #include "health/health_run.h"
 #include "health/repair_worker.h"
-#include "vantrel/elastic/index_error.h"
 
 namespace quorelasticd {
 namespace {

@@ -72,7 +72,7 @@ bool DataRoot::HasIndex(const std::string& name) const { return IsFolder(IndexPa
 
 std::string DataRoot::IndexPath(const std::string& name) const { return path_ + "/" + name; }
 
-std::string DataRoot::HiddenPath(const std::string& name) const {
+std::string DataRoot::ClearHiddenPath(const std::string& name) const {
   const std::string path = path_ + "/" + std::string(kNewPrefix) + name;
   fs::remove_all(path);  // of an attempt that failed
   return path;

@@ -40,8 +40,8 @@ class DataRoot {
   bool HasIndex(const std::string& name) const;
   std::string IndexPath(const std::string& name) const;
 
-  // Where an index is made before it bears its name. Nothing is there; ShowIndex() gives it the name, durably.
-  std::string HiddenPath(const std::string& name) const;
+  // Where an index is made before it bears its name. Removes what is there; ShowIndex() gives it the name, durably.
+  std::string ClearHiddenPath(const std::string& name) const;
   void ShowIndex(const std::string& name) const;
 
   // Takes the name off an index, durably; what it was can then be removed from the path returned.

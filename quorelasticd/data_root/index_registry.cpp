@@ -15,7 +15,6 @@
 #include "base/text.h"
 #include "data_root/index_name.h"
 #include "errors/request_error.h"
-#include "vantrel/elastic/index_error.h"
 #include "vantrel/elastic/write_lock.h"
 
 namespace quorelasticd {
@@ -145,7 +144,7 @@ vantrel::elastic::IndexSettings IndexRegistry::Create(const std::string& name,
     }
     reservation = std::make_unique<Reservation>(*this, name, Reason::kCreation);
   }
-  const auto created = vantrel::elastic::Index::Create(root_.HiddenPath(name), settings)->settings();
+  const auto created = vantrel::elastic::Index::Create(root_.ClearHiddenPath(name), settings)->settings();
   root_.ShowIndex(name);
   spdlog::info("index {} created", name);
   return created;

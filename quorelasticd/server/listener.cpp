@@ -1,7 +1,5 @@
 #include "server/listener.h"
 
-#include <fcntl.h>
-#include <sys/file.h>
 #include <sys/socket.h>
 #include <sys/stat.h>
 #include <sys/un.h>

@@ -83,7 +83,7 @@ TEST(DataRoot, ListsFoldersThatBearTheNameOfAnIndex) {
 TEST(DataRoot, AnIndexComesAndGoesByItsName) {
   const TemporaryFolder folder;
   const DataRoot root(folder.path());
-  fs::create_directory(root.HiddenPath("x"));
+  fs::create_directory(root.ClearHiddenPath("x"));
   WriteFile(root.path() + "/.new-x/file", "12345");
   EXPECT_FALSE(root.HasIndex("x"));
   root.ShowIndex("x");
@@ -96,9 +96,9 @@ TEST(DataRoot, AnIndexComesAndGoesByItsName) {
 TEST(DataRoot, WhatAFailedAttemptLeftIsNotInTheWay) {
   const TemporaryFolder folder;
   const DataRoot root(folder.path());
-  fs::create_directory(root.HiddenPath("x"));
+  fs::create_directory(root.ClearHiddenPath("x"));
   WriteFile(root.path() + "/.new-x/stale", "");
-  EXPECT_FALSE(fs::exists(root.HiddenPath("x")));
+  EXPECT_FALSE(fs::exists(root.ClearHiddenPath("x")));
   fs::create_directories(root.path() + "/.old-y/deep");
   fs::create_directory(root.IndexPath("y"));
   EXPECT_NO_THROW(root.HideIndex("y"));

@@ -1,10 +1,7 @@
 #include <gmock/gmock.h>
 #include <gtest/gtest.h>
-#include <signal.h>
-#include <sys/resource.h>
 
 #include <boost/asio/post.hpp>
-#include <boost/asio/thread_pool.hpp>
 #include <cerrno>
 #include <chrono>
 #include <filesystem>
@@ -15,10 +12,8 @@
 #include <thread>
 #include <vector>
 
-#include "data_root/index_registry.h"
-#include "errors/request_error.h"
+#include "registry_fixture.h"
 #include "support/files.h"
-#include "support/temporary_folder.h"
 #include "vantrel/elastic/index_error.h"
 
 namespace quorelasticd {
@@ -26,39 +21,12 @@ namespace {
 
 namespace fs = std::filesystem;
 using quorelastic::testing::ListFolder;
-using quorelastic::testing::TemporaryFolder;
 using ::testing::ElementsAre;
-using vantrel::elastic::FieldType;
 using vantrel::elastic::Index;
 using vantrel::elastic::IndexIoError;
 using vantrel::elastic::IndexSettings;
 
-IndexSettings Settings() {
-  IndexSettings settings;
-  settings.fields = {{.name = "id", .type = FieldType::kKeyword}};
-  return settings;
-}
-
 std::string Name(int number) { return std::string("x").append(std::to_string(number)); }
-
-class RegistryTest : public ::testing::Test {
- protected:
-  ErrorCode Failure(const std::function<void()>& action) {
-    try {
-      action();
-    } catch (...) {
-      return ToRequestError().code();
-    }
-    ADD_FAILURE() << "nothing failed";
-    return ErrorCode::kInternal;
-  }
-
-  TemporaryFolder folder_;
-  DataRoot root_{folder_.path()};
-  boost::asio::thread_pool threads_{2};
-  static constexpr size_t kMostOpen = 4;
-  IndexRegistry registry_{root_, threads_.get_executor(), kMostOpen};
-};
 
 TEST_F(RegistryTest, AnIndexIsOpenedOnce) {
   registry_.Create("x", Settings());
@@ -253,143 +221,6 @@ TEST_F(RegistryTest, EveryOpenIndexIsCommittedAtTheEnd) {
   }
   EXPECT_TRUE(registry_.CommitAll());
   for (const char* name : {"x", "y"}) EXPECT_EQ(registry_.Use(name)->index().CountDocuments().live, 1u);
-}
-
-// As long as it lives, writing fails: what a full disk looks like.
-class NoFileGrows {
- public:
-  NoFileGrows() {
-    signal(SIGXFSZ, SIG_IGN);
-    getrlimit(RLIMIT_FSIZE, &before_);
-    rlimit limit = before_;
-    limit.rlim_cur = 0;
-    setrlimit(RLIMIT_FSIZE, &limit);
-  }
-  NoFileGrows(const NoFileGrows&) = delete;
-  NoFileGrows& operator=(const NoFileGrows&) = delete;
-  ~NoFileGrows() {
-    setrlimit(RLIMIT_FSIZE, &before_);
-    signal(SIGXFSZ, SIG_DFL);
-  }
-
- private:
-  rlimit before_{};
-};
-
-class ChangesTest : public RegistryTest {
- protected:
-  ChangesTest() {
-    registry_.Create("x", Settings());
-    open_ = registry_.Use("x");
-  }
-
-  static void Fail(Changes& changes) {
-    EXPECT_THROW(changes.Apply([](Index&) { throw IndexIoError("/x", "cannot write", ENOSPC); }),
-                 IndexIoError);
-  }
-
-  static void Add(Changes& changes) {
-    changes.Apply([](Index& index) { index.Add({{{"id", "1"}}}); });
-  }
-
-  std::shared_ptr<OpenIndex> open_;
-};
-
-TEST_F(ChangesTest, AFailureUnderOneRequestIsNoticedByAnother) {
-  Changes one(open_);
-  Changes another(open_);
-  Add(one);
-  Fail(another);
-  EXPECT_EQ(Failure([&] { Add(one); }), ErrorCode::kIoError);
-  EXPECT_EQ(Failure([&] { one.Commit(); }), ErrorCode::kIoError);
-  Changes later(open_);
-  Add(later);
-  EXPECT_NO_THROW(later.Commit());
-}
-
-TEST_F(ChangesTest, AValueThatIsRefusedDoesNoHarm) {
-  Changes one(open_);
-  Changes another(open_);
-  Add(one);
-  EXPECT_THROW(another.Apply([](Index& index) {
-    index.Add({{{"unknown", "1"}}});
-  }),
-               vantrel::elastic::IndexValueError);
-  Add(one);
-  EXPECT_NO_THROW(one.Commit());
-}
-
-TEST_F(ChangesTest, ABrokenPromiseIsReportedOnce) {
-  Changes promised(open_);
-  Add(promised);
-  promised.Promise();
-  Changes failing(open_);
-  Fail(failing);
-  Changes bulk(open_);
-  Add(bulk);
-  bulk.Commit();
-  Changes commit(open_);
-  commit.Commit();
-  EXPECT_EQ(Failure([&] { commit.ReportBrokenPromise(); }), ErrorCode::kIoError);
-  EXPECT_NO_THROW(commit.ReportBrokenPromise());
-}
-
-TEST_F(ChangesTest, WhatAFailureLostIsNoReasonToRefuseALaterCommit) {
-  Changes promised(open_);
-  Add(promised);
-  promised.Promise();
-  Changes failing(open_);
-  {
-    const NoFileGrows full_disk;
-    EXPECT_THROW(failing.Apply([](Index& index) { index.Optimize(); }), IndexIoError);
-  }
-  Changes later(open_);
-  Add(later);
-  EXPECT_NO_THROW(later.Commit());
-  EXPECT_EQ(open_->index().CountDocuments().live, 1u);
-}
-
-TEST_F(ChangesTest, ThatCannotBeCommittedBeforeARepairAreToldToBeLost) {
-  {
-    Changes promised(open_);
-    Add(promised);
-    promised.Promise();
-  }
-  open_.reset();
-  {
-    const NoFileGrows full_disk;
-    EXPECT_EQ(Failure([&] { registry_.Close("x"); }), ErrorCode::kIoError);
-  }
-  EXPECT_EQ(registry_.Use("x")->index().CountDocuments().live, 0u);
-  EXPECT_NE(registry_.Close("x"), nullptr);
-}
-
-TEST_F(ChangesTest, ThatAreCommittedAtTheEndWaitForNoMerge) {
-  constexpr uint64_t kCommits = 12;  // more than the segments that are left unmerged
-  for (uint64_t i = 0; i < kCommits; ++i) {
-    Changes changes(open_);
-    Add(changes);
-    changes.Promise();
-    ASSERT_TRUE(registry_.CommitAll());
-  }
-  EXPECT_EQ(open_->index().Statistics().segments, kCommits);
-  Changes last(open_);
-  Add(last);
-  last.Commit();
-  EXPECT_LT(open_->index().Statistics().segments, kCommits);
-  EXPECT_EQ(open_->index().CountDocuments().live, kCommits + 1);
-}
-
-TEST_F(ChangesTest, AKeptPromiseIsNotReported) {
-  Changes promised(open_);
-  Add(promised);
-  promised.Promise();
-  Changes commit(open_);
-  commit.Commit();
-  Changes failing(open_);
-  Fail(failing);
-  Changes last(open_);
-  EXPECT_NO_THROW(last.ReportBrokenPromise());
 }
 
 }  // namespace
