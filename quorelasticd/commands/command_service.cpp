@@ -73,7 +73,7 @@ class CommandExecution : public Execution {
       return Fail(ToRequestError());
     } catch (...) {
       ++daemon_.statistics().failed_requests;
-      return {kLastResort, true};
+      return {std::move(last_resort_), true};
     }
   }
 
@@ -94,7 +94,8 @@ class CommandExecution : public Execution {
   }
 
   const Daemon& daemon_;
-  std::string text_;  // until it has been parsed
+  std::string text_;                       // until it has been parsed
+  std::string last_resort_ = kLastResort;  // made while there is memory for it
   ReplyWriter replies_;
   const Command* command_ = nullptr;
   std::unique_ptr<RunningCommand> running_;

@@ -1,5 +1,7 @@
 #include "server/connection.h"
 
+#include <spdlog/spdlog.h>
+
 #include <algorithm>
 #include <array>
 #include <boost/asio/buffer.hpp>
@@ -7,6 +9,7 @@
 #include <boost/asio/post.hpp>
 #include <boost/asio/read.hpp>
 #include <boost/asio/write.hpp>
+#include <exception>
 #include <utility>
 
 namespace quorelasticd {
@@ -112,8 +115,15 @@ void Connection::RunStep() {
   // The guard keeps the strand's threads from leaving while nothing but this step is under way.
   asio::post(executor, [self = shared_from_this(), guard = asio::make_work_guard(socket_.get_executor())] {
     Execution::Step step = self->execution_->Run();
-    asio::post(self->socket_.get_executor(),
-               [self, step = std::move(step)]() mutable { self->AfterStep(std::move(step)); });
+    try {
+      asio::post(self->socket_.get_executor(),
+                 [self, step = std::move(step)]() mutable { self->AfterStep(std::move(step)); });
+    } catch (const std::exception& error) {
+      // The connection goes with this, its only operation, unless its strand kept the next, and cannot run it.
+      spdlog::error("a connection is dropped: {}", error.what());
+      error_code ignored;
+      self->socket_.shutdown(Socket::shutdown_both, ignored);
+    }
   });
 }
 

@@ -40,7 +40,7 @@ class Service {
   Service& operator=(const Service&) = delete;
   virtual ~Service() = default;
 
-  // Begins to work on one request, whatever its bytes are. Must not throw.
+  // Begins to work on one request, whatever its bytes are. Throws nothing but std::bad_alloc.
   virtual std::unique_ptr<Execution> Begin(std::string request) = 0;
 
   // The final reply for a request that never gets that far, by what stands in its way.
