@@ -60,20 +60,33 @@ void Server::Run(const std::function<void()>& on_stop) {
     spdlog::info("signal {}: finishing what is running", signal);
     BeginStop();
   });
-  asio::post(strand_, [this] {
-    Accept();
-    Beat();
-  });
+  BeginAccepting();
+  asio::post(strand_, [this] { Beat(); });
   std::vector<std::thread> threads;
-  for (size_t i = 1; i < limits_.threads; ++i) threads.emplace_back([this] { RunThread(); });
+  try {
+    for (size_t i = 1; i < limits_.threads; ++i) threads.emplace_back([this] { RunThread(); });
+  } catch (...) {
+    io_.stop();
+    Join(threads);
+    throw;
+  }
   RunThread();
+  Join(threads);
+}
+
+void Server::Join(std::vector<std::thread>& threads) {
   for (std::thread& thread : threads) thread.join();
+  is_over_ = true;
 }
 
 // A handler that throws, for want of memory, drops its connection; the others go on.
 void Server::RunThread() {
   for (;;) {
     try {
+      while (has_stopped_accepting_ && !io_.stopped()) {
+        io_.run_for(kPauseAfterFailure);
+        if (has_stopped_accepting_.exchange(false)) BeginAccepting();
+      }
       io_.run();
       return;
     } catch (const std::exception& error) {
@@ -86,24 +99,32 @@ void Server::Stop() {
   asio::post(strand_, [this] { BeginStop(); });
 }
 
-void Server::Accept() {
+void Server::BeginAccepting() {
+  asio::post(strand_, [this, duty = AcceptDuty(this)]() mutable { Accept(std::move(duty)); });
+}
+
+void Server::Accept(AcceptDuty duty) {
   if (stopping_) return;
-  acceptor_.async_accept(asio::make_strand(io_), [this](error_code error, Connection::Socket socket) {
-    if (stopping_) return;
-    if (!error) {
-      try {
-        Admit(std::move(socket));
-      } catch (const std::exception& failure) {
-        spdlog::error("a client is dropped: {}", failure.what());
-      }
-      return Accept();
-    }
-    if (error == asio::error::connection_aborted) return Accept();
-    // Descriptors or memory have run out: trying again at once would only burn the processor.
-    WarnOfFailure(error);
-    pause_.expires_after(kPauseAfterFailure);
-    pause_.async_wait([this](error_code) { Accept(); });
-  });
+  acceptor_.async_accept(asio::make_strand(io_),
+                         [this, duty = std::move(duty)](error_code error, Connection::Socket socket) mutable {
+                           if (stopping_) return;
+                           if (error && error != asio::error::connection_aborted) {
+                             WarnOfFailure(error);
+                             return AcceptLater(std::move(duty));
+                           }
+                           try {
+                             if (!error) Admit(std::move(socket));
+                           } catch (const std::exception& failure) {
+                             spdlog::error("a client is dropped: {}", failure.what());
+                           }
+                           Accept(std::move(duty));
+                         });
+}
+
+// Descriptors or memory have run out: trying again at once would only burn the processor.
+void Server::AcceptLater(AcceptDuty duty) {
+  pause_.expires_after(kPauseAfterFailure);
+  pause_.async_wait([this, duty = std::move(duty)](error_code) mutable { Accept(std::move(duty)); });
 }
 
 void Server::WarnOfFailure(error_code error) {
@@ -123,11 +144,16 @@ void Server::Admit(Connection::Socket socket) {
   const auto release = [this, &count](Connection* connection) {
     delete connection;
     --count;
-    asio::post(strand_, [this] { CancelDeadlineIfIdle(); });
+    if (is_over_) return;  // with the server, whose strand may be gone
+    try {
+      asio::post(strand_, [this] { CancelDeadlineIfIdle(); });
+    } catch (const std::exception&) {
+      // Nobody waits for longer than the deadline.
+    }
   };
+  auto admitted = std::make_unique<Connection>(std::move(socket), service_, limits_.timeouts);
   ++count;
-  const std::shared_ptr<Connection> connection(new Connection(std::move(socket), service_, limits_.timeouts),
-                                               release);
+  const std::shared_ptr<Connection> connection(admitted.release(), release);
   std::erase_if(connections_, [](const std::weak_ptr<Connection>& gone) { return gone.expired(); });
   connections_.push_back(connection);
   is_full ? connection->Refuse(service_.RefuseTooManyConnections(limits_.connections)) : connection->Start();
@@ -147,6 +173,7 @@ void Server::BeginStop() {
   on_stop_();
   error_code ignored;
   acceptor_.close(ignored);
+  signals_.cancel(ignored);
   signals_.clear(ignored);  // a second signal ends the process at once
   pause_.cancel();
   heart_.cancel();

@@ -10,6 +10,7 @@
 #include <cstddef>
 #include <functional>
 #include <memory>
+#include <thread>
 #include <vector>
 
 #include "server/connection.h"
@@ -46,7 +47,16 @@ class Server {
   void Stop();
 
  private:
-  void Accept();
+  // Held by whatever is going to accept the next client. Where it is dropped, as handlers are when memory runs out,
+  // even before they are called, accepting has to begin anew.
+  struct NoteThatItWasDropped {
+    void operator()(Server* server) const { server->has_stopped_accepting_ = true; }
+  };
+  using AcceptDuty = std::unique_ptr<Server, NoteThatItWasDropped>;
+
+  void BeginAccepting();
+  void Accept(AcceptDuty duty);
+  void AcceptLater(AcceptDuty duty);
   void WarnOfFailure(boost::system::error_code error);
   void Admit(Connection::Socket socket);
   void Beat();
@@ -54,11 +64,14 @@ class Server {
   void CancelDeadlineIfIdle();
   std::vector<std::shared_ptr<Connection>> LiveConnections();
   void RunThread();
+  void Join(std::vector<std::thread>& threads);
 
   ServerLimits limits_;
   Service& service_;
   std::atomic<size_t>& connection_count_;  // of clients served
   std::atomic<size_t> refusal_count_{0};   // of clients told that there are too many
+  std::atomic<bool> has_stopped_accepting_{false};
+  std::atomic<bool> is_over_{false};  // no thread serves any more
   boost::asio::io_context io_;
   // The acceptor, its list of connections, the signals and the timers share one strand.
   boost::asio::strand<boost::asio::io_context::executor_type> strand_;
