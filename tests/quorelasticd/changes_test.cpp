@@ -1,42 +1,21 @@
 // What requests that change an index at the same time are told of each other's failures.
 
 #include <gtest/gtest.h>
-#include <signal.h>
-#include <sys/resource.h>
 
 #include <cerrno>
 #include <memory>
 
 #include "data_root/open_index.h"
 #include "registry_fixture.h"
+#include "support/file_size_limit.h"
 #include "vantrel/elastic/index_error.h"
 
 namespace quorelasticd {
 namespace {
 
+using quorelastic::testing::FileSizeLimit;
 using vantrel::elastic::Index;
 using vantrel::elastic::IndexIoError;
-
-// As long as it lives, writing fails: what a full disk looks like.
-class NoFileGrows {
- public:
-  NoFileGrows() {
-    signal(SIGXFSZ, SIG_IGN);
-    getrlimit(RLIMIT_FSIZE, &before_);
-    rlimit limit = before_;
-    limit.rlim_cur = 0;
-    setrlimit(RLIMIT_FSIZE, &limit);
-  }
-  NoFileGrows(const NoFileGrows&) = delete;
-  NoFileGrows& operator=(const NoFileGrows&) = delete;
-  ~NoFileGrows() {
-    setrlimit(RLIMIT_FSIZE, &before_);
-    signal(SIGXFSZ, SIG_DFL);
-  }
-
- private:
-  rlimit before_{};
-};
 
 class ChangesTest : public RegistryTest {
  protected:
@@ -102,7 +81,7 @@ TEST_F(ChangesTest, WhatAFailureLostIsNoReasonToRefuseALaterCommit) {
   promised.Promise();
   Changes failing(open_);
   {
-    const NoFileGrows full_disk;
+    const FileSizeLimit full_disk(0);
     EXPECT_THROW(failing.Apply([](Index& index) { index.Optimize(); }), IndexIoError);
   }
   Changes later(open_);
@@ -119,7 +98,7 @@ TEST_F(ChangesTest, ThatCannotBeCommittedBeforeARepairAreToldToBeLost) {
   }
   open_.reset();
   {
-    const NoFileGrows full_disk;
+    const FileSizeLimit full_disk(0);
     EXPECT_EQ(Failure([&] { registry_.Close("x"); }), ErrorCode::kIoError);
   }
   EXPECT_EQ(registry_.Use("x")->index().CountDocuments().live, 0u);

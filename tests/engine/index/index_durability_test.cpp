@@ -2,8 +2,6 @@
 
 #include <gmock/gmock.h>
 #include <gtest/gtest.h>
-#include <signal.h>
-#include <sys/resource.h>
 #include <sys/syscall.h>
 #include <unistd.h>
 
@@ -12,6 +10,7 @@
 #include <filesystem>
 
 #include "read_back.h"
+#include "support/file_size_limit.h"
 #include "support/files.h"
 #include "support/temporary_folder.h"
 #include "vantrel/elastic/index.h"
@@ -48,6 +47,7 @@ namespace vantrel::elastic {
 namespace {
 
 using ::quorelastic::testing::DocumentsWith;
+using ::quorelastic::testing::FileSizeLimit;
 using ::quorelastic::testing::IdAndBody;
 using ::quorelastic::testing::ListFolder;
 using ::quorelastic::testing::MakeDocument;
@@ -185,27 +185,6 @@ TEST_F(IndexDurabilityTest, AnIndexWhoseFirstCommitCannotBeSyncedCanBeCreatedAga
   Index::Create(other.path(), IdAndBody());
   EXPECT_EQ(Index::Open(other.path())->CountDocuments().live, 0U);
 }
-
-// As long as it lives, no file can grow beyond a size: what a full disk looks like.
-class FileSizeLimit {
- public:
-  explicit FileSizeLimit(rlim_t bytes) {
-    signal(SIGXFSZ, SIG_IGN);
-    getrlimit(RLIMIT_FSIZE, &before_);
-    rlimit limit = before_;
-    limit.rlim_cur = bytes;
-    setrlimit(RLIMIT_FSIZE, &limit);
-  }
-  FileSizeLimit(const FileSizeLimit&) = delete;
-  FileSizeLimit& operator=(const FileSizeLimit&) = delete;
-  ~FileSizeLimit() {
-    setrlimit(RLIMIT_FSIZE, &before_);
-    signal(SIGXFSZ, SIG_DFL);
-  }
-
- private:
-  rlimit before_{};
-};
 
 std::string ManyWords() {
   std::string text;
