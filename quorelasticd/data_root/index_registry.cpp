@@ -24,10 +24,10 @@ RequestError NotFound(const std::string& name) {
   return RequestError(ErrorCode::kIndexNotFound, "there is no index " + Quoted(name));
 }
 
-// Whether nobody but the registry holds an index, whose mutex is held.
+// Whether nobody but the registry holds an index, whose mutex is held. The count is read relaxed: what the last holder
+// did before it let go must be seen all the same.
 bool IsUnused(const std::shared_ptr<OpenIndex>& index) {
   if (index.use_count() > 1) return false;
-    // The count is read relaxed. What the last holder did before it let go must be seen here.
 #if defined(__SANITIZE_THREAD__)
   std::shared_ptr<OpenIndex>(index).reset();  // it knows no fences, but it follows the count itself
 #else

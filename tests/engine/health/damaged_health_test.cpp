@@ -17,6 +17,7 @@
 #include "support/files.h"
 #include "support/library_checker.h"
 #include "support/run_size.h"
+#include "support/sanitized.h"
 #include "support/temporary_folder.h"
 #include "vantrel/elastic/index_health.h"
 #include "vantrel/elastic/library_setup.h"
@@ -28,11 +29,7 @@ using vantrel::elastic::CheckIndexHealth;
 using vantrel::elastic::HealthFinding;
 using vantrel::elastic::HealthReport;
 
-#if defined(__SANITIZE_ADDRESS__) || defined(__SANITIZE_THREAD__)
-constexpr int kCases = 20;  // a child takes many times as long
-#else
-constexpr int kCases = 100;
-#endif
+constexpr int kCases = kIsSanitized ? 20 : 100;  // a child takes many times as long then
 
 void WriteIndex(const std::string& folder, const HealthShape& shape) {
   if (shape.older_layout == nullptr) return WriteVariedIndex(folder, shape.index);
