@@ -17,7 +17,7 @@ namespace {
 
 constexpr size_t kTermsPerReply = 1000;
 constexpr size_t kBytesPerReply = size_t{256} << 10;
-constexpr std::chrono::milliseconds kLongestStep{50};
+constexpr std::chrono::milliseconds kLongestListingStep{50};
 constexpr int64_t kDefaultMost = 1000;
 
 // One batch of terms a step, so that a client that reads slowly, or not at all, holds up nobody.
@@ -67,7 +67,7 @@ class Terms : public RunningCommand {
     const auto start = std::chrono::steady_clock::now();
     size_t bytes = 0;
     while (batch.size() < kTermsPerReply && bytes < kBytesPerReply) {
-      if (std::chrono::steady_clock::now() - start > kLongestStep) return false;
+      if (std::chrono::steady_clock::now() - start > kLongestListingStep) return false;
       switch (terms_->Next()) {
         case MergedTerms::Move::kEnd:
           return true;

@@ -17,7 +17,7 @@ using ::testing::ElementsAre;
 using vantrel::elastic::Index;
 using vantrel::elastic::IndexSettings;
 
-std::string Number(int number) {
+std::string Padded(int number) {
   const std::string digits = std::to_string(number);
   return std::string(5 - digits.size(), '0').append(digits);
 }
@@ -31,7 +31,7 @@ class MergedTermsTest : public ::testing::Test {
     const auto index = Index::Create(path(), settings);
     for (int segment = 0; segment < 3; ++segment) {
       std::string words;
-      for (int i = segment; i < 9000; i += 3) words += " w" + Number(i);
+      for (int i = segment; i < 9000; i += 3) words += " w" + Padded(i);
       index->Add(
           {{{"id", std::to_string(segment)}, {"a", words}, {"b", words + " ünder zoo"}, {"c", words}}});
       index->Commit();

@@ -19,8 +19,6 @@ using ::testing::HasSubstr;
 using ::testing::IsEmpty;
 using ::testing::Not;
 
-constexpr char kErrorType[] = "vantrel::Error";
-
 struct RejectedRun {
   std::string name;
   std::vector<std::string> arguments;

@@ -6,7 +6,7 @@
 namespace vantrel::elastic::format {
 namespace {
 
-constexpr size_t kBufferSize = 4096;
+constexpr size_t kSkipBufferSize = 4096;
 
 // Five numbers of up to 5, 5, 5, 5 and 9 bytes.
 constexpr uint64_t kLongestEntry = 29;
@@ -29,7 +29,7 @@ void SkipListReader::Seek(uint64_t pointer, int32_t document_frequency, bool has
   has_payloads_ = has_payloads;
   document_frequency_ = document_frequency;
   level_count_ = LevelsOf(document_frequency);
-  while (levels_.size() < static_cast<size_t>(level_count_)) levels_.emplace_back(source_, kBufferSize);
+  while (levels_.size() < static_cast<size_t>(level_count_)) levels_.emplace_back(source_, kSkipBufferSize);
   for (int number = level_count_ - 1; number >= 0; --number) {
     Level& level = levels_[static_cast<size_t>(number)];
     level.entry = Entry();

@@ -10,7 +10,7 @@ namespace vantrel::elastic::format {
 namespace {
 
 // Format numbers, each named after what it brought.
-constexpr int32_t kWithUtf8 = 1;
+constexpr int32_t kWithUtf8Values = 1;
 constexpr int32_t kWithoutCompression = 2;
 
 constexpr size_t kIndexBufferSize = size_t{64} << 10;
@@ -92,7 +92,7 @@ void StoredFieldsReader::PassValue() {
     PassCompressed(start, length);
   } else if ((flags_ & kBinary) != 0) {
     records_.Skip(length);
-  } else if (format_ >= kWithUtf8) {
+  } else if (format_ >= kWithUtf8Values) {
     PassText(start, length);
   } else {
     PassUtf16(start, length);

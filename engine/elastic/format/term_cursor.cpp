@@ -12,17 +12,17 @@ namespace {
 // Format numbers, each named after what it brought.
 constexpr int32_t kWithFormat = -1;
 constexpr int32_t kWithSkipLevels = -3;
-constexpr int32_t kWithUtf8 = -4;
-static_assert(kWithUtf8 == TermCursor::kNewestFormat);
+constexpr int32_t kWithUtf8Terms = -4;
+static_assert(kWithUtf8Terms == TermCursor::kNewestFormat);
 
 constexpr int32_t kNeverSkips = std::numeric_limits<int32_t>::max();
-constexpr size_t kBufferSize = size_t{64} << 10;
+constexpr size_t kTermsBufferSize = size_t{64} << 10;
 
 }  // namespace
 
 TermCursor::TermCursor(std::shared_ptr<const ByteSource> source, File file, uint32_t field_count,
                        int32_t document_count)
-    : reader_(std::move(source), kBufferSize),
+    : reader_(std::move(source), kTermsBufferSize),
       file_(file),
       field_count_(field_count),
       document_count_(document_count) {
@@ -60,7 +60,7 @@ void TermCursor::ReadHeader() {
   count_ = static_cast<uint64_t>(count);
 }
 
-bool TermCursor::is_utf8() const { return format_ <= kWithUtf8; }
+bool TermCursor::is_utf8() const { return format_ <= kWithUtf8Terms; }
 
 uint64_t TermCursor::index_entries() const {
   const auto interval = static_cast<uint64_t>(index_interval_);

@@ -13,24 +13,24 @@ namespace {
 constexpr int32_t kOldest = 1;
 constexpr int32_t kWithFlags = 2;
 constexpr int32_t kWithTermsPointer = 3;
-constexpr int32_t kWithUtf8 = 4;
+constexpr int32_t kWithUtf8Vectors = 4;
 
-constexpr size_t kIndexBufferSize = size_t{64} << 10;
-constexpr size_t kListBufferSize = size_t{64} << 10;
-constexpr size_t kTermsBufferSize = size_t{128} << 10;
+constexpr size_t kVectorIndexBufferSize = size_t{64} << 10;
+constexpr size_t kVectorListBufferSize = size_t{64} << 10;
+constexpr size_t kVectorTermsBufferSize = size_t{128} << 10;
 
 }  // namespace
 
 TermVectorsReader::TermVectorsReader(std::shared_ptr<const ByteSource> index,
                                      std::shared_ptr<const ByteSource> documents,
                                      std::shared_ptr<const ByteSource> fields, uint32_t field_count)
-    : index_(std::move(index), kIndexBufferSize),
-      documents_(std::move(documents), kListBufferSize),
-      fields_(std::move(fields), kTermsBufferSize),
+    : index_(std::move(index), kVectorIndexBufferSize),
+      documents_(std::move(documents), kVectorListBufferSize),
+      fields_(std::move(fields), kVectorTermsBufferSize),
       field_count_(field_count),
       seen_in_(field_count) {
   format_ = index_.ReadInt();
-  if (format_ < kOldest || format_ > kWithUtf8) {
+  if (format_ < kOldest || format_ > kWithUtf8Vectors) {
     index_.Damaged(0, "format is " + std::to_string(format_) + ", but 1 to 4 are known");
   }
   for (ByteReader* reader : {&documents_, &fields_}) {
@@ -130,7 +130,7 @@ void TermVectorsReader::PassTerms() {
 void TermVectorsReader::ReadTerm() {
   const uint64_t start = fields_.offset();
   text_before_.assign(text_);
-  format_ >= kWithUtf8 ? ReadUtf8Text(start) : ReadUtf16Text(start);
+  format_ >= kWithUtf8Vectors ? ReadUtf8Text(start) : ReadUtf16Text(start);
   if (!at_first_ && text_ <= text_before_) fields_.Damaged(start, "term does not come after the one before");
   at_first_ = false;
   const uint64_t frequency_start = fields_.offset();

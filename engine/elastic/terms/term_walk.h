@@ -1,7 +1,5 @@
 #pragma once
 
-#include <lucene++/Lucene.h>
-
 #include <functional>
 #include <memory>
 #include <optional>
@@ -14,6 +12,7 @@
 #include "elastic/format/postings.h"
 #include "elastic/format/segment_files.h"
 #include "elastic/format/term_cursor.h"
+#include "vantrel/elastic/library_types.h"
 
 namespace vantrel::elastic {
 

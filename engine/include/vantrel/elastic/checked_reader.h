@@ -1,12 +1,11 @@
 #pragma once
 
-#include <lucene++/Lucene.h>
-
 #include <cstdint>
 #include <memory>
 #include <string>
 
 #include "vantrel/elastic/export.h"
+#include "vantrel/elastic/library_types.h"
 
 namespace vantrel::elastic {
 

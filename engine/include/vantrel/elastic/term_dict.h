@@ -1,11 +1,10 @@
 #pragma once
 
-#include <lucene++/Lucene.h>
-
 #include <memory>
 #include <string>
 
 #include "vantrel/elastic/export.h"
+#include "vantrel/elastic/library_types.h"
 
 namespace vantrel::elastic {
 
