@@ -72,10 +72,12 @@ class MemoryFolder : public vantrel::elastic::format::Folder {
   std::function<void()> before_list;
   std::function<void(const std::string& name)> before_open;
   mutable int opened = 0;  // how many times a file was asked for
+  mutable int listed = 0;  // how many times the names were asked for
 
   const std::string& path() const override { return path_; }
 
   std::vector<std::string> List() const override {
+    ++listed;
     if (before_list) before_list();
     std::vector<std::string> names = {".", ".."};
     for (const auto& [name, file] : files) names.push_back(name);

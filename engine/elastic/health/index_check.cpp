@@ -30,6 +30,10 @@ constexpr size_t kMostFiles = 512;
 // How many newer commits are taken up before the index is given up as one that does not hold still.
 constexpr int kMostCommits = 100;
 
+// Findings beyond so many are kept only where they are unsafe, since a repair needs to know of those. A commit of missing
+// segments would have hundreds of thousands.
+constexpr size_t kMostFindings = 20'000;
+
 // Gathers findings from several threads.
 class Findings {
  public:
@@ -80,6 +84,7 @@ class Findings {
   }
 
   void AddLocked(const std::string& segment, HealthFinding finding) {
+    if (all_.size() >= kMostFindings && finding.grade == Grade::kDamaged) return;
     finding.segment = segment;
     all_.push_back(std::move(finding));
   }
@@ -102,7 +107,8 @@ class CommitRun {
         meter_(meter),
         manifest_(FindManifest(folder)),
         metered_(folder, meter),
-        folder_(metered_, manifest_) {}
+        folder_(metered_, manifest_),
+        shared_(folder_) {}
 
   void Run() {
     findings_.Run("", [this] { CheckCommit(folder_, commit_); });
@@ -116,7 +122,7 @@ class CommitRun {
     for (size_t next = 0; next < commit_.segments.size();) {
       std::vector<std::unique_ptr<SegmentCheck>> batch;
       for (size_t files = 0; next < commit_.segments.size() && files < kMostFiles; ++next) {
-        batch.push_back(std::make_unique<SegmentCheck>(folder_, commit_.segments[next]));
+        batch.push_back(std::make_unique<SegmentCheck>(folder_, commit_.segments[next], shared_));
         files += batch.back()->files().files_tried();
         meter_.AddSegmentOpened();
       }
@@ -200,6 +206,7 @@ class CommitRun {
   format::Manifest manifest_;
   MeteredFolder metered_;
   DigestCheckedFolder folder_;
+  format::SharedFiles shared_;
 };
 
 }  // namespace

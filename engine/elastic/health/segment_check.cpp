@@ -52,7 +52,8 @@ bool IsKnownPart(std::string_view extension, bool is_store) {
 
 }  // namespace
 
-SegmentCheck::SegmentCheck(const format::Folder& folder, const SegmentInfo& info) : files_(folder, info) {}
+SegmentCheck::SegmentCheck(const format::Folder& folder, const SegmentInfo& info, format::SharedFiles& shared)
+    : files_(folder, info, shared) {}
 
 void SegmentCheck::ReadFields() { fields_ = format::ReadFieldInfos(files_.Open(".fnm")); }
 

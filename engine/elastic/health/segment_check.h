@@ -26,8 +26,9 @@ class SegmentCheck {
     std::function<void()> run;
   };
 
-  // Opens the segment's files and reads nothing yet but the tables of compound files. Throws where the system fails.
-  SegmentCheck(const format::Folder& folder, const format::SegmentInfo& info);
+  // Opens the segment's files and reads nothing yet but the tables of compound files; `shared` is as for WholeSegment.
+  // Throws where the system fails.
+  SegmentCheck(const format::Folder& folder, const format::SegmentInfo& info, format::SharedFiles& shared);
   SegmentCheck(const SegmentCheck&) = delete;
   SegmentCheck& operator=(const SegmentCheck&) = delete;
 

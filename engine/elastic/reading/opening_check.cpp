@@ -2,7 +2,6 @@
 
 #include <algorithm>
 #include <limits>
-#include <set>
 #include <utility>
 
 #include "elastic/format/byte_reader.h"
@@ -43,19 +42,6 @@ void CheckHint(const std::shared_ptr<const format::ByteSource>& source) {
   const int64_t generation = reader.ReadLong();
   if (generation <= kNewest) return;
   reader.Damaged(4, "generation " + std::to_string(generation) + " is too large");
-}
-
-void CheckSegment(const std::string& file, const SegmentInfo& segment) {
-  const auto refuse = [&](const std::string& problem) {
-    throw IndexDamagedError(file, 0, "segment " + segment.name + " has " + problem);
-  };
-  if (segment.store_offset < SegmentInfo::kOwnStore) {
-    refuse("its documents at " + std::to_string(segment.store_offset) + " in the document store");
-  }
-  if (!segment.norm_generations.has_value()) return;
-  for (const int64_t generation : *segment.norm_generations) {
-    if (generation < SegmentInfo::kNoOwnNorms) refuse("norms of generation " + std::to_string(generation));
-  }
 }
 
 }  // namespace
@@ -106,18 +92,6 @@ void OpeningCheck::CheckCommit(const Source& source, int64_t generation) {
   current_ = nullptr;
   if (FirstInt(source) < format::kNewestCommitFormat) return;
   format::Commit commit = ReadCommit(source, generation, format::CommitChecksum::kPassOver);
-  std::set<std::string> names;
-  int64_t documents = 0;
-  for (const SegmentInfo& segment : commit.segments) {
-    CheckSegment(source->name(), segment);
-    documents += segment.document_count;
-    if (!names.insert(segment.name).second) {
-      throw IndexDamagedError(source->name(), 0, "segment " + segment.name + " is there twice");
-    }
-  }
-  if (documents > std::numeric_limits<int32_t>::max()) {
-    throw IndexDamagedError(source->name(), 0, std::to_string(documents) + " documents are too many");
-  }
   segments_.reserve(commit.segments.size());
   for (SegmentInfo& segment : commit.segments) segments_.push_back({.info = std::move(segment)});
 }

@@ -143,5 +143,41 @@ TEST_F(OwnManifestTest, DoesNotBelongAnywhereWithoutACommitInIt) {
   EXPECT_FALSE(manifest_.BelongsTo(folder_, commit_));
 }
 
+// Segments of an older layout: their files of norms are looked for in the folder.
+TEST(ManifestOfSegmentsTest, ListsTheFolderOnceForAllSegments) {
+  MemoryFolder folder;
+  folder.files["segments_2"] = MemoryFile{.bytes = "the commit"};
+  Commit commit;
+  commit.generation = 2;
+  for (const char* segment : {"_0", "_00", "_1"}) {
+    commit.segments.push_back({.name = segment, .document_count = 1});
+    for (const char* extension : {".fnm", ".f0", ".f12", ".s3", ".fx", "_2.s3"}) {
+      folder.files[std::string(segment) + extension] = MemoryFile{.bytes = "x"};
+    }
+  }
+  const Manifest manifest = MakeManifest(folder, commit);
+  EXPECT_EQ(folder.listed, 1);
+  for (const char* segment : {"_0", "_00", "_1"}) {
+    for (const char* extension : {".fnm", ".f0", ".f12", ".s3"}) {
+      EXPECT_NE(manifest.Find(std::string(segment) + extension), nullptr) << segment << extension;
+    }
+  }
+  EXPECT_EQ(manifest.files.size(), 13U);
+}
+
+// A commit may name very many files of norms: only those that are there are asked for.
+TEST(ManifestOfSegmentsTest, AsksForNoFileOfNormsThatTheFolderDoesNotList) {
+  MemoryFolder folder;
+  folder.files["segments_2"] = MemoryFile{.bytes = "the commit"};
+  folder.files["_0_1.s7"] = MemoryFile{.bytes = "x"};
+  Commit commit;
+  commit.generation = 2;
+  SegmentInfo segment{.name = "_0", .document_count = 1, .compound = SegmentInfo::Compound::kNo};
+  segment.norm_generations.emplace(1000, 1);
+  commit.segments.push_back(segment);
+  EXPECT_NE(MakeManifest(folder, commit).Find("_0_1.s7"), nullptr);
+  EXPECT_LT(folder.opened, 100);
+}
+
 }  // namespace
 }  // namespace vantrel::elastic::format

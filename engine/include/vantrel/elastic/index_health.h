@@ -57,6 +57,7 @@ struct HealthReport {
 
   int64_t generation = -1;         // of the commit that was checked; -1 where none could be read
   std::vector<std::string> files;  // that it is made of, and that were there: their paths
+  // From the 20,000th on, only those that are unsafe.
   std::vector<HealthFinding> findings;
   Manifest manifest = Manifest::kNone;
 
