@@ -3,6 +3,7 @@
 #include <gtest/gtest.h>
 
 #include "elastic/format/byte_reader.h"
+#include "elastic/format/name_budget.h"
 #include "support/byte_writer.h"
 #include "support/expect_damage.h"
 #include "support/memory_folder.h"
@@ -79,10 +80,29 @@ TEST(CompoundFileTest, RefusesTwoSubFilesOfOneName) {
   });
 }
 
+TEST(CompoundFileTest, RefusesNamesThatTakeTooMuchTogether) {
+  constexpr size_t kHalf = kMostNameBytes / 2;
+  const auto three = [](size_t last) {
+    constexpr int64_t kBegin = kMostNameBytes + 100;
+    ByteWriter bytes;
+    bytes.VInt(3).Long(kBegin).String(std::string(kHalf, 'a'));
+    bytes.Long(kBegin).String(std::string(kHalf - 1, 'b'));
+    return bytes.Long(kBegin).String(std::string(last, 'c'));
+  };
+  const auto open = [](const ByteWriter& table) {
+    return CompoundFile(SourceOf(table.bytes(), 100)).parts().size();
+  };
+  EXPECT_EQ(open(three(1)), 3U);
+  const uint64_t third = three(2).size() - 3 - sizeof(int64_t);
+  ExpectDamage(third, "names up to this one take more than 2097152 bytes", [&] { open(three(2)); });
+}
+
 TEST(CompoundFileTest, AHugeCountOverAHoleInTheFileEndsAtOnce) {
   const std::string huge = ByteWriter().VInt(-1).bytes();
   ExpectDamage(0, "sub-files are too many", [&] { CompoundFile(SourceOf(huge, uint64_t{1} << 40)); });
-  const std::string most = ByteWriter().VInt(65536).bytes();
+  const std::string too_many = ByteWriter().VInt(CompoundFile::kMostSubFiles + 1).bytes();
+  ExpectDamage(0, "sub-files are too many", [&] { CompoundFile(SourceOf(too_many, uint64_t{1} << 40)); });
+  const std::string most = ByteWriter().VInt(CompoundFile::kMostSubFiles).bytes();
   ExpectDamage(3, "table reaches", [&] { CompoundFile(SourceOf(most, uint64_t{1} << 40)); });
 }
 

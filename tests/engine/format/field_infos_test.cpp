@@ -2,6 +2,7 @@
 
 #include <gtest/gtest.h>
 
+#include "elastic/format/name_budget.h"
 #include "support/byte_writer.h"
 #include "support/expect_damage.h"
 #include "support/memory_folder.h"
@@ -106,13 +107,46 @@ TEST(FieldInfosTest, RefusesTwoFieldsOfOneName) {
 TEST(FieldInfosTest, AHugeCountOverAHoleInTheFileEndsAtOnce) {
   const std::string head = ByteWriter().VInt(-2).VInt(0x7fffffff).bytes();
   ExpectDamage(5, "fields are too many", [&] { ReadFieldInfos(SourceOf(head, uint64_t{1} << 40)); });
-  const std::string most = ByteWriter().VInt(-2).VInt(1 << 18).bytes();
+  const std::string too_many = ByteWriter().VInt(-2).VInt(kMostFields + 1).bytes();
+  ExpectDamage(5, "fields are too many", [&] { ReadFieldInfos(SourceOf(too_many, uint64_t{1} << 40)); });
+  const std::string most = ByteWriter().VInt(-2).VInt(kMostFields).bytes();
   ExpectDamage(10, "field 1 bears the name", [&] { ReadFieldInfos(SourceOf(most, uint64_t{1} << 40)); });
-  const std::string older = ByteWriter().VInt(1 << 18).bytes();
+  const std::string older = ByteWriter().VInt(kMostFields).bytes();
   ExpectDamage(5, "field 1 bears the name", [&] { ReadFieldInfos(SourceOf(older, uint64_t{1} << 40)); });
   const std::string long_name = ByteWriter().VInt(-2).VInt(1).VInt(-1).bytes();
   ExpectDamage(6, "string of 4294967295 bytes",
                [&] { ReadFieldInfos(SourceOf(long_name, uint64_t{1} << 40)); });
+}
+
+TEST(FieldInfosTest, RefusesNamesThatTakeTooMuchTogether) {
+  constexpr size_t kHalf = kMostNameBytes / 2;
+  const auto three = [](size_t last) {
+    return ByteWriter()
+        .VInt(-2)
+        .VInt(3)
+        .String(std::string(kHalf, 'a'))
+        .Byte(0)
+        .String(std::string(kHalf - 1, 'b'))
+        .Byte(0)
+        .String(std::string(last, 'c'))
+        .Byte(0);
+  };
+  EXPECT_EQ(Read(three(1)).size(), 3U);
+  const uint64_t third = three(2).size() - 4;
+  ExpectDamage(third, "names up to this one take more than 2097152 bytes", [&] { Read(three(2)); });
+}
+
+TEST(FieldInfosTest, RefusesNamesInCharactersThatTakeTooMuchTogether) {
+  const auto fields = [](std::u16string_view endings) {
+    ByteWriter bytes;
+    bytes.VInt(static_cast<int64_t>(endings.size()));
+    // Three bytes of UTF-8 each.
+    for (const char16_t ending : endings)
+      bytes.UnitsString(std::u16string(size_t{300} << 10, u'\u4e2d') + ending).Byte(0);
+    return bytes;
+  };
+  EXPECT_EQ(Read(fields(u"ab")).size(), 2U);
+  EXPECT_THROW(Read(fields(u"abc")), IndexDamagedError);
 }
 
 TEST(FieldInfosTest, PassesAMediumErrorOn) {
