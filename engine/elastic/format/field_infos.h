@@ -36,8 +36,8 @@ inline constexpr int32_t kMostFields = int32_t{1} << 16;
 // The older layout may hold its names as UTF-16 code units (see text.h); what does not read as UTF-8 to the
 // last byte is read that way.
 //
-// At most kMostFields fields, whose names take at most kMostNameBytes together (name_budget.h): more is damage. So
-// whatever the file, at most 16 MiB are taken, of which the result is 8. Throws IndexDamagedError, IndexIoError.
+// At most kMostFields fields, with names within the bounds of name_budget.h: more is damage. So whatever the file, at
+// most 16 MiB are taken, of which the result is 8. Throws IndexDamagedError, IndexIoError.
 std::vector<FieldInfo> ReadFieldInfos(const std::shared_ptr<const ByteSource>& source);
 
 }  // namespace vantrel::elastic::format

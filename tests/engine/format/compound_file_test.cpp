@@ -80,21 +80,27 @@ TEST(CompoundFileTest, RefusesTwoSubFilesOfOneName) {
   });
 }
 
-TEST(CompoundFileTest, RefusesNamesThatTakeTooMuchTogether) {
-  constexpr size_t kHalf = kMostNameBytes / 2;
-  const auto three = [](size_t last) {
-    constexpr int64_t kBegin = kMostNameBytes + 100;
+TEST(CompoundFileTest, RefusesNamesThatTakeTooMuch) {
+  constexpr int64_t kBegin = kMostNameBytes + 10'000;
+  // 512 names that take all there is, but for a byte, and one more.
+  const auto table = [](size_t first, size_t last) {
     ByteWriter bytes;
-    bytes.VInt(3).Long(kBegin).String(std::string(kHalf, 'a'));
-    bytes.Long(kBegin).String(std::string(kHalf - 1, 'b'));
-    return bytes.Long(kBegin).String(std::string(last, 'c'));
+    bytes.VInt(513);
+    for (int number = 0; number < 512; ++number) {
+      const std::string start = std::to_string(1000 + number);
+      bytes.Long(kBegin).String(start +
+                                std::string((number == 0 ? first : kLongestName) - start.size(), 'a'));
+    }
+    return bytes.Long(kBegin).String(std::string(last, 'b'));
   };
-  const auto open = [](const ByteWriter& table) {
-    return CompoundFile(SourceOf(table.bytes(), 100)).parts().size();
+  const auto open = [](const ByteWriter& bytes) {
+    return CompoundFile(SourceOf(bytes.bytes(), 10'000)).parts().size();
   };
-  EXPECT_EQ(open(three(1)), 3U);
-  const uint64_t third = three(2).size() - 3 - sizeof(int64_t);
-  ExpectDamage(third, "names up to this one take more than 2097152 bytes", [&] { open(three(2)); });
+  EXPECT_EQ(open(table(kLongestName - 1, 1)), 513U);
+  const uint64_t last_start = table(kLongestName - 1, 2).size() - 3 - sizeof(int64_t);
+  ExpectDamage(last_start, "names up to this one take more than 2097152 bytes",
+               [&] { open(table(kLongestName - 1, 2)); });
+  ExpectDamage(2, "name of 4097 bytes is too long", [&] { open(table(kLongestName + 1, 1)); });
 }
 
 TEST(CompoundFileTest, AHugeCountOverAHoleInTheFileEndsAtOnce) {

@@ -118,35 +118,44 @@ TEST(FieldInfosTest, AHugeCountOverAHoleInTheFileEndsAtOnce) {
                [&] { ReadFieldInfos(SourceOf(long_name, uint64_t{1} << 40)); });
 }
 
-TEST(FieldInfosTest, RefusesNamesThatTakeTooMuchTogether) {
-  constexpr size_t kHalf = kMostNameBytes / 2;
-  const auto three = [](size_t last) {
-    return ByteWriter()
-        .VInt(-2)
-        .VInt(3)
-        .String(std::string(kHalf, 'a'))
-        .Byte(0)
-        .String(std::string(kHalf - 1, 'b'))
-        .Byte(0)
-        .String(std::string(last, 'c'))
-        .Byte(0);
+TEST(FieldInfosTest, RefusesANameThatIsTooLong) {
+  const auto one = [](size_t length) {
+    return ByteWriter().VInt(-2).VInt(1).String(std::string(length, 'a')).Byte(0);
   };
-  EXPECT_EQ(Read(three(1)).size(), 3U);
-  const uint64_t third = three(2).size() - 4;
-  ExpectDamage(third, "names up to this one take more than 2097152 bytes", [&] { Read(three(2)); });
+  EXPECT_EQ(Read(one(kLongestName)).size(), 1U);
+  ExpectDamage(6, "name of 4097 bytes is too long", [&] { Read(one(kLongestName + 1)); });
+}
+
+TEST(FieldInfosTest, RefusesNamesThatTakeTooMuchTogether) {
+  // 512 names that take all there is, but for a byte, and one more.
+  const auto fields = [](size_t last) {
+    ByteWriter bytes;
+    bytes.VInt(-2).VInt(513);
+    for (int number = 0; number < 512; ++number) {
+      const std::string start = std::to_string(1000 + number);
+      bytes.String(start + std::string(kLongestName - start.size() - (number == 0 ? 1 : 0), 'a')).Byte(0);
+    }
+    return bytes.String(std::string(last, 'b')).Byte(0);
+  };
+  static_assert(kMostNameBytes == 512 * kLongestName);
+  EXPECT_EQ(Read(fields(1)).size(), 513U);
+  ExpectDamage(fields(2).size() - 4, "names up to this one take more than 2097152 bytes",
+               [&] { Read(fields(2)); });
 }
 
 TEST(FieldInfosTest, RefusesNamesInCharactersThatTakeTooMuchTogether) {
-  const auto fields = [](std::u16string_view endings) {
+  const auto fields = [](int count) {
     ByteWriter bytes;
-    bytes.VInt(static_cast<int64_t>(endings.size()));
-    // Three bytes of UTF-8 each.
-    for (const char16_t ending : endings)
-      bytes.UnitsString(std::u16string(size_t{300} << 10, u'\u4e2d') + ending).Byte(0);
+    bytes.VInt(count);
+    for (int number = 1; number <= count; ++number) {
+      // Three bytes of UTF-8 each.
+      const auto ending = static_cast<char16_t>(0x4e00 + number);
+      bytes.UnitsString(std::u16string(1300, u'\u4e00') + ending).Byte(0);
+    }
     return bytes;
   };
-  EXPECT_EQ(Read(fields(u"ab")).size(), 2U);
-  EXPECT_THROW(Read(fields(u"abc")), IndexDamagedError);
+  EXPECT_EQ(Read(fields(500)).size(), 500U);
+  EXPECT_THROW(Read(fields(600)), IndexDamagedError);
 }
 
 TEST(FieldInfosTest, PassesAMediumErrorOn) {

@@ -36,8 +36,8 @@ class CraftedBoundsTest : public ::testing::Test {
  protected:
   const std::string& path() const { return folder_.path(); }
 
-  // `names` field names of nearly a mebibyte each, all different, after the field that is there.
-  void AddFieldNames(const std::string& file, int names) const {
+  // Adds field names, all different and with a hole in each, to the field that is there.
+  void AddFieldNames(const std::string& file, int names, int64_t longest) const {
     std::string bytes = ReadFile(folder_ / file);
     ASSERT_EQ(bytes.substr(5, 6),
               "\x01\x04"
@@ -45,8 +45,9 @@ class CraftedBoundsTest : public ::testing::Test {
     SparseFile out(folder_ / file);
     out.Bytes(ByteWriter().VInt(-2).VInt(names + 1).Raw(bytes.substr(6)).bytes());
     for (int number = 1; number <= names; ++number) {
-      out.Bytes(ByteWriter().VInt(kMebibyte - number).bytes())
-          .Hole(static_cast<uint64_t>(kMebibyte - number) + 1);
+      const std::string start = std::to_string(number);
+      const auto rest = static_cast<uint64_t>(longest) - start.size();
+      out.Bytes(ByteWriter().VInt(longest).Raw(start).bytes()).Hole(rest + 1);  // with the flags
     }
     out.Close();
   }
@@ -67,7 +68,8 @@ class CraftedBoundsTest : public ::testing::Test {
       }
       if (!name.starts_with("_0.")) continue;
       for (int number = 1; number < segments; ++number) {
-        WriteFile(folder_ / ("_" + std::to_string(number) + name.substr(2)), ReadFile(folder_ / name));
+        std::filesystem::create_hard_link(folder_ / name,
+                                          folder_ / ("_" + std::to_string(number) + name.substr(2)));
       }
     }
     WriteFile(folder_ / "segments_1", commit.bytes());
@@ -103,9 +105,9 @@ class CraftedBoundsTest : public ::testing::Test {
 
 TEST_F(CraftedBoundsTest, FieldNamesOfGigabytesTakeLittle) {
   WriteSmallIndex(path(), false);
-  AddFieldNames("_0.fnm", 8192);
+  AddFieldNames("_0.fnm", 8192, kMebibyte);
   ExpectLittleMemory("NOT clean");
-  ExpectFinding("_0.fnm", "names up to this one take more than");
+  ExpectFinding("_0.fnm", "bytes is too long");
 }
 
 TEST_F(CraftedBoundsTest, SubFileNamesOfGigabytesTakeLittle) {
@@ -119,15 +121,15 @@ TEST_F(CraftedBoundsTest, SubFileNamesOfGigabytesTakeLittle) {
     out.Bytes(ByteWriter().Long(kBegin + 32 * kNames).VInt(kMebibyte - number).bytes());
     out.Hole(static_cast<uint64_t>(kMebibyte - number));
   }
-  out.Hole(64 * kNames).Close();
+  out.Hole(64 * kMebibyte).Close();
   ExpectLittleMemory("NOT clean");
-  ExpectFinding("_0.cfs", "names up to this one take more than");
+  ExpectFinding("_0.cfs", "bytes is too long");
 }
 
 TEST_F(CraftedBoundsTest, FieldNamesOfManySegmentsTakeLittle) {
   WriteSmallIndex(path(), false);
-  AddFieldNames("_0.fnm", 1);
-  Multiply(100);
+  AddFieldNames("_0.fnm", 500, 4096);
+  Multiply(60);
   ExpectLittleMemory("clean");
 }
 

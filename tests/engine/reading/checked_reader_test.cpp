@@ -15,6 +15,7 @@
 
 #include "engine/health/health_shapes.h"
 #include "support/run_size.h"
+#include "support/small_index.h"
 #include "support/temporary_folder.h"
 #include "support/varied_index.h"
 #include "vantrel/elastic/library_setup.h"
@@ -131,6 +132,15 @@ TEST_P(CheckedReaderTest, AnswersAsTheLibraryDoes) {
     ASSERT_TRUE(WIFEXITED(status) && WEXITSTATUS(status) == 0) << command;
   }
   ExpectSame(folder_.path());
+}
+
+TEST(CheckedReaderUseTest, PositionsOfAReaderForTermVectorsAreAnError) {
+  vantrel::elastic::PrepareIndexLibrary();
+  const TemporaryFolder folder;
+  WriteSmallIndex(folder.path(), false);
+  const CheckedReader checked(folder.path());
+  EXPECT_THROW(checked.Positions(0), Lucene::IllegalStateException);
+  EXPECT_TRUE(checked.TermVector(0, L"body"));
 }
 
 // Three levels of skip data, with and without payloads.
