@@ -55,7 +55,8 @@ class CraftedBoundsTest : public ::testing::Test {
   // The only segment, so many times.
   void Multiply(int segments) const {
     ByteWriter commit;
-    commit.Int(-4).Long(1).Int(segments).Int(segments);
+    constexpr int kNextNumber = 100'000;  // names are counted in base 36
+    commit.Int(-4).Long(1).Int(kNextNumber).Int(segments);
     for (int number = 0; number < segments; ++number) {
       const std::string name = "_" + std::to_string(number);
       commit.String(name).Int(3);
@@ -73,6 +74,26 @@ class CraftedBoundsTest : public ::testing::Test {
       }
     }
     WriteFile(folder_ / "segments_1", commit.bytes());
+  }
+
+  // 8 MiB of compressed values in the first document, which become 8 GiB.
+  void WriteInflatingValues() const {
+    constexpr size_t kValueSize = 16 * kMebibyte;
+    constexpr int kValues = 512;
+    const std::string text(kValueSize, 'x');
+    std::string value(compressBound(kValueSize), '\0');
+    uLongf length = value.size();
+    ASSERT_EQ(compress2(reinterpret_cast<Bytef*>(value.data()), &length,
+                        reinterpret_cast<const Bytef*>(text.data()), text.size(), 9),
+              Z_OK);
+    value.resize(length);
+    ByteWriter records;
+    records.Int(1).VInt(kValues);
+    for (int left = kValues; left > 0; --left) records.VInt(0).Byte(4).String(value);
+    const auto second = static_cast<int64_t>(records.size());
+    records.VInt(0).VInt(0);
+    WriteFile(folder_ / "_0.fdt", records.bytes());
+    WriteFile(folder_ / "_0.fdx", ByteWriter().Int(1).Long(4).Long(second).Long(second + 1).bytes());
   }
 
   // The check and every lookup; `verdict` is what the check prints.
@@ -135,21 +156,7 @@ TEST_F(CraftedBoundsTest, FieldNamesOfManySegmentsTakeLittle) {
 
 TEST_F(CraftedBoundsTest, StoredValuesThatInflateToGigabytesTakeLittle) {
   WriteSmallIndex(path(), false);
-  constexpr size_t kValueSize = 16 * kMebibyte;
-  constexpr int kValues = 512;
-  std::string value(compressBound(kValueSize), '\0');
-  uLongf length = value.size();
-  ASSERT_EQ(compress2(reinterpret_cast<Bytef*>(value.data()), &length,
-                      reinterpret_cast<const Bytef*>(std::string(kValueSize, 'x').data()), kValueSize, 9),
-            Z_OK);
-  value.resize(length);
-  ByteWriter records;
-  records.Int(1).VInt(kValues);
-  for (int left = kValues; left > 0; --left) records.VInt(0).Byte(4).String(value);
-  const auto second = static_cast<int64_t>(records.size());
-  records.VInt(0).VInt(0);
-  WriteFile(folder_ / "_0.fdt", records.bytes());
-  WriteFile(folder_ / "_0.fdx", ByteWriter().Int(1).Long(4).Long(second).Long(second + 1).bytes());
+  ASSERT_NO_FATAL_FAILURE(WriteInflatingValues());
   ExpectLittleMemory("NOT clean");
   ExpectFinding("_0.fdt", "inflate to more than 32 times their size");
 }
