@@ -1,5 +1,6 @@
 #include "elastic/format/whole_segment.h"
 
+#include <functional>
 #include <utility>
 
 #include "elastic/format/file_names.h"
@@ -189,6 +190,18 @@ std::shared_ptr<const ByteSource> WholeSegment::OpenNorms(size_t field) const {
 
 std::shared_ptr<const ByteSource> WholeSegment::OpenDeletions() const {
   return has_deletions_ ? Open(".del") : nullptr;
+}
+
+uint64_t WholeSegment::NamesMemory() const {
+  constexpr uint64_t kPerSlot = 512;  // with the view of a sub-file
+  constexpr uint64_t kPerSubFile = 128;
+  uint64_t bytes = slots_.size() * kPerSlot;
+  for (const auto& slot : {std::cref(compound_), std::cref(store_)}) {
+    const std::optional<CompoundSlot>& compound = slot.get();
+    if (!compound.has_value() || !compound->file.has_value()) continue;
+    bytes += compound->file->table_end() + compound->file->parts().size() * kPerSubFile;
+  }
+  return bytes;
 }
 
 std::vector<WholeSegment::Compound> WholeSegment::Compounds() const {

@@ -58,6 +58,9 @@ class WholeSegment {
   // How many files it holds open, or could not open: one at least.
   size_t files_tried() const { return files_tried_; }
 
+  // About how much memory the names of sub-files take, in bytes: at most 12 MiB.
+  uint64_t NamesMemory() const;
+
  private:
   // A file, or why it cannot be opened; neither where there is none.
   struct Slot {

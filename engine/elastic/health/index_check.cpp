@@ -27,6 +27,9 @@ namespace {
 // limit of open files. Those that are missing count: why they are takes memory.
 constexpr size_t kMostFiles = 512;
 
+// How much memory the names in those segments may take before no more of them are opened.
+constexpr uint64_t kMostNamesMemory = uint64_t{8} << 20;
+
 // How many newer commits are taken up before the index is given up as one that does not hold still.
 constexpr int kMostCommits = 100;
 
@@ -121,9 +124,14 @@ class CommitRun {
     meter_.SetSegments(commit_.segments.size());
     for (size_t next = 0; next < commit_.segments.size();) {
       std::vector<std::unique_ptr<SegmentCheck>> batch;
-      for (size_t files = 0; next < commit_.segments.size() && files < kMostFiles; ++next) {
-        batch.push_back(std::make_unique<SegmentCheck>(folder_, commit_.segments[next], shared_));
-        files += batch.back()->files().files_tried();
+      size_t files = 0;
+      uint64_t names = 0;
+      for (; next < commit_.segments.size() && files < kMostFiles && names < kMostNamesMemory; ++next) {
+        SegmentCheck& segment =
+            *batch.emplace_back(std::make_unique<SegmentCheck>(folder_, commit_.segments[next], shared_));
+        findings_.Run(segment.files().info().name, [&] { segment.ReadFields(); });
+        files += segment.files().files_tried();
+        names += segment.NamesMemory();
         meter_.AddSegmentOpened();
       }
       RunBatch(batch);
@@ -159,7 +167,6 @@ class CommitRun {
   void RunBatch(const std::vector<std::unique_ptr<SegmentCheck>>& batch) {
     std::vector<SegmentCheck::Part> parts;
     for (const auto& segment : batch) {
-      findings_.Run(segment->files().info().name, [&] { segment->ReadFields(); });
       std::vector<SegmentCheck::Part> more = segment->Parts();
       std::move(more.begin(), more.end(), std::back_inserter(parts));
     }

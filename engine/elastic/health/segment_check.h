@@ -40,6 +40,9 @@ class SegmentCheck {
 
   const format::WholeSegment& files() const { return files_; }
 
+  // About how much memory the names of its fields and sub-files take, in bytes: at most 20 MiB.
+  uint64_t NamesMemory() const;
+
  private:
   void CheckFields() const;
   void CheckCompounds() const;

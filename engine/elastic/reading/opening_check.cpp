@@ -30,6 +30,10 @@ void ReadAlong(Check check) {
   }
 }
 
+// Of all segments together. The library takes about half a kibibyte for a field, and sixteen bytes for one of a name.
+constexpr uint64_t kMostNames = uint64_t{1} << 17;
+constexpr uint64_t kMostNameBytesOfAll = uint64_t{4} << 20;
+
 int32_t FirstInt(const std::shared_ptr<const format::ByteSource>& source) {
   return ByteReader(source, sizeof(int32_t)).ReadInt();
 }
@@ -73,7 +77,7 @@ void OpeningCheck::Check(const std::string& name, const Source& source) {
   if (extension == ".cfs") {
     CheckCompound(source);
   } else if (extension == ".cfx") {
-    ReadAlong([&] { current_->store_compound.emplace(source); });
+    ReadAlong([&] { CountSubFiles(current_->store_compound.emplace(source)); });
   } else if (extension == ".fnm") {
     ReadAlong([&] { CheckFields(source); });
   } else if (extension == ".tis") {
@@ -90,6 +94,7 @@ void OpeningCheck::Check(const std::string& name, const Source& source) {
 void OpeningCheck::CheckCommit(const Source& source, int64_t generation) {
   segments_.clear();
   current_ = nullptr;
+  names_ = name_bytes_ = 0;
   if (FirstInt(source) < format::kNewestCommitFormat) return;
   format::Commit commit = ReadCommit(source, generation, format::CommitChecksum::kPassOver);
   segments_.reserve(commit.segments.size());
@@ -99,11 +104,24 @@ void OpeningCheck::CheckCommit(const Source& source, int64_t generation) {
 // The library opens the files within on its own.
 void OpeningCheck::CheckCompound(const Source& source) {
   ReadAlong([&] {
-    current_->compound.emplace(source);
+    CountSubFiles(current_->compound.emplace(source));
     if (const Source fields = current_->Core(".fnm")) CheckFields(fields);
     if (const Source dictionary = current_->Core(".tis")) CheckDictionary(dictionary);
     if (const Source index = current_->Core(".tii")) CheckTermsIndex(index);
   });
+}
+
+void OpeningCheck::CountSubFiles(const format::CompoundFile& compound) {
+  for (const auto& [name, part] : compound.parts()) CountName(compound.source().name(), name);
+}
+
+void OpeningCheck::CountName(const std::string& file, const std::string& name) {
+  name_bytes_ += name.size();
+  if (++names_ <= kMostNames && name_bytes_ <= kMostNameBytesOfAll) return;
+  throw IndexDamagedError(file, 0,
+                          "the segments up to this one have more than " + std::to_string(kMostNames) +
+                              " fields and sub-files, or names of more than " +
+                              std::to_string(kMostNameBytesOfAll) + " bytes");
 }
 
 void OpeningCheck::CheckFields(const Source& source) {
@@ -120,6 +138,7 @@ void OpeningCheck::CheckFields(const Source& source) {
   }
   // Terms of a field whose name the library loses are compared, and end, elsewhere than by the name in the file.
   for (const format::FieldInfo& field : current_->fields) {
+    CountName(source->name(), field.name);
     if (!format::IsKeptText(field.name)) {
       start.Damaged(field.offset,
                     "the index library cannot keep the field name " + format::Quoted(field.name));

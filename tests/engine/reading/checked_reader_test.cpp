@@ -20,6 +20,7 @@
 #include "support/open_files.h"
 #include "support/run_size.h"
 #include "support/sanitized.h"
+#include "support/small_index.h"
 #include "support/temporary_folder.h"
 #include "support/varied_index.h"
 #include "support/without_rights.h"
@@ -138,6 +139,15 @@ TEST_P(CheckedReaderTest, AnswersAsTheLibraryDoes) {
     ASSERT_TRUE(WIFEXITED(status) && WEXITSTATUS(status) == 0) << command;
   }
   ExpectSame(folder_.path());
+}
+
+TEST(CheckedReaderUseTest, PositionsOfAReaderForTermVectorsAreAnError) {
+  vantrel::elastic::PrepareIndexLibrary();
+  const TemporaryFolder folder;
+  WriteSmallIndex(folder.path(), false);
+  const CheckedReader checked(folder.path());
+  EXPECT_THROW(checked.Positions(0), Lucene::IllegalStateException);
+  EXPECT_TRUE(checked.TermVector(0, L"body"));
 }
 
 // Three levels of skip data, with and without payloads.
