@@ -126,8 +126,10 @@ void StoredFieldsReader::PassCompressed(uint64_t start, uint64_t length) {
   const bool is_text = (flags_ & kBinary) == 0;
   while (length > 0) {
     const auto piece = records_.Take(length);
-    const bool good = inflater.Take(
-        piece, [&](std::span<const uint8_t> inflated) { return !is_text || scanner.Take(inflated); });
+    const bool good = inflater.Take(piece, [&](std::span<const uint8_t> inflated) {
+      records_.AllowCancel();
+      return !is_text || scanner.Take(inflated);
+    });
     if (!good) records_.Damaged(start, "compressed value cannot be inflated to what it should be");
     length -= piece.size();
   }
