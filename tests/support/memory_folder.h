@@ -23,6 +23,7 @@ struct MemoryFile {
   std::string bytes = {};
   uint64_t zeros_after = 0;                  // a hole that follows the bytes, as in a sparse file
   std::optional<uint64_t> broken_from = {};  // reading this byte or a later one is a medium error
+  std::function<void()> before_read = {};    // called by whichever thread reads
 };
 
 class MemorySource : public vantrel::elastic::format::ByteSource {
@@ -35,6 +36,7 @@ class MemorySource : public vantrel::elastic::format::ByteSource {
   // Asked for bytes past its size, it fails as a file does that shrank.
   void ReadAt(uint64_t offset, std::span<uint8_t> out) const override {
     using vantrel::elastic::IndexIoError;
+    if (file_.before_read) file_.before_read();
     if (offset > size() || out.size() > size() - offset) {
       throw IndexIoError(name_, "read past the end of the source", EINVAL);
     }

@@ -80,6 +80,10 @@ class ByteReader {
   // longer, or may be, or the source ends.
   bool PassShortVInts(uint64_t count);
 
+  // Throws where what watches the source (WatchedFolder) cancels. Reads do the same; this is for work out of proportion
+  // to the bytes read.
+  void AllowCancel() const { source_->ReadAt(0, {}); }
+
   // A string; throws also when it is not valid UTF-8, or longer than kLongestText.
   std::string ReadString();
 

@@ -135,6 +135,7 @@ void StoredFieldsReader::PassCompressed(uint64_t start, uint64_t length) {
       value_size += inflated.size();
       inflated_ += inflated.size();
       RequireWithinBounds(start, value_size);
+      records_.AllowCancel();
       return !is_text || scanner.Take(inflated);
     });
     if (!good) records_.Damaged(start, "compressed value cannot be inflated to what it should be");

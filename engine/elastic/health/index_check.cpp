@@ -12,9 +12,10 @@
 #include "elastic/format/file_names.h"
 #include "elastic/format/manifest.h"
 #include "elastic/format/opening_error.h"
+#include "elastic/format/watched_folder.h"
 #include "elastic/health/commit_check.h"
 #include "elastic/health/digest_check.h"
-#include "elastic/health/metered_folder.h"
+#include "elastic/health/meter.h"
 #include "elastic/health/mismatch.h"
 #include "elastic/health/parallel.h"
 #include "elastic/health/segment_check.h"
@@ -211,7 +212,7 @@ class CommitRun {
   Findings findings_;
   HealthReport::Manifest manifest_use_ = HealthReport::Manifest::kNone;
   format::Manifest manifest_;
-  MeteredFolder metered_;
+  format::WatchedFolder metered_;
   DigestCheckedFolder folder_;
   format::SharedFiles shared_;
 };
@@ -220,7 +221,7 @@ class CommitRun {
 
 HealthReport CheckFolder(const format::Folder& folder, const HealthOptions& options) {
   Meter meter(options.progress);
-  const MeteredFolder metered(folder, meter);
+  const format::WatchedFolder metered(folder, meter);
   for (int left = kMostCommits;; --left) {
     HealthReport report;
     format::Commit commit;
@@ -241,7 +242,7 @@ HealthReport CheckFolder(const format::Folder& folder, const HealthOptions& opti
     report.manifest = run.manifest_use();
     report.findings = run.findings().Take();
     report.files = meter.TakeFiles();
-    meter.Tell();
+    meter.Report();
     // Not by the names alone: a newer one that is incomplete does not take over.
     format::Commit newest;
     if (run.findings().file_is_missing()) finding_it.Run("", [&] { newest = FindCommit(metered); });

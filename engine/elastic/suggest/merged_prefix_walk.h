@@ -10,7 +10,7 @@
 namespace vantrel::elastic {
 
 // Several walks together, each term once, in the order of their bytes. For one thread at a time. Everything may
-// throw IndexError and SearchTimeoutError.
+// throw what a PrefixWalk throws.
 class MergedPrefixWalk {
  public:
   explicit MergedPrefixWalk(std::vector<std::unique_ptr<PrefixWalk>> walks);

@@ -4,10 +4,8 @@
 
 namespace vantrel::elastic {
 
-PrefixWalk::PrefixWalk(format::SegmentFiles files, const std::string& field, std::string prefix,
-                       Deadline& deadline)
+PrefixWalk::PrefixWalk(format::SegmentFiles files, const std::string& field, std::string prefix)
     : files_(std::move(files)),
-      deadline_(deadline),
       fields_(format::ReadFieldInfos(files_.field_infos)),
       order_(fields_, field, std::move(prefix)),
       passed_(order_),
@@ -53,7 +51,6 @@ bool PrefixWalk::Next() {
 // To the next term of the part, and behind its last one to the place that the index tells.
 bool PrefixWalk::Advance() {
   if (at_end_) return false;
-  deadline_.Check();
   const bool has_next = cursor_.Next();
   if (has_next) CheckEntry();
   if (!has_next || number_ == part_.end_number) {
@@ -91,8 +88,8 @@ bool PrefixWalk::IsLiveAtFirstSight() {
 
 bool PrefixWalk::IsLive() {
   return files_.deletions == nullptr ||
-         live_filter().IsLive(cursor_.info(), fields_[static_cast<size_t>(cursor_.field())].omits_frequencies,
-                              [this] { deadline_.Check(); });
+         live_filter().IsLive(cursor_.info(),
+                              fields_[static_cast<size_t>(cursor_.field())].omits_frequencies);
 }
 
 }  // namespace vantrel::elastic

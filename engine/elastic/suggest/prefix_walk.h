@@ -9,17 +9,15 @@
 #include "elastic/format/field_infos.h"
 #include "elastic/format/segment_files.h"
 #include "elastic/format/term_cursor.h"
-#include "elastic/suggest/deadline.h"
 #include "elastic/suggest/dictionary_part.h"
 #include "elastic/suggest/term_order.h"
-#include "elastic/terms/term_walk.h"
+#include "elastic/terms/live_term_filter.h"
 
 namespace vantrel::elastic {
 
 // The terms of one field of a segment that begin with certain bytes, in the dictionary's order. It begins near the
 // first of them, by the index over the dictionary, and ends near the last: what it takes does not hang on the other
-// terms. For one thread at a time. Everything may throw IndexError and
-// SearchTimeoutError.
+// terms. For one thread at a time. Everything may throw IndexError, and what reading the files throws.
 //
 // It reads whole blocks of the dictionary, a block being what lies between two entries of the index, to the end of the
 // one that holds the last term. Every term and every entry that it passes must come after the one before it, and the
@@ -32,8 +30,7 @@ namespace vantrel::elastic {
 // Of the segment's files it holds the dictionary open and, where documents are deleted, what tells of them.
 class PrefixWalk {
  public:
-  // The deadline must outlive it, and is looked at for each term and each posting that is read.
-  PrefixWalk(format::SegmentFiles files, const std::string& field, std::string prefix, Deadline& deadline);
+  PrefixWalk(format::SegmentFiles files, const std::string& field, std::string prefix);
   PrefixWalk(const PrefixWalk&) = delete;
   PrefixWalk& operator=(const PrefixWalk&) = delete;
 
@@ -63,7 +60,6 @@ class PrefixWalk {
   LiveTermFilter& live_filter();
 
   format::SegmentFiles files_;
-  Deadline& deadline_;
   std::vector<format::FieldInfo> fields_;
   TermOrder order_;
   AscendingTerms passed_;

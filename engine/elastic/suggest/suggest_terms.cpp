@@ -1,13 +1,14 @@
-#include "vantrel/elastic/suggest_terms.h"
+#include "elastic/suggest/suggest_terms_in.h"
 
 #include <algorithm>
+#include <deque>
 #include <limits>
 #include <memory>
 #include <utility>
 
-#include "elastic/format/folder.h"
 #include "elastic/format/segment_files.h"
 #include "elastic/format/text.h"
+#include "elastic/format/watched_folder.h"
 #include "elastic/suggest/best_terms.h"
 #include "elastic/suggest/deadline.h"
 #include "elastic/suggest/merged_prefix_walk.h"
@@ -16,14 +17,13 @@
 namespace vantrel::elastic {
 namespace {
 
-MergedPrefixWalk OpenWalk(const std::vector<std::string>& folders, const SuggestRequest& request,
+MergedPrefixWalk OpenWalk(const std::vector<const format::Folder*>& folders, const SuggestRequest& request,
                           Deadline& deadline) {
   std::vector<std::unique_ptr<PrefixWalk>> walks;
-  for (const std::string& path : folders) {
-    const format::DiskFolder folder(path);
-    for (format::SegmentFiles& files : format::OpenNewestSegments(folder, format::Need::kAll)) {
-      walks.push_back(
-          std::make_unique<PrefixWalk>(std::move(files), request.field, request.prefix, deadline));
+  for (const format::Folder* const folder : folders) {
+    const format::WatchedFolder watched(*folder, deadline);
+    for (format::SegmentFiles& files : format::OpenNewestSegments(watched, format::Need::kAll)) {
+      walks.push_back(std::make_unique<PrefixWalk>(std::move(files), request.field, request.prefix));
     }
   }
   return MergedPrefixWalk(std::move(walks));
@@ -38,8 +38,8 @@ uint64_t Wanted(const SuggestRequest& request) {
 
 }  // namespace
 
-std::vector<SuggestedTerm> SuggestTerms(const std::vector<std::string>& folders,
-                                        const SuggestRequest& request) {
+std::vector<SuggestedTerm> SuggestTermsIn(const std::vector<const format::Folder*>& folders,
+                                          const SuggestRequest& request) {
   Deadline deadline(request.time_limit);
   const uint64_t wanted = Wanted(request);
   BestTerms best(wanted);
@@ -55,6 +55,14 @@ std::vector<SuggestedTerm> SuggestTerms(const std::vector<std::string>& folders,
   terms.erase(terms.begin(),
               terms.begin() + static_cast<ptrdiff_t>(std::min<uint64_t>(request.skip, terms.size())));
   return terms;
+}
+
+std::vector<SuggestedTerm> SuggestTerms(const std::vector<std::string>& folders,
+                                        const SuggestRequest& request) {
+  std::deque<format::DiskFolder> opened;
+  std::vector<const format::Folder*> pointers;
+  for (const std::string& path : folders) pointers.push_back(&opened.emplace_back(path));
+  return SuggestTermsIn(pointers, request);
 }
 
 }  // namespace vantrel::elastic

@@ -9,21 +9,6 @@
 
 namespace vantrel::elastic {
 
-LiveTermFilter::LiveTermFilter(const format::SegmentFiles& files)
-    : deletions_(files.deletions, files.info.document_count),
-      postings_(files.postings, files.info.document_count) {}
-
-bool LiveTermFilter::IsLive(const format::TermInfo& term, bool omits_frequencies,
-                            const std::function<void()>& on_posting) {
-  if (IsLiveAtFirstSight(term)) return true;
-  postings_.Seek(term, omits_frequencies);
-  while (postings_.Next()) {
-    if (on_posting) on_posting();
-    if (!deletions_.Contains(postings_.document())) return true;
-  }
-  return false;
-}
-
 TermWalk::TermWalk(format::SegmentFiles files, bool live_only)
     : files_(std::move(files)), fields_(format::ReadFieldInfos(files_.field_infos)), cursor_(OpenCursor()) {
   if (live_only && files_.liveness_failure != nullptr) std::rethrow_exception(files_.liveness_failure);

@@ -41,10 +41,9 @@ TEST(PrefixWalkTest, HoldsOnlyTheFilesOpenThatItStillReads) {
     index.Delete("id", "0");
     index.Commit();
   }
-  Deadline deadline(std::chrono::milliseconds(0));
   std::vector<std::unique_ptr<PrefixWalk>> walks;
   for (auto& files : format::OpenNewestSegments(format::DiskFolder(folder.path()), format::Need::kAll)) {
-    walks.push_back(std::make_unique<PrefixWalk>(std::move(files), "body", "te", deadline));
+    walks.push_back(std::make_unique<PrefixWalk>(std::move(files), "body", "te"));
   }
   ASSERT_EQ(walks.size(), static_cast<size_t>(kSegments));
   const std::map<std::string, int> expected = {{".tis", kSegments}, {".frq", 1}, {".del", 1}};
