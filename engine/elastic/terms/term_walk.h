@@ -2,39 +2,19 @@
 
 #include <lucene++/Lucene.h>
 
-#include <functional>
 #include <memory>
 #include <optional>
 #include <string>
 #include <string_view>
 #include <vector>
 
-#include "elastic/format/deletions.h"
+#include "elastic/format/dictionary_walk.h"
 #include "elastic/format/field_infos.h"
-#include "elastic/format/postings.h"
 #include "elastic/format/segment_files.h"
 #include "elastic/format/term_cursor.h"
+#include "elastic/terms/live_term_filter.h"
 
 namespace vantrel::elastic {
-
-// Tells whether a term still has a document that is not deleted.
-class LiveTermFilter {
- public:
-  explicit LiveTermFilter(const format::SegmentFiles& files);
-
-  // Not all of its documents can be deleted: most terms are settled so, without a look at their postings.
-  bool IsLiveAtFirstSight(const format::TermInfo& term) const {
-    return term.document_frequency > deletions_.count();
-  }
-
-  // `on_posting` is called for each posting that is read, if there is one; it may throw to end this.
-  bool IsLive(const format::TermInfo& term, bool omits_frequencies,
-              const std::function<void()>& on_posting = nullptr);
-
- private:
-  format::Deletions deletions_;
-  format::PostingsReader postings_;
-};
 
 // What stands behind a TermDict: one pass over a segment's dictionary, all terms or the live ones only.
 class TermWalk {
@@ -53,12 +33,14 @@ class TermWalk {
 
  private:
   format::TermCursor OpenCursor() const;
+  const format::TermCursor& cursor() const { return near_ != nullptr ? near_->cursor() : cursor_; }
   bool IsWanted(const format::TermCursor& cursor);
   const Lucene::String& WideFieldName(int32_t field);
 
   format::SegmentFiles files_;
   std::vector<format::FieldInfo> fields_;
   format::TermCursor cursor_;
+  std::unique_ptr<format::DictionaryWalk> near_;  // instead of the cursor, where the walk begins elsewhere
   std::optional<LiveTermFilter> live_filter_;
   std::optional<uint64_t> count_;
   bool at_term_ = false;
