@@ -91,7 +91,7 @@ void AddDictionaries(const Corpus& corpus, const std::string& folder, const std:
       const ByteWriter wanted = ByteWriter().String("body").String(text);
       const std::string seed = name + std::to_string(turn) + "-" + text;
       corpus.Add("suggest", seed, ByteWriter(wanted).Byte(5).Raw(bytes).bytes());
-      corpus.Add("term_walk", seed, ByteWriter(wanted).Byte(static_cast<int>(turn)).Raw(bytes).bytes());
+      corpus.Add("merged_terms", seed, ByteWriter(wanted).Byte(static_cast<int>(turn)).Raw(bytes).bytes());
     }
     std::rotate(files.begin(), files.begin() + 1, files.end());
   }

@@ -2,6 +2,7 @@
 
 #include <lucene++/LuceneHeaders.h>
 
+#include <algorithm>
 #include <exception>
 #include <utility>
 
@@ -38,26 +39,6 @@ uint64_t TermWalk::Count() {
     count_ = live;
   }
   return *count_;
-}
-
-// Entry k of the index tells where term k times the interval begins, and what stands before it. Dictionaries are
-// sorted by the fields' names, then by text, and UTF-8 sorts by its bytes as by its code points.
-void TermWalk::StartNear(const std::string& field, std::string_view text) {
-  if (files_.terms_index == nullptr || !cursor_.is_utf8()) return;
-  format::TermCursor index(files_.terms_index, format::TermCursor::File::kIndex,
-                           static_cast<uint32_t>(fields_.size()), files_.info.document_count);
-  const auto is_before = [&] {
-    if (index.field() < 0) return true;  // the first entry
-    const int order = fields_[static_cast<size_t>(index.field())].name.compare(field);
-    return order < 0 || (order == 0 && index.text() < text);
-  };
-  format::TermPlace place;
-  uint64_t entries = 0;
-  while (index.Next() && is_before()) {
-    index.CopyPlace(place);
-    ++entries;
-  }
-  if (entries > 0) cursor_.Resume(place, (entries - 1) * static_cast<uint64_t>(cursor_.index_interval()));
 }
 
 bool TermWalk::Next() {

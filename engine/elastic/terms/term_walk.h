@@ -24,7 +24,6 @@ class TermWalk {
   // The number of terms from first to last; counted by a pass of its own where the header does not tell.
   uint64_t Count();
 
-  void StartNear(const std::string& field, std::string_view text);
   bool Next();
   Lucene::TermPtr Term();
 
