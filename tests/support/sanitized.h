@@ -3,7 +3,7 @@
 namespace quorelastic::testing {
 
 // Whether a sanitizer watches: it takes memory of its own, and ends a process that runs out.
-#if defined(__SANITIZE_ADDRESS__) || defined(__SANITIZE_THREAD__)
+#ifdef QUORELASTIC_SANITIZED
 inline constexpr bool kIsSanitized = true;
 #else
 inline constexpr bool kIsSanitized = false;

@@ -49,7 +49,8 @@ class Lines {
   std::string_view Word() {
     const size_t end = std::min(text_.find_first_of(" \n", at_), text_.size());
     if (end == at_) Refuse("a word is missing");
-    return text_.substr(std::exchange(at_, end), end - at_);
+    const size_t start = std::exchange(at_, end);
+    return text_.substr(start, end - start);
   }
   template <typename Number>
   Number TakeNumber(int base = 10) {

@@ -37,8 +37,8 @@ TermVectorsReader::TermVectorsReader(std::shared_ptr<const ByteSource> index,
           0, "format is " + std::to_string(again) + ", but the index has format " + std::to_string(format_));
     }
   }
-  text_ = TermText(format_ >= kWithUtf8);
-  order_ = OrderOfTerms(format_ >= kWithUtf8);
+  text_ = TermText(format_ >= kWithUtf8Vectors);
+  order_ = OrderOfTerms(format_ >= kWithUtf8Vectors);
   entry_size_ = index_tells_terms_start() ? 16 : 8;
   if ((index_.size() - kHeader) % entry_size_ != 0) {
     index_.Damaged(index_.size(), "the file ends within an entry");
