@@ -16,7 +16,7 @@ using ::testing::IsEmpty;
 using ::testing::IsSubsetOf;
 using ::testing::Le;
 using ::testing::SizeIs;
-using Names = std::set<std::string>;
+using SegmentSet = std::set<std::string>;
 
 std::vector<std::string> Segments(int count) {
   std::vector<std::string> names;
@@ -30,11 +30,11 @@ std::vector<std::string> Segments(int count) {
 class BlameTest : public ::testing::Test {
  protected:
   // Of a run that fails where all segments of one of `harmful` are there.
-  Names Find(const std::vector<std::string>& suspects, const std::vector<Names>& harmful) {
+  SegmentSet Find(const std::vector<std::string>& suspects, const std::vector<SegmentSet>& harmful) {
     trials_ = 0;
-    return FindBlame(suspects, [&](const Names& without) {
+    return FindBlame(suspects, [&](const SegmentSet& without) {
       ++trials_;
-      return std::none_of(harmful.begin(), harmful.end(), [&](const Names& together) {
+      return std::none_of(harmful.begin(), harmful.end(), [&](const SegmentSet& together) {
         return std::none_of(together.begin(), together.end(),
                             [&](const std::string& name) { return without.contains(name); });
       });
@@ -70,13 +70,13 @@ TEST_F(BlameTest, IsOfNoSegmentWithoutSuspects) {
 
 TEST_F(BlameTest, IsOfTheRestWhereTheTrialsAreUsedUp) {
   const std::vector<std::string> suspects = Segments(1000);
-  std::vector<Names> harmful;
-  Names odd;
+  std::vector<SegmentSet> harmful;
+  SegmentSet odd;
   for (size_t i = 1; i < suspects.size(); i += 2) {
     harmful.push_back({suspects[i]});
     odd.insert(suspects[i]);
   }
-  const Names blamed = Find(suspects, harmful);
+  const SegmentSet blamed = Find(suspects, harmful);
   EXPECT_EQ(trials_, kMostBlameTrials);
   EXPECT_THAT(odd, IsSubsetOf(blamed));
   EXPECT_THAT(blamed, SizeIs(Le(suspects.size())));
