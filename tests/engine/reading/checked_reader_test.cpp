@@ -162,7 +162,7 @@ TEST(CheckedReaderSkipTest, JumpsAsTheLibraryDoes) {
 // QUORELASTIC_HEALTHY_INDEXES makes it a longer campaign.
 TEST(CheckedReaderRandomTest, AnswersAsTheLibraryDoesOnAnyIndex) {
   vantrel::elastic::PrepareIndexLibrary();
-  const int indexes = RunSize("QUORELASTIC_HEALTHY_INDEXES", 12);
+  const int indexes = RunSize("QUORELASTIC_HEALTHY_INDEXES", 12 / kFewer);
   for (int i = 0; i < indexes; ++i) {
     SCOPED_TRACE("seed " + std::to_string(31000 + i));
     const TemporaryFolder folder;
