@@ -21,7 +21,7 @@ constexpr size_t kTermsBufferSize = size_t{64} << 10;
 constexpr uint64_t kLargestPointer = std::numeric_limits<int64_t>::max();
 
 // The most bytes that a term's numbers take, before its text and behind it.
-constexpr size_t kLengths = 2 * 5;
+constexpr size_t kLengths = size_t{2} * 5;
 constexpr size_t kNumbers = 3 * 5 + 3 * 9;
 
 // Decodes numbers that lie within a window. What is not well-formed is left to the reader, which reports it.

@@ -165,6 +165,7 @@ class Checker {
     std::stable_sort(segments.begin(), segments.end(),
                      [](const auto& left, const auto& right) { return CountLive(left) > CountLive(right); });
     std::vector<std::string> sorted;
+    sorted.reserve(segments.size());
     for (const format::SegmentInfo& segment : segments) sorted.push_back(segment.name);
     return sorted;
   }

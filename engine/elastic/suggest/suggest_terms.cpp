@@ -81,6 +81,7 @@ std::vector<SuggestedTerm> SuggestTerms(const std::vector<std::string>& folders,
                                         const SuggestRequest& request) {
   std::deque<format::DiskFolder> opened;
   std::vector<const format::Folder*> pointers;
+  pointers.reserve(folders.size());
   for (const std::string& path : folders) pointers.push_back(&opened.emplace_back(path));
   return SuggestTermsIn(pointers, request);
 }
