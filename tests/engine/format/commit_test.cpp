@@ -214,7 +214,7 @@ TEST(CommitTest, RefusesDocumentsOfASharedStoreThatTwoSegmentsHave) {
 }
 
 TEST(CommitTest, RefusesMoreNormGenerationsThanThereIsRoomFor) {
-  constexpr int32_t kEach = int32_t{1} << 18;
+  constexpr int32_t kEach = int32_t{1} << 16;
   constexpr int32_t kSegments = kMostNormGenerations / kEach;
   const auto commit_of = [&](int32_t segments) {
     ByteWriter out = ByteWriter().Int(-2).Long(1).Int(segments).Int(segments);

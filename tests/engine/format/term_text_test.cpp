@@ -22,9 +22,10 @@ using ::quorelastic::testing::SourceOf;
 // Pieces that also cut characters in two, and such as no text is made of.
 std::string RandomBytes(std::mt19937& random) {
   static const std::vector<std::string> kPieces = {
-      "a",    "bc",           "\xc3",     "\xa4",         "\xe4\xb8",
-      "\xad", "\xf0\x9f\x98", "\x80",     "\xef\xbf",     "\xbe",
-      "\xbf", "\xff",         "\xf0\x9f", "\xef\xbf\xbd", "abcdefghijklmnopqrstuvwxyz"};
+      "a",        "bc",       "\xc3",         "\xa4",
+      "\xe4\xb8", "\xad",     "\xf0\x9f\x98", "\x80",
+      "\xef\xbf", "\xbe",     "\xef\xbf\xbe", "\xbf",
+      "\xff",     "\xf0\x9f", "\xef\xbf\xbd", "abcdefghijklmnopqrstuvwxyz"};
   std::string bytes;
   for (uint32_t left = random() % 5; left > 0; --left) bytes += kPieces[random() % kPieces.size()];
   return bytes;
