@@ -28,12 +28,12 @@ struct Chain {
 };
 
 std::wstring ReadAll(const Lucene::ReaderPtr& reader) {
-  constexpr int32_t kPiece = 1 << 16;
+  constexpr int32_t kMostRead = 1 << 16;
   std::wstring text;
   for (;;) {
     const size_t before = text.size();
-    text.resize(before + kPiece);
-    const int32_t got = reader->read(text.data() + before, 0, kPiece);
+    text.resize(before + kMostRead);
+    const int32_t got = reader->read(text.data() + before, 0, kMostRead);
     text.resize(before + static_cast<size_t>(std::max(got, 0)));
     if (got <= 0) return text;
   }
