@@ -50,6 +50,12 @@ class SkipListReader {
   // Moves before the first entry of each level of a term. Throws IndexDamagedError, IndexIoError, as does Next().
   void Seek(uint64_t pointer, int32_t document_frequency, bool has_payloads);
 
+  // Seek() where another reader of the same source may hold the skip data in its buffer: they are read from there. To
+  // be given back before that reader reads on.
+  void SeekBorrowing(const ByteReader& lender, uint64_t pointer, int32_t document_frequency,
+                     bool has_payloads);
+  void GiveBack();
+
   // Where a reader jumps to that looks for a document: behind the last place that lies before it.
   struct Landing {
     int32_t passed =
@@ -86,6 +92,8 @@ class SkipListReader {
     int64_t passed = 0;  // documents before the next entry's place, by SkipTo()
   };
 
+  void Prepare(int32_t document_frequency, bool has_payloads);
+  void SeekLevels(uint64_t pointer);
   void RequireLength(const ByteReader& reader, uint64_t pointer, int number, uint64_t length) const;
   void ReadEntry(int number);
   bool LoadNext(int number, int64_t interval, uint32_t document_count);
