@@ -2,7 +2,11 @@
 if(QUORELASTIC_SANITIZE)
   add_compile_options(-fsanitize=${QUORELASTIC_SANITIZE} -fno-omit-frame-pointer -fno-sanitize-recover=all)
   add_link_options(-fsanitize=${QUORELASTIC_SANITIZE})
-  add_compile_definitions(_GLIBCXX_ASSERTIONS)
+  add_compile_definitions(_GLIBCXX_ASSERTIONS QUORELASTIC_SANITIZED)
+  # The compilers have different macros for it.
+  if(QUORELASTIC_SANITIZE MATCHES "thread")
+    add_compile_definitions(QUORELASTIC_SANITIZED_THREADS)
+  endif()
 endif()
 if(QUORELASTIC_LIBFUZZER)
   add_compile_options(-fsanitize=fuzzer-no-link)

@@ -42,6 +42,18 @@ class FuzzInput {
     return quorelastic::testing::SourceOf(TakeBytes(count));
   }
 
+  // A text, after a byte for its length.
+  std::string TakeText() { return TakeBytes(TakeByte()); }
+
+  // All that is left as the files of a folder, each a byte for the length of its name, the name, two bytes for its
+  // length, its bytes.
+  void TakeFiles(quorelastic::testing::MemoryFolder& folder) {
+    while (left_ > 0) {
+      const std::string name = TakeText();
+      folder.files[name].bytes = TakeBytes(TakeNumber());
+    }
+  }
+
   size_t left() const { return left_; }
 
  private:

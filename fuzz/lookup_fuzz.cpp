@@ -14,8 +14,6 @@ using vantrel::elastic::reading::WantedTerm;
 
 namespace {
 
-std::string TakeText(FuzzInput& input) { return input.TakeBytes(input.TakeByte()); }
-
 // Asks for a segment's files as the index library does, as far as they are there.
 void OpenFiles(OpeningCheck& check, const MemoryFolder& folder) {
   for (const auto& [name, file] : folder.files) {
@@ -43,18 +41,14 @@ bool IsWhole(const OpenedSegment& segment) {
 
 }  // namespace
 
-// A term's field and text, each after a byte for its length, and two bytes for a document; then the files of a folder,
-// each a byte for the length of its name, the name, two bytes for its length, its bytes.
+// A term's field and text, each after a byte for its length, and two bytes for a document; then the files of a folder.
 extern "C" int LLVMFuzzerTestOneInput(const uint8_t* data, size_t size) {
   FuzzInput input(data, size);
-  const std::string field = TakeText(input);
-  const WantedTerm term{field, TakeText(input)};
+  const std::string field = input.TakeText();
+  const WantedTerm term{field, input.TakeText()};
   const auto document = static_cast<int32_t>(input.TakeNumber());
   MemoryFolder folder;
-  while (input.left() > 0) {
-    const std::string name = TakeText(input);
-    folder.files[name].bytes = input.TakeBytes(input.TakeNumber());
-  }
+  input.TakeFiles(folder);
   return quorelastic::fuzz::DecodeWithinBounds([&] {
     OpeningCheck check(term);
     OpenFiles(check, folder);

@@ -6,6 +6,7 @@
 #include <algorithm>
 #include <filesystem>
 #include <iostream>
+#include <set>
 #include <string>
 #include <vector>
 
@@ -65,27 +66,46 @@ ByteWriter Length(const std::string& bytes) {
   return ByteWriter().Byte(static_cast<int>(bytes.size() & 0xff)).Byte(static_cast<int>(bytes.size() >> 8));
 }
 
+// Files one behind the other, as FuzzInput::TakeFiles() takes them.
+std::string FilesOf(const std::string& folder, const std::vector<std::string>& names) {
+  ByteWriter files;
+  for (const std::string& name : names) {
+    const std::string bytes = ReadFile(folder + "/" + name);
+    files.Byte(static_cast<int>(name.size())).Raw(name).Raw(Length(bytes).bytes()).Raw(bytes);
+  }
+  return files.bytes();
+}
+
+// What dictionaries are read from, begun with each of the files in turn: only the beginning is varied.
+void AddDictionaries(const Corpus& corpus, const std::string& folder, const std::string& name) {
+  std::vector<std::string> files = ListFolder(folder);
+  std::erase_if(files, [](const std::string& file) {
+    if (file.starts_with("segments_")) return false;
+    const std::string extension = std::filesystem::path(file).extension();
+    static const std::set<std::string> kNeeded = {".cfs", ".fnm", ".tii", ".tis", ".frq", ".del"};
+    return !kNeeded.contains(extension);
+  });
+  for (size_t turn = 0; turn < files.size(); ++turn) {
+    const std::string bytes = FilesOf(folder, files);
+    for (const std::string text : {"", "x"}) {
+      const ByteWriter wanted = ByteWriter().String("body").String(text);
+      const std::string seed = name + std::to_string(turn) + "-" + text;
+      corpus.Add("suggest", seed, ByteWriter(wanted).Byte(5).Raw(bytes).bytes());
+      corpus.Add("merged_terms", seed, ByteWriter(wanted).Byte(static_cast<int>(turn)).Raw(bytes).bytes());
+    }
+    std::rotate(files.begin(), files.begin() + 1, files.end());
+  }
+}
+
 // A folder as one input, begun with the file at each third place in turn: only the beginning is varied.
 void AddFolder(const Corpus& corpus, const std::string& folder, const std::string& name) {
   std::vector<std::string> files = ListFolder(folder);
   for (size_t turn = 0; turn < files.size(); turn += 3) {
-    ByteWriter whole;
-    for (const std::string& file : files) {
-      const std::string bytes = ReadFile(folder + "/" + file);
-      whole.Byte(static_cast<int>(file.size())).Raw(file).Raw(Length(bytes).bytes()).Raw(bytes);
-    }
-    corpus.Add("index_health", name + std::to_string(turn), whole.bytes());
+    const std::string whole = FilesOf(folder, files);
+    corpus.Add("index_health", name + std::to_string(turn), whole);
     for (const int document : {0, 2}) {
       corpus.Add("lookup", name + std::to_string(turn) + "-" + std::to_string(document),
-                 ByteWriter()
-                     .Byte(4)
-                     .Raw("body")
-                     .Byte(1)
-                     .Raw("x")
-                     .Byte(document)
-                     .Byte(0)
-                     .Raw(whole.bytes())
-                     .bytes());
+                 ByteWriter().Byte(4).Raw("body").Byte(1).Raw("x").Byte(document).Byte(0).Raw(whole).bytes());
     }
     std::rotate(files.begin(), files.begin() + 3 % static_cast<std::ptrdiff_t>(files.size()), files.end());
   }
@@ -116,11 +136,13 @@ void AddWholeIndexes(const Corpus& corpus) {
                                                         .changed_norms = 1,
                                                         .term_index_interval = 4});
   AddFolder(corpus, plain.path(), "plain");
+  AddDictionaries(corpus, plain.path(), "plain");
   AddStores(corpus, plain.path(), "plain");
   const TemporaryFolder compound;
   quorelastic::testing::WriteVariedIndex(compound.path(),
                                          {.seed = 2, .documents = 4, .documents_per_segment = 2});
   AddFolder(corpus, compound.path(), "compound");
+  AddDictionaries(corpus, compound.path(), "compound");
 }
 
 void AddSkipsAndPositions(const Corpus& corpus) {

@@ -30,15 +30,15 @@
 //   status 1      a command-line error, --help, or no known action word; standard error has the usage text
 //   abort         an exception left a body; nothing catches it, the runtime names it on standard error
 //
-// Options are read by the C library's parser, which words its own diagnostics; a last occurrence wins, and
-// words that belong to no option are passed over. Where the values are kept, option_set.h tells. Nothing is
-// checked while options are parsed: what an action cannot use, it rejects itself.
+// The C library's parser reads the options and prints its own diagnostics. The last value of an option wins;
+// other words are ignored. Values are checked by the action that uses them, not while options are parsed.
 //
 // A rejected option value is logged with the line of its check in this file. Scripts that read the system log
 // know those lines; static assertions beside the checks hold them in place.
 
 #include <getopt.h>
 
+#include <cerrno>
 #include <cstdint>
 #include <cstdlib>
 #include <iostream>
@@ -338,6 +338,7 @@ void Repair(const std::string& db_path) {
 }  // namespace
 
 int main(int argc, char** argv) {
+  errno = 0;                    // static initialisers may have left an error, which FailIf would log
   unsetenv("POSIXLY_CORRECT");  // the parser's, which would stop at the first word that is no option
   OptionSet options;
   if (!ParseOptions(argc, argv, options)) return 1;

@@ -15,7 +15,7 @@ using vantrel::elastic::Index;
 
 // A step ends, and others get their turn, after so many documents or so long.
 constexpr size_t kDocumentsPerStep = 1000;
-constexpr std::chrono::milliseconds kLongestStep{200};
+constexpr std::chrono::milliseconds kLongestBulkStep{200};
 
 class DocumentBulk : public RunningCommand {
  public:
@@ -51,9 +51,9 @@ class DocumentBulk : public RunningCommand {
   Outcome AddSome() {
     const auto start = std::chrono::steady_clock::now();
     for (size_t i = 0; i < kDocumentsPerStep; ++i) {
-      if (std::chrono::steady_clock::now() - start > kLongestStep) break;
+      if (std::chrono::steady_clock::now() - start > kLongestBulkStep) break;
       DocumentSource::Item item;
-      const DocumentSource::Move move = source_->Next(kLongestStep, item);
+      const DocumentSource::Move move = source_->Next(kLongestBulkStep, item);
       if (move == DocumentSource::Move::kNotYet) break;
       if (move == DocumentSource::Move::kEnd) {
         at_end_ = true;

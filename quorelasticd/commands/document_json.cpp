@@ -8,16 +8,18 @@
 namespace quorelasticd {
 namespace {
 
-[[noreturn]] void Refuse(const std::string& problem) { throw RequestError(ErrorCode::kBadRequest, problem); }
+[[noreturn]] void RefuseDocument(const std::string& problem) {
+  throw RequestError(ErrorCode::kBadRequest, problem);
+}
 
 [[noreturn]] void RefuseValue(const std::string& field) {
-  Refuse("field " + Quoted(field) + ": expected a string or an array of strings");
+  RefuseDocument("field " + Quoted(field) + ": expected a string or an array of strings");
 }
 
 }  // namespace
 
 vantrel::elastic::Document ToDocument(const Json::Value& json) {
-  if (!json.isObject()) Refuse("a document is an object of fields");
+  if (!json.isObject()) RefuseDocument("a document is an object of fields");
   vantrel::elastic::Document document;
   const auto add = [&](const std::string& field, const Json::Value& value) {
     if (!value.isString()) RefuseValue(field);

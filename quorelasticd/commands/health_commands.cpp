@@ -18,7 +18,7 @@ using vantrel::elastic::HealthProgress;
 using vantrel::elastic::HealthReport;
 
 // Between two progress replies.
-constexpr std::chrono::milliseconds kLongestStep{1000};
+constexpr std::chrono::milliseconds kLongestWait{1000};
 
 constexpr size_t kFindingsPerReply = 50;
 
@@ -55,7 +55,7 @@ class Check : public RunningCommand {
 
   Outcome Step() override {
     if (!report_.has_value()) {
-      if (!run_->WaitFor(kLongestStep)) return Progress(ToJson(run_->progress()));
+      if (!run_->WaitFor(kLongestWait)) return Progress(ToJson(run_->progress()));
       TakeReport();
     }
     if (told_ == report_->findings.size()) return Result(Summary());
@@ -142,7 +142,7 @@ class Repair : public RunningCommand {
       if (!is_dry_run_) closed_ = registry_.Close(name_);
       worker_.emplace(registry_.PathOf(name_), is_dry_run_);
     }
-    std::optional<Json::Value> report = worker_->WaitFor(kLongestStep);
+    std::optional<Json::Value> report = worker_->WaitFor(kLongestWait);
     if (!report.has_value()) return StillRunning();
     uint64_t documents = 0;
     for (const Json::Value& loss : (*report)["lost"]) documents += loss["documents"].asUInt64();

@@ -65,14 +65,16 @@ std::string FirstComplaint(const std::string& complaints) {
   return line;
 }
 
-[[noreturn]] void Refuse(const std::string& reason) { throw RequestError(ErrorCode::kBadRequest, reason); }
+[[noreturn]] void RefuseText(const std::string& reason) {
+  throw RequestError(ErrorCode::kBadRequest, reason);
+}
 
 void CheckOutline(const JsonOutline& outline, const std::string& what) {
   if (outline.depth > kMostJsonDepth) throw LimitExceeded("json_depth", kMostJsonDepth, "levels");
   if (outline.values > kMostJsonValues) throw LimitExceeded("json_values", kMostJsonValues, "values");
   if (outline.slash == std::string_view::npos) return;
-  Refuse(what + " is no JSON document: a comment, or a stray /, at byte " + std::to_string(outline.slash) +
-         " (counted from 0)");
+  RefuseText(what + " is no JSON document: a comment, or a stray /, at byte " +
+             std::to_string(outline.slash) + " (counted from 0)");
 }
 
 }  // namespace
@@ -105,10 +107,10 @@ JsonOutline OutlineOf(std::string_view text) {
 
 Json::Value ParseJson(const std::string& text, const std::string& what) {
   if (const size_t at = FindInvalidUtf8(text); at != std::string::npos) {
-    Refuse(what + " is no valid UTF-8: byte " + std::to_string(at) + " (counted from 0)");
+    RefuseText(what + " is no valid UTF-8: byte " + std::to_string(at) + " (counted from 0)");
   }
   if (text.starts_with(kByteOrderMark)) {
-    Refuse(what + " is no JSON document: it begins with a byte order mark");
+    RefuseText(what + " is no JSON document: it begins with a byte order mark");
   }
   CheckOutline(OutlineOf(text), what);
   Json::Value root;
@@ -116,14 +118,14 @@ Json::Value ParseJson(const std::string& text, const std::string& what) {
   try {
     const std::unique_ptr<Json::CharReader> reader(Readers().newCharReader());
     if (!reader->parse(text.data(), text.data() + text.size(), &root, &complaints)) {
-      Refuse(what + " is no JSON document: " + FirstComplaint(complaints));
+      RefuseText(what + " is no JSON document: " + FirstComplaint(complaints));
     }
   } catch (const Json::Exception& error) {
-    Refuse(what + " is no JSON document: " + error.what());
+    RefuseText(what + " is no JSON document: " + error.what());
   }
   // To the parser, a zero byte behind the document is the end of the text, whatever follows.
   if (text.find('\0', static_cast<size_t>(root.getOffsetLimit())) != std::string::npos) {
-    Refuse(what + " is no JSON document: it holds a zero byte");
+    RefuseText(what + " is no JSON document: it holds a zero byte");
   }
   return root;
 }

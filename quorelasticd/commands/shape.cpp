@@ -38,12 +38,12 @@ std::string Expected(const Shape& shape) {
   return (starts_with_vowel ? "an " : "a ") + text;
 }
 
-[[noreturn]] void Refuse(const std::string& path, const std::string& problem) {
+[[noreturn]] void RefuseValue(const std::string& path, const std::string& problem) {
   throw RequestError(ErrorCode::kBadRequest, path + ": " + problem);
 }
 
 [[noreturn]] void RefuseType(const Shape& shape, const Json::Value& value, const std::string& path) {
-  Refuse(path, "expected " + Expected(shape) + ", found " + TypeOf(value));
+  RefuseValue(path, "expected " + Expected(shape) + ", found " + TypeOf(value));
 }
 
 bool IsOfKind(const Shape& shape, const Json::Value& value) {
@@ -72,23 +72,23 @@ bool IsOfKind(const Shape& shape, const Json::Value& value) {
 void CheckInteger(const Shape& shape, const Json::Value& value, const std::string& path) {
   const int64_t number = value.asInt64();
   if (number >= shape.least && number <= shape.most) return;
-  Refuse(path, "expected " + Expected(shape) + ", found " + std::to_string(number));
+  RefuseValue(path, "expected " + Expected(shape) + ", found " + std::to_string(number));
 }
 
 void CheckString(const Shape& shape, const Json::Value& value, const std::string& path) {
   const std::string text = value.asString();
   if (text.empty() && !shape.may_be_empty)
-    Refuse(path, "expected " + Expected(shape) + ", found an empty one");
+    RefuseValue(path, "expected " + Expected(shape) + ", found an empty one");
   if (static_cast<int64_t>(text.size()) > shape.most) throw LimitExceeded(path, shape.most, "bytes");
-  if (FindInvalidUtf8(text) != std::string::npos) Refuse(path, "is no valid Unicode text");
+  if (FindInvalidUtf8(text) != std::string::npos) RefuseValue(path, "is no valid Unicode text");
   if (shape.choices.empty()) return;
   if (std::find(shape.choices.begin(), shape.choices.end(), text) != shape.choices.end()) return;
-  Refuse(path, "expected " + Expected(shape) + ", found " + Quoted(text));
+  RefuseValue(path, "expected " + Expected(shape) + ", found " + Quoted(text));
 }
 
 void CheckArray(const Shape& shape, const Json::Value& value, const std::string& path) {
   if (value.empty() && !shape.may_be_empty)
-    Refuse(path, "expected " + Expected(shape) + ", found an empty one");
+    RefuseValue(path, "expected " + Expected(shape) + ", found an empty one");
   if (static_cast<int64_t>(value.size()) > shape.most) throw LimitExceeded(path, shape.most, "elements");
   const Shape& element = shape.of.front();
   if (element.kind == Shape::Kind::kAny) return;
@@ -112,8 +112,8 @@ void CheckObject(const Shape& shape, const Json::Value& value, const std::string
     const bool is_known = std::any_of(shape.members.begin(), shape.members.end(),
                                       [&](const Member& member) { return member.name == name; });
     if (is_known) continue;
-    Refuse(path.empty() ? "the request" : path,
-           "unknown member " + Quoted(name) + "; expected: " + MemberNames(shape));
+    RefuseValue(path.empty() ? "the request" : path,
+                "unknown member " + Quoted(name) + "; expected: " + MemberNames(shape));
   }
   for (const Member& member : shape.members) {
     const std::string inner = Inner(path, member.name);
@@ -121,7 +121,7 @@ void CheckObject(const Shape& shape, const Json::Value& value, const std::string
     if (found != nullptr) {
       CheckShape(member.shape, *found, inner);
     } else if (member.is_required) {
-      Refuse(inner, "missing; expected " + Expected(member.shape));
+      RefuseValue(inner, "missing; expected " + Expected(member.shape));
     }
   }
 }

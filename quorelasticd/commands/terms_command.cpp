@@ -10,14 +10,16 @@
 #include "base/text.h"
 #include "commands/commands.h"
 #include "commands/daemon.h"
-#include "commands/merged_terms.h"
+#include "vantrel/elastic/term_listing.h"
 
 namespace quorelasticd {
 namespace {
 
+using vantrel::elastic::TermListing;
+
 constexpr size_t kTermsPerReply = 1000;
 constexpr size_t kBytesPerReply = size_t{256} << 10;
-constexpr std::chrono::milliseconds kLongestStep{50};
+constexpr std::chrono::milliseconds kLongestListingStep{50};
 constexpr int64_t kDefaultMost = 1000;
 
 // One batch of terms a step, so that a client that reads slowly, or not at all, holds up nobody.
@@ -26,18 +28,17 @@ class Terms : public RunningCommand {
   Terms(const Daemon& daemon, const Json::Value& data)
       : slow_executor_(daemon.registry().slow_executor()),
         open_(daemon.registry().Use(data["id"].asString())),
-        live_only_(data.get("live", false).asBool()),
         most_(data.get("max", Json::Int64{kDefaultMost}).asInt64()) {
-    if (data.isMember("field")) selection_.field = data["field"].asString();
-    selection_.prefix = data.get("prefix", "").asString();
-    if (selection_.field.has_value()) CheckField(*selection_.field);
+    if (data.isMember("field")) request_.field = data["field"].asString();
+    request_.prefix = data.get("prefix", "").asString();
+    request_.live_only = data.get("live", false).asBool();
+    if (request_.field.has_value()) CheckField(*request_.field);
   }
 
   boost::asio::any_io_executor executor() const override { return slow_executor_; }
 
   Outcome Step() override {
-    if (terms_ == nullptr)
-      terms_ = std::make_unique<MergedTerms>(open_->index().path(), live_only_, selection_);
+    if (terms_ == nullptr) terms_ = std::make_unique<TermListing>(open_->index().path(), request_);
     Json::Value batch(Json::arrayValue);
     const bool at_end = Fill(batch);
     if (!batch.empty()) {
@@ -67,13 +68,13 @@ class Terms : public RunningCommand {
     const auto start = std::chrono::steady_clock::now();
     size_t bytes = 0;
     while (batch.size() < kTermsPerReply && bytes < kBytesPerReply) {
-      if (std::chrono::steady_clock::now() - start > kLongestStep) return false;
+      if (std::chrono::steady_clock::now() - start > kLongestListingStep) return false;
       switch (terms_->Next()) {
-        case MergedTerms::Move::kEnd:
+        case TermListing::Move::kEnd:
           return true;
-        case MergedTerms::Move::kPassedOver:
+        case TermListing::Move::kPassedOver:
           continue;
-        case MergedTerms::Move::kTerm:
+        case TermListing::Move::kTerm:
           break;
       }
       if (count_ == most_) {
@@ -91,10 +92,9 @@ class Terms : public RunningCommand {
 
   boost::asio::any_io_executor slow_executor_;
   std::shared_ptr<OpenIndex> open_;
-  bool live_only_;
   int64_t most_;
-  TermSelection selection_;
-  std::unique_ptr<MergedTerms> terms_;
+  vantrel::elastic::TermListingRequest request_;
+  std::unique_ptr<TermListing> terms_;
   int64_t count_ = 0;
   bool has_more_ = false;
   bool is_over_ = false;

@@ -15,9 +15,9 @@
 namespace quorelasticd {
 namespace {
 
-constexpr size_t kReadPiece = size_t{256} << 10;
+constexpr size_t kImportPiece = size_t{256} << 10;
 
-[[noreturn]] void Refuse(const std::string& name, const std::string& problem) {
+[[noreturn]] void RefuseFile(const std::string& name, const std::string& problem) {
   throw RequestError(ErrorCode::kBadRequest, "file " + Quoted(name) + ": " + problem);
 }
 
@@ -30,16 +30,16 @@ FileDescriptor OpenBelow(const std::string& folder, const std::string& name) {
     const size_t slash = rest.find('/');
     const std::string part(rest.substr(0, slash));
     if (part.empty() || part == "." || part == ".." || part.find('\0') != std::string::npos) {
-      Refuse(name, "expected a path below the import folder");
+      RefuseFile(name, "expected a path below the import folder");
     }
     const bool is_last = slash == std::string_view::npos;
     // Without O_NONBLOCK, a pipe that nobody writes to would be waited for.
     const int flags = O_RDONLY | O_NOFOLLOW | O_CLOEXEC | (is_last ? O_NONBLOCK : O_DIRECTORY);
     place = FileDescriptor(openat(place.get(), part.c_str(), flags));
     if (!place.is_open()) {
-      if (errno == ELOOP || errno == ENOTDIR) Refuse(name, "leads over a link or a file");
-      if (errno == ENOENT) Refuse(name, "not in the import folder");
-      Refuse(name, "cannot be opened: " + std::generic_category().message(errno));
+      if (errno == ELOOP || errno == ENOTDIR) RefuseFile(name, "leads over a link or a file");
+      if (errno == ENOENT) RefuseFile(name, "not in the import folder");
+      RefuseFile(name, "cannot be opened: " + std::generic_category().message(errno));
     }
     if (is_last) return place;
     rest.remove_prefix(slash + 1);
@@ -52,7 +52,7 @@ ImportFile::ImportFile(const std::string& folder, const std::string& name)
     : path_(folder + "/" + name), file_(OpenBelow(folder, name)) {
   struct stat status {};
   if (fstat(file_.get(), &status) != 0) throw std::system_error(errno, std::generic_category(), path_);
-  if (!S_ISREG(status.st_mode)) Refuse(name, "is no regular file");
+  if (!S_ISREG(status.st_mode)) RefuseFile(name, "is no regular file");
   total_bytes_ = static_cast<uint64_t>(status.st_size);
 }
 
@@ -90,10 +90,10 @@ bool ImportFile::Fill() {
   begin_ = 0;
   if (is_given_up_) return false;
   const size_t kept = buffer_.size();
-  buffer_.resize(kept + kReadPiece);
+  buffer_.resize(kept + kImportPiece);
   ssize_t got = -1;
   do {
-    got = read(file_.get(), buffer_.data() + kept, kReadPiece);
+    got = read(file_.get(), buffer_.data() + kept, kImportPiece);
   } while (got < 0 && errno == EINTR);
   const int error = errno;
   buffer_.resize(kept + (got > 0 ? static_cast<size_t>(got) : 0));

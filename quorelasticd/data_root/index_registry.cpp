@@ -28,7 +28,7 @@ RequestError NotFound(const std::string& name) {
 // did before it let go must be seen all the same.
 bool IsUnused(const std::shared_ptr<OpenIndex>& index) {
   if (index.use_count() > 1) return false;
-#if defined(__SANITIZE_THREAD__)
+#ifdef QUORELASTIC_SANITIZED_THREADS
   std::shared_ptr<OpenIndex>(index).reset();  // it knows no fences, but it follows the count itself
 #else
   std::atomic_thread_fence(std::memory_order_acquire);

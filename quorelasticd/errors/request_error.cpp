@@ -18,7 +18,7 @@ std::string WithoutPath(const vantrel::elastic::IndexError& error) {
   return text.starts_with(prefix) ? text.substr(prefix.size()) : text;
 }
 
-RequestError ToRequestError(const vantrel::elastic::QuerySyntaxError& error) {
+RequestError SyntaxRequestError(const vantrel::elastic::QuerySyntaxError& error) {
   Json::Value details(Json::objectValue);
   details["position"] = static_cast<Json::UInt64>(error.position());
   return RequestError(ErrorCode::kQuerySyntax, error.what(), std::move(details));
@@ -67,7 +67,7 @@ RequestError ToRequestError() {
   } catch (const IndexError& error) {
     return RequestError(ErrorCode::kCorrupt, error.what());
   } catch (const QuerySyntaxError& error) {
-    return ToRequestError(error);
+    return SyntaxRequestError(error);
   } catch (const LimitExceededError& error) {
     return RequestError(ErrorCode::kLimitExceeded, error.what(),
                         LimitDetails(error.limit(), static_cast<int64_t>(error.most())));

@@ -17,7 +17,7 @@ class HealthRun {
   HealthRun(const HealthRun&) = delete;
   HealthRun& operator=(const HealthRun&) = delete;
 
-  // Gives the check up where it is not at its end: within some milliseconds of reading.
+  // Cancels the check if it has not ended: HealthOptions::progress says how soon it ends.
   ~HealthRun();
 
   // Waits for the end, but not longer than that. Whether it has come.

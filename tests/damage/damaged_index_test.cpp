@@ -15,6 +15,7 @@
 #include "damage/limited_run.h"
 #include "support/files.h"
 #include "support/random_index.h"
+#include "support/sanitized.h"
 #include "support/temporary_folder.h"
 #include "vantrel/elastic/class_init.h"
 #include "vantrel/elastic/index_error.h"
@@ -27,7 +28,7 @@ using vantrel::elastic::IndexDamagedError;
 using vantrel::elastic::IndexError;
 using vantrel::elastic::IndexInfo;
 
-constexpr int kCasesPerShape = 280;
+constexpr int kCasesPerShape = 280 / kFewer;
 
 struct Shape {
   const char* name;

@@ -1,6 +1,7 @@
 #include "damage/limited_run.h"
 
 #include <sys/mman.h>
+#include <sys/resource.h>
 #include <sys/wait.h>
 #include <unistd.h>
 
@@ -67,9 +68,11 @@ LimitedRun RunLimited(const std::string& program, const std::vector<std::string>
   if (child < 0) throw std::system_error(errno, std::generic_category(), "fork");
   if (child == 0) BecomeProgram(std::move(pointers), output, errors);
   LimitedRun run;
-  while (waitpid(child, &run.status, 0) < 0) {
-    if (errno != EINTR) throw std::system_error(errno, std::generic_category(), "waitpid");
+  rusage usage{};
+  while (wait4(child, &run.status, 0, &usage) < 0) {
+    if (errno != EINTR) throw std::system_error(errno, std::generic_category(), "wait4");
   }
+  run.peak_bytes = int64_t{usage.ru_maxrss} * 1024;
   run.output = output.Text();
   run.errors = errors.Text();
   return run;

@@ -1,12 +1,14 @@
 #pragma once
 
+#include <cstdint>
 #include <string>
 #include <vector>
 
 namespace quorelastic::testing {
 
 struct LimitedRun {
-  int status = 0;  // as of waitpid
+  int status = 0;          // as of waitpid
+  int64_t peak_bytes = 0;  // of memory; at least what this process takes
   std::string output;
   std::string errors;
 };

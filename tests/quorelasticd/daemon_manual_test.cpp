@@ -41,7 +41,7 @@ std::vector<ShownOption> ReadHelp() {
   return options;
 }
 
-std::string Complaint(const std::string& name, const std::string& value) {
+std::string ManualComplaint(const std::string& name, const std::string& value) {
   const std::string option = "--" + name + "=" + value;
   const char* arguments[] = {"quorelasticd", option.c_str()};
   std::string text;
@@ -86,7 +86,7 @@ TEST_F(DaemonManual, SpeaksOfNoOptionThatIsNone) {
 TEST_F(DaemonManual, TellsTheRangeOfEachNumber) {
   int numbers = 0;
   for (const ManualPage::Item& item : options_) {
-    const std::string complaint = Complaint(item.Word("Fl").substr(1), "-1");
+    const std::string complaint = ManualComplaint(item.Word("Fl").substr(1), "-1");
     for (const auto& range : FindAll(complaint, "a number from (.*), found")) {
       EXPECT_THAT(item.text, HasSubstr(range.back())) << complaint;
       ++numbers;

@@ -15,7 +15,7 @@ std::optional<Options> Parse(std::vector<const char*> arguments, std::string* te
                       text == nullptr ? ignored : *text);
 }
 
-std::string Complaint(const std::vector<const char*>& arguments) {
+std::string OptionComplaint(const std::vector<const char*>& arguments) {
   try {
     Parse(arguments);
     return "";
@@ -61,12 +61,12 @@ TEST(Options, HelpAndVersionAreTextsOnly) {
 }
 
 TEST(Options, WhatMakesNoSenseIsRefusedInOneLine) {
-  EXPECT_EQ(Complaint({"--threads", "0"}), "--threads: expected a number from 1 to 256, found 0");
-  EXPECT_EQ(Complaint({"--threads", "-1"}), "--threads: expected a number from 1 to 256, found -1");
-  EXPECT_EQ(Complaint({"--log-level", "loud"}),
+  EXPECT_EQ(OptionComplaint({"--threads", "0"}), "--threads: expected a number from 1 to 256, found 0");
+  EXPECT_EQ(OptionComplaint({"--threads", "-1"}), "--threads: expected a number from 1 to 256, found -1");
+  EXPECT_EQ(OptionComplaint({"--log-level", "loud"}),
             "--log-level: expected debug, info, warning or error, found \"loud\"");
-  EXPECT_EQ(Complaint({"--socket", ""}), "--socket: expected a path, found none");
-  EXPECT_EQ(Complaint({"--data", ""}), "--data: expected a folder, found none");
+  EXPECT_EQ(OptionComplaint({"--socket", ""}), "--socket: expected a path, found none");
+  EXPECT_EQ(OptionComplaint({"--data", ""}), "--data: expected a folder, found none");
   for (const std::vector<const char*>& arguments :
        std::vector<std::vector<const char*>>{{"--bogus"},
                                              {"--thread", "1"},
@@ -76,8 +76,8 @@ TEST(Options, WhatMakesNoSenseIsRefusedInOneLine) {
                                              {"--threads", "1", "--threads", "2"},
                                              {"--threads", "99999999999999999999"},
                                              {"--socket"}}) {
-    EXPECT_NE(Complaint(arguments), "") << arguments.front();
-    EXPECT_EQ(Complaint(arguments).find('\n'), std::string::npos);
+    EXPECT_NE(OptionComplaint(arguments), "") << arguments.front();
+    EXPECT_EQ(OptionComplaint(arguments).find('\n'), std::string::npos);
   }
 }
 

@@ -124,7 +124,8 @@ class RunningServer {
   Server server_{listener_.Release(), service_, FewThreads(), connections_};
 };
 
-enum Outcome { kFine, kWrong, kNotReached };
+// A sanitizer that ends a process has it exit with 1.
+enum Outcome { kFine = 2, kWrong, kNotReached };
 
 // Lets a child of this process do it with a server: what it returns, or kFine where the child died of it, since
 // Boost.Asio allocates in places where it must not throw. A daemon that ends is started anew.
@@ -138,7 +139,9 @@ Outcome WithServer(const std::function<Outcome(const RunningServer&)>& action) {
   }
   int status = 0;
   waitpid(child, &status, 0);
-  return WIFEXITED(status) && WEXITSTATUS(status) <= kNotReached ? Outcome(WEXITSTATUS(status)) : kFine;
+  const bool is_outcome =
+      WIFEXITED(status) && WEXITSTATUS(status) >= kFine && WEXITSTATUS(status) <= kNotReached;
+  return is_outcome ? Outcome(WEXITSTATUS(status)) : kFine;
 }
 
 TEST(ScarceMemory, NoServerIsDeafWhileItsHeartBeats) {

@@ -7,7 +7,7 @@
 #include <string>
 #include <vector>
 
-#include "daemon_client.h"
+#include "quorelasticd/daemon_client.h"
 
 namespace quorelastic::testing {
 

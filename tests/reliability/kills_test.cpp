@@ -41,7 +41,7 @@ std::string TextOf(uint64_t version) {
   return text;
 }
 
-JsonValue Request(const char* command) {
+JsonValue RequestOfBooks(const char* command) {
   JsonValue request(Json::objectValue);
   request["command"] = command;
   request["data"]["id"] = "books";
@@ -69,7 +69,7 @@ class LoadingClient {
     if (choice < 60) return Load(Pick(random_, 1, 60), Pick(random_, 0, 2) == 0);
     if (choice < 64) return Load(1200, Pick(random_, 0, 1) == 0);  // long enough for progress replies
     if (choice < 82) return Delete(Pick(random_, 1, 20), Pick(random_, 0, 2) == 0);
-    Finish(Request(choice < 98 ? "commit" : "optimize"), {});
+    Finish(RequestOfBooks(choice < 98 ? "commit" : "optimize"), {});
   }
 
   std::set<std::string> PickIds(int count) {
@@ -79,7 +79,7 @@ class LoadingClient {
   }
 
   void Load(int count, bool commit) {
-    JsonValue request = Request("document_bulk");
+    JsonValue request = RequestOfBooks("document_bulk");
     request["data"]["commit"] = commit;
     std::vector<DocumentModel::Change> changes;
     for (const std::string& id : PickIds(count)) {
@@ -93,7 +93,7 @@ class LoadingClient {
   }
 
   void Delete(int count, bool commit) {
-    JsonValue request = Request("document_delete");
+    JsonValue request = RequestOfBooks("document_delete");
     request["data"]["commit"] = commit;
     std::vector<DocumentModel::Change> changes;
     for (const std::string& id : PickIds(count)) {

@@ -1,9 +1,13 @@
 #pragma once
 
-#include <lucene++/LuceneHeaders.h>
+#include <boost/smart_ptr/shared_ptr.hpp>
 
 #include <string>
 #include <vector>
+
+namespace Lucene {
+class IndexWriter;
+}
 
 namespace quorelastic::testing {
 
@@ -42,7 +46,7 @@ class LibraryIndex {
   void Close();                                                    // commits; implied by destruction
 
  private:
-  Lucene::IndexWriterPtr writer_;
+  boost::shared_ptr<Lucene::IndexWriter> writer_;
 };
 
 }  // namespace quorelastic::testing

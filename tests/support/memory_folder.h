@@ -23,6 +23,7 @@ struct MemoryFile {
   std::string bytes = {};
   uint64_t zeros_after = 0;                  // a hole that follows the bytes, as in a sparse file
   std::optional<uint64_t> broken_from = {};  // reading this byte or a later one is a medium error
+  std::function<void()> before_read = {};    // called by whichever thread reads
 };
 
 class MemorySource : public vantrel::elastic::format::ByteSource {
@@ -35,6 +36,7 @@ class MemorySource : public vantrel::elastic::format::ByteSource {
   // Asked for bytes past its size, it fails as a file does that shrank.
   void ReadAt(uint64_t offset, std::span<uint8_t> out) const override {
     using vantrel::elastic::IndexIoError;
+    if (file_.before_read) file_.before_read();
     if (offset > size() || out.size() > size() - offset) {
       throw IndexIoError(name_, "read past the end of the source", EINVAL);
     }
@@ -72,10 +74,12 @@ class MemoryFolder : public vantrel::elastic::format::Folder {
   std::function<void()> before_list;
   std::function<void(const std::string& name)> before_open;
   mutable int opened = 0;  // how many times a file was asked for
+  mutable int listed = 0;  // how many times the names were asked for
 
   const std::string& path() const override { return path_; }
 
   std::vector<std::string> List() const override {
+    ++listed;
     if (before_list) before_list();
     std::vector<std::string> names = {".", ".."};
     for (const auto& [name, file] : files) names.push_back(name);

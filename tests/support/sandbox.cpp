@@ -85,12 +85,9 @@ std::vector<std::string> Sandbox::Wrap(const std::vector<std::string>& command) 
                                    QUORELASTIC_BUILD_FOLDER,
                                    "--bind",
                                    folder(),
-                                   folder(),
-                                   "--",
-                                   "sh",
-                                   "-c",
-                                   "echo $$ > \"$0\"; exec \"$@\"",
-                                   folder_ / "pid"};
+                                   folder()};
+  for (const std::string& path : hidden_) wrapped.insert(wrapped.end(), {"--tmpfs", path});
+  wrapped.insert(wrapped.end(), {"--", "sh", "-c", "echo $$ > \"$0\"; exec \"$@\"", folder_ / "pid"});
   wrapped.insert(wrapped.end(), command.begin(), command.end());
   return wrapped;
 }

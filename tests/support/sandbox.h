@@ -36,6 +36,9 @@ class Sandbox {
   std::string run_folder() const { return folder_ / "run"; }
   std::string data_root() const { return folder_ / "data"; }
 
+  // Programs that are started from now on see an empty folder at `path`.
+  void Hide(const std::string& path) { hidden_.push_back(path); }
+
   // As the functions of the same names outside. A signal that ends a program is reported as one.
   Process Start(const std::vector<std::string>& command, RunOptions options = {}) const;
   RunResult RunCommand(const std::vector<std::string>& command, RunOptions options = {}) const;
@@ -51,6 +54,7 @@ class Sandbox {
   void DrainLog();
 
   TemporaryFolder folder_;
+  std::vector<std::string> hidden_;
   Descriptor log_socket_;
   Descriptor stop_;
   std::mutex log_mutex_;

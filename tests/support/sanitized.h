@@ -3,11 +3,14 @@
 namespace quorelastic::testing {
 
 // Whether a sanitizer watches: it takes memory of its own, and ends a process that runs out.
-#if defined(__SANITIZE_ADDRESS__) || defined(__SANITIZE_THREAD__)
+#ifdef QUORELASTIC_SANITIZED
 inline constexpr bool kIsSanitized = true;
 #else
 inline constexpr bool kIsSanitized = false;
 #endif
+
+// How many times fewer cases a long campaign has under a sanitizer, where each takes that much longer.
+inline constexpr int kFewer = kIsSanitized ? 5 : 1;
 
 // Why a test that takes all descriptors away is skipped then: to see whether the memory of an object is there, it opens a
 // pipe, and takes a look that fails for an object that is bad.

@@ -17,7 +17,7 @@ namespace {
 using Vector = LibraryField::Vector;
 
 // With a second segment, a deletion, and, where `is_damaged`, one that cannot be read.
-void WriteIndex(const std::string& path, bool is_damaged) {
+void WriteIndexAt(const std::string& path, bool is_damaged) {
   {
     LibraryIndex index(path);
     index.Add({VectorText("body", "word here word", Vector::kPositions)});
@@ -42,8 +42,8 @@ class AnyPathTest : public ::testing::TestWithParam<Name> {
  protected:
   // An index at the plain path and the same at the other one.
   void SetUp() override {
-    WriteIndex(plain_, false);
-    WriteIndex(plain_damaged_, true);
+    WriteIndexAt(plain_, false);
+    WriteIndexAt(plain_damaged_, true);
     CopyFolder(plain_, path_);
     CopyFolder(plain_damaged_, path_damaged_);
   }

@@ -24,7 +24,6 @@ using ::testing::EndsWith;
 using ::testing::HasSubstr;
 using ::testing::StartsWith;
 
-constexpr char kIoError[] = "vantrel::elastic::IndexIoError";
 constexpr char kIndexError[] = "vantrel::elastic::IndexError";
 
 const std::vector<std::string> kTermOptions{"-f", "body", "-t", "word", "-i"};
@@ -32,7 +31,7 @@ const std::vector<std::string> kTermOptions{"-f", "body", "-t", "word", "-i"};
 // One line, "LuceneException: " and `text`.
 auto Reported(const std::string& text) { return Printed("LuceneException: " + text + "\n"); }
 
-void WriteIndex(const std::string& path, bool compound = true) {
+void WriteTwoSegments(const std::string& path, bool compound = true) {
   LibraryIndex index(path, {.compound = compound});
   index.Add({VectorText("body", "word", LibraryField::Vector::kTerms)});
   index.Commit();
@@ -68,7 +67,7 @@ class BadIndexTest : public ::testing::Test {
 
 TEST_F(BadIndexTest, ReportsAMissingFolder) {
   const std::string path = folder_ / "missing";
-  ExpectRefusal(path, kIoError, path + ": cannot open index folder: No such file or directory",
+  ExpectRefusal(path, kIoErrorType, path + ": cannot open index folder: No such file or directory",
                 "Directory '" + path + "' does not exist");
   EXPECT_FALSE(std::filesystem::exists(path)) << "the folder was created";
 }
@@ -76,21 +75,21 @@ TEST_F(BadIndexTest, ReportsAMissingFolder) {
 TEST_F(BadIndexTest, ReportsALinkThatLeadsNowhere) {
   const std::string path = folder_ / "link";
   std::filesystem::create_symlink("nowhere", path);
-  ExpectRefusal(path, kIoError, path + ": cannot open index folder: No such file or directory",
+  ExpectRefusal(path, kIoErrorType, path + ": cannot open index folder: No such file or directory",
                 "Directory '" + path + "' does not exist");
 }
 
 TEST_F(BadIndexTest, ReportsAFileInPlaceOfAFolder) {
   const std::string path = folder_ / "file";
   WriteFile(path, "no index");
-  ExpectRefusal(path, kIoError, path + ": cannot open index folder: Not a directory",
+  ExpectRefusal(path, kIoErrorType, path + ": cannot open index folder: Not a directory",
                 "File '" + path + "' exists but is not a directory");
 }
 
 TEST_F(BadIndexTest, ReportsAFifoInPlaceOfAFolder) {
   const std::string path = folder_ / "fifo";
   ASSERT_EQ(mkfifo(path.c_str(), 0600), 0);
-  ExpectRefusal(path, kIoError, path + ": cannot open index folder: Not a directory",
+  ExpectRefusal(path, kIoErrorType, path + ": cannot open index folder: Not a directory",
                 "File '" + path + "' exists but is not a directory");
 }
 
@@ -106,8 +105,9 @@ TEST_F(BadIndexTest, ReportsAFolderWithoutIndex) {
 
 TEST_F(BadIndexTest, ReportsAnEmptyPath) {
   for (const char* action : {"allterm", "term"}) {
-    EXPECT_THAT(Inspect(action, "", kTermOptions),
-                Aborted("", kIoError, "(empty path): cannot open index folder: No such file or directory"));
+    EXPECT_THAT(
+        Inspect(action, "", kTermOptions),
+        Aborted("", kIoErrorType, "(empty path): cannot open index folder: No such file or directory"));
   }
   EXPECT_THAT(Inspect("position", "", kTermOptions), Reported("Directory '' does not exist"));
   EXPECT_THAT(Inspect("doc_term", "", kTermOptions),
@@ -117,7 +117,7 @@ TEST_F(BadIndexTest, ReportsAnEmptyPath) {
 TEST_F(BadIndexTest, ReportsAPathThatIsTooLong) {
   const std::string path = folder_ / std::string(5000, 'x');
   for (const char* action : {"allterm", "term"}) {
-    EXPECT_THAT(Inspect(action, path), Aborted("", kIoError, EndsWith(": File name too long")));
+    EXPECT_THAT(Inspect(action, path), Aborted("", kIoErrorType, EndsWith(": File name too long")));
   }
   for (const char* action : {"position", "doc_term"}) {
     EXPECT_THAT(Inspect(action, path, kTermOptions),
@@ -128,7 +128,7 @@ TEST_F(BadIndexTest, ReportsAPathThatIsTooLong) {
 TEST_F(BadIndexTest, ReportsAMissingFolderOfAnyScript) {
   const std::string path = folder_ / "größe 中文";
   EXPECT_THAT(Inspect("allterm", path),
-              Aborted("", kIoError, path + ": cannot open index folder: No such file or directory"));
+              Aborted("", kIoErrorType, path + ": cannot open index folder: No such file or directory"));
   for (const char* action : {"position", "doc_term"}) {
     // The stream's locale has no letters for the rest.
     EXPECT_THAT(Inspect(action, path, kTermOptions),
@@ -139,7 +139,7 @@ TEST_F(BadIndexTest, ReportsAMissingFolderOfAnyScript) {
 
 // The index library would take gigabytes, or end in an exception of another kind.
 TEST_F(BadIndexTest, ReportsDamageThatTheLibraryWouldFallOver) {
-  WriteIndex(folder_.path(), false);
+  WriteTwoSegments(folder_.path(), false);
   // The size of the term index, a Long after the format; no container holds a number below nought.
   std::string bytes = ReadFile(folder_ / "_0.tii");
   bytes.replace(4, 8, std::string("\0\0\0\0\x80\0\0\1", 8));
@@ -153,7 +153,7 @@ TEST_F(BadIndexTest, ReportsDamageThatTheLibraryWouldFallOver) {
 
 // What the library finds out by itself it says in its own words.
 TEST_F(BadIndexTest, LeavesToTheLibraryWhatItFindsOut) {
-  WriteIndex(folder_.path(), false);
+  WriteTwoSegments(folder_.path(), false);
   const auto expect_reported = [&](const std::string& name, const std::string& bytes, const char* report) {
     SCOPED_TRACE(name);
     const std::string intact = ReadFile(folder_ / name);
@@ -175,7 +175,7 @@ TEST_F(BadIndexTest, LeavesToTheLibraryWhatItFindsOut) {
 }
 
 TEST_F(BadIndexTest, EndsWhereSomethingElseIsInAFilesPlace) {
-  WriteIndex(folder_ / "index", false);
+  WriteTwoSegments(folder_ / "index", false);
   for (const std::string& name : ListFolder(folder_ / "index")) {
     const std::string path = folder_ / "index/" + name;
     std::filesystem::rename(path, folder_ / "aside");
@@ -202,7 +202,7 @@ TEST_F(BadIndexTest, EndsWhereSomethingElseIsInAFilesPlace) {
 }
 
 TEST_F(BadIndexTest, ReportsEveryFileThatIsMissing) {
-  WriteIndex(folder_ / "index", false);
+  WriteTwoSegments(folder_ / "index", false);
   for (const std::string& name : ListFolder(folder_ / "index")) {
     if (name == "segments.gen") continue;
     std::filesystem::rename(folder_ / "index/" + name, folder_ / "aside");
@@ -230,7 +230,7 @@ class UnreadableIndexTest : public SandboxTest {
   void SetUp() override {
     SandboxTest::SetUp();
     if (IsSkipped()) return;
-    WriteIndex(path_, false);
+    WriteTwoSegments(path_, false);
   }
 
   void Forbid(const std::string& path) {
@@ -251,7 +251,7 @@ TEST_F(UnreadableIndexTest, ReportsAFolderThatMayNotBeRead) {
   Forbid(path_);
   for (const char* action : {"allterm", "term"}) {
     EXPECT_THAT(Inspect(action),
-                Aborted("", kIoError, path_ + ": cannot list index folder: Permission denied"));
+                Aborted("", kIoErrorType, path_ + ": cannot list index folder: Permission denied"));
   }
   for (const char* action : {"position", "doc_term"}) {
     EXPECT_THAT(Inspect(action), Printed(ContainsRegex("^[A-Za-z]*Exception:.+\n$"))) << action;
@@ -264,7 +264,7 @@ TEST_F(UnreadableIndexTest, ReportsAFileThatMayNotBeRead) {
     const std::string file = path_ + "/" + ending;
     Forbid(file);
     for (const char* action : {"allterm", "term"}) {
-      EXPECT_THAT(Inspect(action), Aborted("", kIoError, file + ": cannot open file: Permission denied"));
+      EXPECT_THAT(Inspect(action), Aborted("", kIoErrorType, file + ": cannot open file: Permission denied"));
     }
     for (const char* action : {"position", "doc_term"}) {
       EXPECT_THAT(Inspect(action), Printed(AllOf(StartsWith("LuceneException: "), HasSubstr(file))))

@@ -20,12 +20,10 @@
 namespace quorelastic::testing {
 namespace {
 
-constexpr char kIoError[] = "vantrel::elastic::IndexIoError";
-
 auto Clean() { return Ended(0, "", "clean\n"); }
 auto NotClean() { return Ended(0, "", "NOT clean\n"); }
 
-void WriteIndex(const std::string& path, bool compound) {
+void WriteForty(const std::string& path, bool compound) {
   LibraryIndex index(path, {.compound = compound});
   for (int number = 0; number < 40; ++number) {
     index.Add({Keyword("id", std::to_string(number)),
@@ -56,7 +54,7 @@ class CheckTest : public ::testing::Test {
 TEST_F(CheckTest, CallsAHealthyIndexClean) {
   for (const bool compound : {false, true}) {
     const std::string path = folder_ / (compound ? "compound" : "plain");
-    WriteIndex(path, compound);
+    WriteForty(path, compound);
     const auto before = Snapshot(path);
     EXPECT_THAT(Inspect("check", path), Clean());
     EXPECT_THAT(Inspect("check", path + "/"), Clean());
@@ -65,7 +63,7 @@ TEST_F(CheckTest, CallsAHealthyIndexClean) {
 }
 
 TEST_F(CheckTest, CallsACorruptedIndexNotClean) {
-  WriteIndex(folder_.path(), false);
+  WriteForty(folder_.path(), false);
   const std::string file = folder_ / "_0.frq";
   const std::string bytes = ReadFile(file);
   WriteFile(file, bytes + '\0');
@@ -84,13 +82,13 @@ TEST_F(CheckTest, CallsAFolderWithoutIndexNotClean) {
 TEST_F(CheckTest, AbortsOverAFolderThatDoesNotExist) {
   const std::string path = folder_ / "missing";
   EXPECT_THAT(Inspect("check", path),
-              Aborted("", kIoError, path + ": cannot open index folder: No such file or directory"));
+              Aborted("", kIoErrorType, path + ": cannot open index folder: No such file or directory"));
   EXPECT_FALSE(std::filesystem::exists(path));
 }
 
 TEST_F(CheckTest, ReadsAPathOfAnyScriptInAnyLocale) {
   const std::string path = folder_ / "größe 中文";
-  WriteIndex(folder_ / "index", true);
+  WriteForty(folder_ / "index", true);
   std::filesystem::rename(folder_ / "index", path);
   for (const char* locale : {"LC_ALL=C", "LC_ALL=C.UTF-8", "LC_ALL=no such locale"}) {
     EXPECT_THAT(Inspect("check", path, {}, {.environment = {locale}}), Clean()) << locale;
@@ -101,7 +99,7 @@ TEST_F(CheckTest, ReadsAPathOfAnyScriptInAnyLocale) {
 }
 
 TEST_F(CheckTest, NeedsLittleMemory) {
-  WriteIndex(folder_.path(), true);
+  WriteForty(folder_.path(), true);
   const RunOptions limited{.limits = {{RLIMIT_AS, rlim_t{256} << 20}}};
   // A sanitizer takes more than that for itself.
   const RunResult run = Inspect("check", folder_.path(), {}, limited);
@@ -150,7 +148,7 @@ class UnreadableCheckTest : public SandboxTest {};
 TEST_F(UnreadableCheckTest, CallsAnIndexWithAFileThatMayNotBeReadNotClean) {
   Sandbox sandbox;
   const std::string path = sandbox.folder() + "/index";
-  WriteIndex(path, false);
+  WriteForty(path, false);
   EXPECT_THAT(sandbox.RunTool({"-a", "check", "-d", path}), Clean());
   for (const char* name : {"_0.fdt", "_0.tis", "_0.nrm"}) {
     const std::string file = path + "/" + name;
@@ -160,7 +158,7 @@ TEST_F(UnreadableCheckTest, CallsAnIndexWithAFileThatMayNotBeReadNotClean) {
   }
   ASSERT_EQ(chmod(path.c_str(), 0), 0);
   EXPECT_THAT(sandbox.RunTool({"-a", "check", "-d", path}),
-              Aborted("", kIoError, path + ": cannot list index folder: Permission denied"));
+              Aborted("", kIoErrorType, path + ": cannot list index folder: Permission denied"));
   chmod(path.c_str(), 0700);
 }
 

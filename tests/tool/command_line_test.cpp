@@ -32,8 +32,6 @@ constexpr std::array<std::string_view, 16> kOptionNames = {
     "action", "string", "path",  "db",   "max",    "field",  "token", "ndoc",
     "Index",  "info",   "query", "size", "offset", "Plugin", "Data",  "help"};
 
-constexpr char kErrorType[] = "vantrel::Error";
-
 bool TakesArgument(std::string_view option) { return option != "info" && option != "help"; }
 
 std::vector<std::string_view> OptionsThatBeginWith(std::string_view prefix) {

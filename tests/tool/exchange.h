@@ -12,6 +12,9 @@
 
 namespace quorelastic::testing {
 
+// In bytes, without the length that goes ahead.
+inline constexpr size_t kLongestMessage = size_t{64} << 20;
+
 // A run of the tool, and what a daemon saw of it.
 struct Exchange {
   RunResult run;

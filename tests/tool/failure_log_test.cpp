@@ -4,6 +4,7 @@
 #include <gtest/gtest.h>
 #include <unistd.h>
 
+#include <cstdlib>
 #include <string>
 #include <vector>
 
@@ -18,8 +19,6 @@ using ::testing::EndsWith;
 using ::testing::HasSubstr;
 using ::testing::IsEmpty;
 using ::testing::Not;
-
-constexpr char kErrorType[] = "vantrel::Error";
 
 struct RejectedRun {
   std::string name;
@@ -120,6 +119,25 @@ TEST_F(FailureLogTest, TellsTheErrorThatAnOptionTooLongForItsTypeLeftBehind) {
   EXPECT_THAT(LogOf(sandbox_),
               ElementsAre(EndsWith(") (DoDumpDB) Failed [index_id.empty()], reason: index is "
                                    "required. [err: Numerical result out of range]")));
+}
+
+// Counting the processors, as a library does before main begins, fails there and leaves errno set.
+TEST_F(FailureLogTest, HasNoErrorFromBeforeTheRunOnAMachineWithoutSys) {
+  sandbox_.Hide("/sys");
+  const RunResult run = sandbox_.RunTool({"-a", "dump"});
+  EXPECT_THAT(run, Aborted("", kErrorType, "index is required."));
+  EXPECT_THAT(LogOf(sandbox_), ElementsAre(EndsWith("reason: index is required.")));
+}
+
+TEST_F(FailureLogTest, HasNoErrorThatAStaticInitialiserLeftBehind) {
+  const char* const own = std::getenv("ASAN_OPTIONS");
+  // The address sanitizer otherwise insists on being the first library.
+  const std::string sanitizer =
+      "ASAN_OPTIONS=" + std::string(own == nullptr ? "" : own) + ":verify_asan_link_order=0";
+  const RunResult run = sandbox_.RunCommand(
+      {"env", std::string("LD_PRELOAD=") + STALE_ERRNO_LIBRARY, sanitizer, ToolPath(), "-a", "dump"});
+  EXPECT_THAT(run, Aborted("", kErrorType, "index is required."));
+  EXPECT_THAT(LogOf(sandbox_), ElementsAre(EndsWith("reason: index is required.")));
 }
 
 TEST_F(FailureLogTest, NamesTheFirstOfSeveralBadValues) {

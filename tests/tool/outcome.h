@@ -9,6 +9,10 @@
 
 namespace quorelastic::testing {
 
+// What the run-time prints as the type of an exception that leaves main.
+inline constexpr char kErrorType[] = "vantrel::Error";
+inline constexpr char kIoErrorType[] = "vantrel::elastic::IndexIoError";
+
 inline constexpr char kUsageText[] =
     "Usage: quorelastic\n"
     "  -a, --action           allowed action: command, search, allterm, term, dump, doc_term, occupy_mem, "

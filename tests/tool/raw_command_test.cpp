@@ -24,7 +24,6 @@ namespace {
 using namespace std::string_literals;
 using ::testing::IsEmpty;
 
-constexpr size_t kLongestMessage = size_t{64} << 20;
 constexpr char kPrintedDone[] = "{\"success\":true}\n";
 
 class RawCommandTest : public ExchangeTest {

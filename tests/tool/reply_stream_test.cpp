@@ -26,7 +26,6 @@ using ::testing::AnyOf;
 using Script = ScriptedPeer::Script;
 using Replies = std::vector<std::string>;
 
-constexpr size_t kLongestMessage = size_t{64} << 20;
 constexpr char kRequest[] = "{\"command\":\"status\"}";
 constexpr char kProgress[] = "{\"progress\":1}";
 

@@ -29,7 +29,7 @@ constexpr ControlGroupLayout kLayouts[] = {
     {":memory:", "/sys/fs/cgroup/memory", "/memory.limit_in_bytes", "/memory.usage_in_bytes", "total_cache",
      "total_shmem"}};
 
-std::optional<uint64_t> ParseNumber(std::string_view text) {
+std::optional<uint64_t> ParseDecimal(std::string_view text) {
   text.remove_prefix(std::min(text.find_first_not_of(" \t"), text.size()));
   uint64_t number = 0;
   const auto [behind, error] = std::from_chars(text.data(), text.data() + text.size(), number);
@@ -41,7 +41,7 @@ std::optional<uint64_t> ReadNumber(const std::string& path) {
   std::ifstream file(path);
   std::string line;
   std::getline(file, line);
-  return ParseNumber(line);
+  return ParseDecimal(line);
 }
 
 // The number behind `name` at the start of a line.
@@ -49,7 +49,7 @@ std::optional<uint64_t> ReadStatistic(const std::string& path, std::string_view 
   std::ifstream file(path);
   for (std::string line; std::getline(file, line);) {
     if (line.starts_with(name) && line.size() > name.size() && line[name.size()] == ' ') {
-      return ParseNumber(std::string_view(line).substr(name.size()));
+      return ParseDecimal(std::string_view(line).substr(name.size()));
     }
   }
   return std::nullopt;

@@ -128,7 +128,7 @@ std::span<const uint8_t> ByteReader::Take(uint64_t most) {
   return taken;
 }
 
-// Most often they are few, and lie in the next eight bytes.
+// Few of them, in the next eight bytes, are the most frequent case.
 bool ByteReader::PassShortVInts(uint64_t count) {
   constexpr uint64_t kHighBits = 0x8080808080808080;
   static_assert(std::endian::native == std::endian::little, "the first byte is the lowest of the eight");
@@ -156,7 +156,7 @@ bool ByteReader::PassManyShortVInts(uint64_t count) {
   return true;
 }
 
-// Those before the end of the source, or of a buffer that is shorter than a step.
+// For what is left of the source when it is shorter than a step, and for buffers that are.
 bool ByteReader::PassShortVIntsAtEnd(uint64_t count) {
   for (int length = 1; count > 0; ++length) {
     if (remaining() == 0 || length > 3) return false;
@@ -175,6 +175,8 @@ void ByteReader::Borrow(const ByteReader& lender) {
 }
 
 void ByteReader::GiveBack() {
+  if (data_ == buffer_.data()) return;
+  data_ = buffer_.data();
   buffer_start_ = offset();
   position_ = filled_ = 0;
 }

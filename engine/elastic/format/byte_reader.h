@@ -84,16 +84,23 @@ class ByteReader {
   }
   void Advance(size_t count) { position_ += count; }
 
-  // Moves past `count` VInts, if each of them takes three bytes at most; false, and at a place that says nothing, where
-  // one is longer, or may be, or the source ends.
+  // Moves past `count` VInts, if each of them takes three bytes at most. False, and at an unspecified offset, where one
+  // is longer, or may be, or the source ends.
   bool PassShortVInts(uint64_t count);
 
-  // Reads what the buffer of another reader of the same source holds, instead of reading it once more, until this one
-  // moves out of it. To be given back before the other one reads on, which changes fills().
+  // Reads from the buffer of `lender`, which reads the same source, as long as the offset lies in that buffer. So bytes
+  // that are already in memory are not read again. Seek() must follow. The buffer must stay as it is until GiveBack():
+  // each change of it changes the lender's fills().
   void Borrow(const ByteReader& lender);
+  // Stays at the offset and forgets the lender's buffer, if it still uses it.
   void GiveBack();
+  // How many times the buffer was filled.
   uint64_t fills() const { return fills_; }
   size_t buffer_size() const { return buffer_size_; }
+
+  // Throws where what watches the source (WatchedFolder) cancels. Reads do the same; this is for work out of proportion
+  // to the bytes read.
+  void AllowCancel() const { source_->ReadAt(0, {}); }
 
   // A string; throws also when it is not valid UTF-8, or longer than kLongestText.
   std::string ReadString();
@@ -115,7 +122,7 @@ class ByteReader {
   uint64_t size_;
   size_t buffer_size_;
   std::vector<uint8_t> buffer_;
-  const uint8_t* data_ = nullptr;  // of buffer_, or of the lender's
+  const uint8_t* data_ = nullptr;  // the contents of buffer_, or of the lender's
   uint64_t buffer_start_ = 0;      // offset in the source of data_[0]
   size_t position_ = 0;            // next byte in data_
   size_t filled_ = 0;              // valid bytes in data_

@@ -4,12 +4,17 @@
 
 #include <algorithm>
 #include <exception>
+#include <limits>
 #include <optional>
+#include <string_view>
+#include <tuple>
+#include <unordered_set>
 #include <utility>
 
 #include "elastic/format/byte_reader.h"
 #include "elastic/format/field_infos.h"
 #include "elastic/format/file_names.h"
+#include "elastic/format/opening_error.h"
 #include "elastic/format/quoted.h"
 #include "vantrel/elastic/index_error.h"
 
@@ -27,8 +32,6 @@ constexpr int32_t kWithUserData = -8;
 constexpr int32_t kWithDiagnostics = -9;
 static_assert(kWithDiagnostics == kNewestCommitFormat);
 
-constexpr int32_t kMostSegments = int32_t{1} << 16;
-
 void SkipString(ByteReader& reader) { reader.Skip(reader.ReadVInt()); }
 
 void SkipStringMap(ByteReader& reader) {
@@ -38,12 +41,18 @@ void SkipStringMap(ByteReader& reader) {
   }
 }
 
-std::optional<std::vector<int64_t>> ReadNormGenerations(ByteReader& reader) {
+// `room` is how many more generations the commit may have.
+std::optional<std::vector<int64_t>> ReadNormGenerations(ByteReader& reader, int64_t& room) {
   const uint64_t start = reader.offset();
   const int32_t count = reader.ReadInt();
   if (count == -1) return std::nullopt;
   if (count < 0 || count > kMostFields || static_cast<uint64_t>(count) > reader.remaining() / 8) {
     reader.Damaged(start, "count of norm generations is " + std::to_string(count));
+  }
+  room -= count;
+  if (room < 0) {
+    reader.Damaged(start,
+                   "the commit has more than " + std::to_string(kMostNormGenerations) + " norm generations");
   }
   std::vector<int64_t> generations(static_cast<size_t>(count));
   for (int64_t& generation : generations) generation = reader.ReadLong();
@@ -70,7 +79,7 @@ void ReadStore(ByteReader& reader, SegmentInfo& segment) {
   segment.store_is_compound = reader.ReadByte() == 1;
 }
 
-SegmentInfo ReadSegment(ByteReader& reader, int32_t format) {
+SegmentInfo ReadSegment(ByteReader& reader, int32_t format, int64_t& norms_room) {
   SegmentInfo segment;
   segment.name = ReadSegmentName(reader);
   const uint64_t count_start = reader.offset();
@@ -90,7 +99,7 @@ SegmentInfo ReadSegment(ByteReader& reader, int32_t format) {
   }
   if (format <= kWithSharedStores) ReadStore(reader, segment);
   if (format <= kWithSingleNorms) segment.has_norms_file = reader.ReadByte() == 1;
-  segment.norm_generations = ReadNormGenerations(reader);
+  segment.norm_generations = ReadNormGenerations(reader, norms_room);
   segment.compound = ReadCompound(reader);
   if (format <= kWithDeletionCount) segment.deleted_count = reader.ReadInt();
   if (format <= kWithHasPositions) segment.has_positions = reader.ReadByte() == 1;
@@ -127,6 +136,72 @@ void CheckChecksum(const ByteSource& source, ByteReader& reader, CommitChecksum 
   }
 }
 
+// Where there is no checksum, the end of the file is all that shows whether its bytes are of this layout.
+void CheckEnd(ByteReader& reader, const Commit& commit, bool is_oldest) {
+  const uint64_t start = reader.offset();
+  // The oldest layout may have its version here. The first one written is 1.
+  if (is_oldest && reader.remaining() > 0 && reader.ReadLong() == 0 && commit.segments.empty()) {
+    reader.Damaged(start, "version is 0, and there is no segment");
+  }
+  if (reader.remaining() == 0) return;
+  reader.Damaged(reader.offset(), std::to_string(reader.remaining()) + " bytes behind the end of the commit");
+}
+
+// The documents of a store that a segment has.
+struct Slice {
+  std::string_view store;
+  int64_t begin;
+  int64_t end;
+};
+
+// Segments that share documents would have them read once for each.
+void CheckSlices(const std::string& file, std::vector<Slice> slices) {
+  std::sort(slices.begin(), slices.end(), [](const Slice& a, const Slice& b) {
+    return std::tie(a.store, a.begin) < std::tie(b.store, b.begin);
+  });
+  const auto overlap = std::adjacent_find(slices.begin(), slices.end(), [](const Slice& a, const Slice& b) {
+    return a.store == b.store && b.begin < a.end;
+  });
+  if (overlap == slices.end()) return;
+  throw IndexDamagedError(file, 0,
+                          "two segments have document " + std::to_string((overlap + 1)->begin) +
+                              " of the document store " + std::string(overlap->store));
+}
+
+void CheckNumbers(const std::string& file, const SegmentInfo& segment) {
+  const auto refuse = [&](const std::string& problem) {
+    throw IndexDamagedError(file, 0, "segment " + segment.name + " has " + problem);
+  };
+  if (segment.store_offset < SegmentInfo::kOwnStore) {
+    refuse("its documents at " + std::to_string(segment.store_offset) + " in the document store");
+  }
+  if (!segment.norm_generations.has_value()) return;
+  for (const int64_t generation : *segment.norm_generations) {
+    if (generation < SegmentInfo::kNoOwnNorms) refuse("norms of generation " + std::to_string(generation));
+  }
+}
+
+// What a layout can hold, but no index can mean.
+void CheckSense(const std::string& file, const Commit& commit) {
+  std::unordered_set<std::string_view> names;
+  std::vector<Slice> slices;
+  int64_t documents = 0;
+  for (const SegmentInfo& segment : commit.segments) {
+    CheckNumbers(file, segment);
+    if (!names.insert(segment.name).second) {
+      throw IndexDamagedError(file, 0, "segment " + segment.name + " is there twice");
+    }
+    documents += segment.document_count;
+    if (segment.store_offset == SegmentInfo::kOwnStore || segment.document_count == 0) continue;
+    const int64_t begin = segment.store_offset;
+    slices.push_back({segment.store_segment, begin, begin + segment.document_count});
+  }
+  if (documents > std::numeric_limits<int32_t>::max()) {
+    throw IndexDamagedError(file, 0, std::to_string(documents) + " documents are too many");
+  }
+  CheckSlices(file, std::move(slices));
+}
+
 int64_t NewestGeneration(const Folder& folder) {
   return std::max(ListedGeneration(folder), HintedGeneration(folder));
 }
@@ -160,15 +235,21 @@ int64_t HintedGeneration(const Folder& folder) {
 Commit ReadCommit(const std::shared_ptr<const ByteSource>& source, int64_t generation,
                   CommitChecksum checksum) {
   if (source->size() > kLargestCommit) {
-    throw IndexError(source->name(), std::to_string(source->size()) + " bytes are too many for a commit");
+    throw IndexDamagedError(source->name(), 0,
+                            std::to_string(source->size()) + " bytes are too many for a commit");
   }
   ByteReader reader(source);
   Commit commit;
   commit.generation = generation;
-  int32_t format = reader.ReadInt();
+  const int32_t format = reader.ReadInt();
   if (format < kNewestCommitFormat) {
     reader.Damaged(0, "format is " + std::to_string(format) + ", but " + std::to_string(kNewestCommitFormat) +
                           " is the newest known");
+  }
+  // Generations in names are younger than format numbers.
+  if (format >= 0 && generation > 0) {
+    reader.Damaged(0, "format is " + std::to_string(format) +
+                          ", but a file with a generation in its name has a negative one");
   }
   commit.format = std::min(format, 0);
   commit.counter = format;
@@ -181,36 +262,41 @@ Commit ReadCommit(const std::shared_ptr<const ByteSource>& source, int64_t gener
   if (count < 0 || count > kMostSegments) {
     reader.Damaged(count_start, "segment count is " + std::to_string(count));
   }
-  for (int32_t i = 0; i < count; ++i) commit.segments.push_back(ReadSegment(reader, format));
+  int64_t norms_room = kMostNormGenerations;
+  for (int32_t i = 0; i < count; ++i) commit.segments.push_back(ReadSegment(reader, format, norms_room));
   if (format < 0) SkipUserData(reader, format);
-  if (format <= kWithChecksum) CheckChecksum(*source, reader, checksum);
-  // The oldest layout may have its version here.
-  if (format >= 0 && reader.remaining() >= 8) reader.ReadLong();
+  if (format <= kWithChecksum) {
+    CheckChecksum(*source, reader, checksum);
+  } else {
+    CheckEnd(reader, commit, format >= 0);
+  }
   commit.end = reader.offset();
   commit.size = reader.size();
+  CheckSense(source->name(), commit);
   return commit;
 }
 
 void UseNewestCommit(const Folder& folder, const std::function<void(Commit)>& use) {
-  const auto use_generation = [&](int64_t generation) {
-    use(ReadCommit(folder.Open(CommitFileName(generation)), generation));
+  // Returns why a commit cannot be used, and nothing where it was.
+  const auto try_generation = [&](int64_t generation) -> std::exception_ptr {
+    try {
+      use(ReadCommit(folder.Open(CommitFileName(generation)), generation));
+      return nullptr;
+    } catch (const IndexIoError& error) {
+      if (!IsAbsenceError(error)) throw;
+      return std::current_exception();
+    } catch (const IndexError&) {
+      return std::current_exception();
+    }
   };
   int64_t generation = NewestGeneration(folder);
   if (generation < 0) throw IndexError(folder.path(), "no index in this folder: it holds no segments file");
   for (bool tried_again = false;;) {
-    std::exception_ptr failure;
-    try {
-      return use_generation(generation);
-    } catch (const IndexError&) {
-      failure = std::current_exception();
-    }
-    if (generation > 1 && folder.Exists(CommitFileName(generation - 1))) {
-      try {
-        return use_generation(generation - 1);
-      } catch (const IndexError&) {
-        // The newer commit's failure says more.
-      }
-    }
+    const std::exception_ptr failure = try_generation(generation);
+    if (failure == nullptr) return;
+    // Where neither can be used, the newer one's failure says more.
+    const bool has_older = generation > 1 && folder.Exists(CommitFileName(generation - 1));
+    if (has_older && try_generation(generation - 1) == nullptr) return;
     const int64_t newest = NewestGeneration(folder);
     // The same again, but once: its writer may have completed it, and dropped the one before, just now.
     if (newest < generation || (newest == generation && tried_again)) std::rethrow_exception(failure);

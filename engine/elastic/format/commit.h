@@ -53,15 +53,18 @@ struct Commit {
   uint64_t size = 0;  // of the file
 };
 
-// Room for any commit, in bytes; a hole in a file that is larger could be taken for endless user data.
-inline constexpr uint64_t kLargestCommit = uint64_t{256} << 20;
+// Room for any commit: its bytes, its segments, and the generations of norms of all its segments together. They bound
+// the time that a commit takes to read (a second), and what it takes in memory (40 MiB).
+inline constexpr uint64_t kLargestCommit = uint64_t{64} << 20;
+inline constexpr int32_t kMostSegments = int32_t{1} << 16;
+inline constexpr int64_t kMostNormGenerations = int64_t{1} << 21;
 
 inline constexpr int32_t kNewestCommitFormat = -9;
 
 // Decodes a file segments_N. Layout, by format number F (the newer the smaller; -9 is written today):
 //
 //   Int F                       absent, with the Long, when the first Int is 0 or more: that is the oldest
-//                               layout, and the Int is the counter
+//                               layout, only in the file "segments", and the Int is the counter
 //   Long version, Int counter   counter: number of the next segment
 //   Int segment count, then for each segment
 //     String name, Int document count
@@ -77,8 +80,16 @@ inline constexpr int32_t kNewestCommitFormat = -9;
 //   F <= -5: Long CRC-32 of every byte before it
 //   the oldest layout: Long version, or nothing
 //
-// Bytes after that are ignored. Throws IndexDamagedError, IndexIoError, and IndexError for a file of over
-// 256 MiB, which no commit reaches. Whoever leaves it to others to compare the checksum takes kPassOver.
+// Bytes after a checksum are ignored. A layout without one must end where the file does: a file of zeros, or with a
+// flipped bit in F, would else be read as a commit of few segments or none, and a writer would delete the rest.
+//
+// What is returned makes sense: each segment is there once, no two segments have the same documents of a shared store,
+// all documents together are at most 2^31 - 1, and offsets and generations are not below -1. So whoever goes through
+// the segments of a commit does the work of each segment's files once. (The index library accepts a repeated segment,
+// and reads its files each time.)
+//
+// Throws IndexDamagedError, also for a file larger than kLargestCommit, and IndexIoError. Whoever leaves it to others to
+// compare the checksum takes kPassOver.
 enum class CommitChecksum { kCompare, kPassOver };
 Commit ReadCommit(const std::shared_ptr<const ByteSource>& source, int64_t generation,
                   CommitChecksum checksum = CommitChecksum::kCompare);
@@ -92,10 +103,13 @@ int64_t HintedGeneration(const Folder& folder);
 // stands for a commit, but holds no generation.
 int64_t ListedGeneration(const Folder& folder);
 
-// Finds the newest commit of the folder that `use` accepts, and hands it over. The newest generation is the
-// larger of what the folder lists and what segments.gen says; the one before it is tried where the newest is
-// not readable (a commit being written). `use` opens what the commit refers to; where it throws because a
-// writer has replaced the commit meanwhile, the search begins again, else its exception passes on.
+// Finds the newest commit of the folder that `use` accepts, and hands it over. The newest generation is the larger of
+// what the folder lists and what segments.gen says. The generation before it is tried where the newest is missing,
+// incomplete or damaged: its writer may still be at work. `use` opens what the commit refers to; where a file is
+// missing because a writer has replaced the commit meanwhile, the search begins again.
+//
+// Any other refusal of the system (EACCES, EMFILE, EIO, ENOMEM ...), of the commit's own file or in `use`, is thrown at
+// once: it says nothing about the commit, and is no reason to use an older one.
 void UseNewestCommit(const Folder& folder, const std::function<void(Commit)>& use);
 
 // The same for who needs no more than the commit.

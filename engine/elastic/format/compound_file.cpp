@@ -4,13 +4,11 @@
 #include <utility>
 
 #include "elastic/format/byte_reader.h"
+#include "elastic/format/name_budget.h"
 #include "vantrel/elastic/index_error.h"
 
 namespace vantrel::elastic::format {
 namespace {
-
-// A segment has a dozen files, and in the older layouts one more for each field.
-constexpr uint32_t kMostParts = uint32_t{1} << 16;
 
 class PartSource : public ByteSource {
  public:
@@ -37,8 +35,9 @@ CompoundFile::CompoundFile(std::shared_ptr<const ByteSource> source) : source_(s
   Part* last = nullptr;
   uint64_t first_offset = reader.size();
   uint64_t last_offset = 0;
+  NameBudget budget;
   const uint32_t count = reader.ReadVInt();
-  if (count > kMostParts) reader.Damaged(0, std::to_string(count) + " sub-files are too many");
+  if (count > kMostSubFiles) reader.Damaged(0, std::to_string(count) + " sub-files are too many");
   for (uint32_t left = count; left > 0; --left) {
     const uint64_t start = reader.offset();
     const int64_t offset = reader.ReadLong();
@@ -50,7 +49,9 @@ CompoundFile::CompoundFile(std::shared_ptr<const ByteSource> source) : source_(s
     if (last != nullptr) last->size = static_cast<uint64_t>(offset) - last->offset;
     last_offset = static_cast<uint64_t>(offset);
     first_offset = std::min(first_offset, last_offset);
-    const auto [part, is_new] = parts_.try_emplace(reader.ReadString(), Part{last_offset, 0});
+    std::string name = reader.ReadString();
+    budget.Take(reader, start, name);
+    const auto [part, is_new] = parts_.try_emplace(std::move(name), Part{last_offset, 0});
     if (!is_new) reader.Damaged(start, "sub-file bears the name of one before");
     if (reader.offset() > first_offset) {
       reader.Damaged(start, "table reaches into the first sub-file at " + std::to_string(first_offset));

@@ -13,6 +13,9 @@ namespace vantrel::elastic::format {
 //
 //   VInt count, then for each sub-file: Long offset of its first byte in this file, String name
 //   the sub-files in the order of the table, without gaps, the last up to the end
+//
+// At most kMostSubFiles of them, with names within the bounds of name_budget.h: more is damage. So whatever the file,
+// at most 6 MiB are taken.
 class CompoundFile {
  public:
   // Where a sub-file stands.
@@ -20,6 +23,9 @@ class CompoundFile {
     uint64_t offset;
     uint64_t size;
   };
+
+  // A segment has a dozen files, and in the older layouts one more for each field.
+  static constexpr uint32_t kMostSubFiles = uint32_t{1} << 14;
 
   // Reads the table. Throws IndexDamagedError, IndexIoError.
   explicit CompoundFile(std::shared_ptr<const ByteSource> source);

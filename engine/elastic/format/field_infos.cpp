@@ -1,9 +1,11 @@
 #include "elastic/format/field_infos.h"
 
 #include <exception>
+#include <string_view>
 #include <unordered_set>
 
 #include "elastic/format/byte_reader.h"
+#include "elastic/format/name_budget.h"
 #include "elastic/format/text.h"
 #include "elastic/format/utf16_text.h"
 #include "vantrel/elastic/index_error.h"
@@ -61,12 +63,15 @@ std::vector<FieldInfo> ReadAll(ByteReader& reader, Names names) {
     reader.Damaged(count_start, std::to_string(count) + " fields are too many");
   }
   std::vector<FieldInfo> fields;
+  fields.reserve(count);  // so that the views of the names stay valid
   // No writer makes two fields of one name; a hole in the file would be full of them.
-  std::unordered_set<std::string> seen;
+  std::unordered_set<std::string_view> seen;
+  NameBudget budget;
   for (; count > 0; --count) {
     const uint64_t start = reader.offset();
     FieldInfo& field = fields.emplace_back();
     field.name = ReadName(reader, names);
+    budget.Take(reader, start, field.name);
     if (!seen.insert(field.name).second) {
       reader.Damaged(start, "field " + std::to_string(fields.size() - 1) + " bears the name of one before");
     }

@@ -47,6 +47,15 @@ bool IsCoreExtension(std::string_view extension) {
   return std::find(kCoreExtensions.begin(), kCoreExtensions.end(), extension) != kCoreExtensions.end();
 }
 
+bool IsNormsExtension(std::string_view extension) {
+  return (extension.starts_with(".f") || extension.starts_with(".s")) && extension.size() > 2 &&
+         std::all_of(extension.begin() + 2, extension.end(), [](char c) { return c >= '0' && c <= '9'; });
+}
+
+std::string_view ExtensionOf(std::string_view name) {
+  return name.substr(std::min(name.find('.'), name.size()));
+}
+
 bool IsStoreExtension(std::string_view extension) {
   return std::find(kStoreExtensions.begin(), kStoreExtensions.end(), extension) != kStoreExtensions.end();
 }

@@ -37,6 +37,12 @@ bool IsSegmentName(std::string_view name);
 bool IsCoreExtension(std::string_view extension);
 bool IsStoreExtension(std::string_view extension);
 
+// Whether a file has the norms of one field: ".f12" or ".s12".
+bool IsNormsExtension(std::string_view extension);
+
+// What a name has from its first dot on; empty without one.
+std::string_view ExtensionOf(std::string_view name);
+
 // Which segment a file belongs to, by its name; empty for others.
 std::string_view SegmentOfFile(std::string_view name);
 

@@ -10,6 +10,7 @@
 #include <utility>
 
 #include "elastic/format/file_descriptor.h"
+#include "elastic/format/opening_error.h"
 #include "vantrel/elastic/index_error.h"
 
 namespace vantrel::elastic::format {
@@ -106,7 +107,10 @@ std::vector<std::string> DiskFolder::List() const {
 }
 
 bool DiskFolder::Exists(const std::string& name) const {
-  return access(JoinPath(path_, name).c_str(), F_OK) == 0;
+  const std::string path = JoinPath(path_, name);
+  if (access(path.c_str(), F_OK) == 0) return true;
+  if (!IsAbsence(errno)) throw IndexIoError(path, "cannot examine file", errno);
+  return false;
 }
 
 std::shared_ptr<const ByteSource> DiskFolder::Open(const std::string& name) const {

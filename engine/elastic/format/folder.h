@@ -25,6 +25,7 @@ class Folder {
   // The names of what is in it, but for folders, in no order. Throws IndexIoError.
   virtual std::vector<std::string> List() const = 0;
 
+  // Throws IndexIoError where the system does not say.
   virtual bool Exists(const std::string& name) const = 0;
 
   // Opens a file for reading. Throws IndexIoError where it is missing, unreadable or a folder, IndexError where it is

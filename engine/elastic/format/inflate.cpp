@@ -11,6 +11,11 @@ Inflater::Inflater() {
 
 Inflater::~Inflater() { inflateEnd(&stream_); }
 
+void Inflater::Restart() {
+  inflateReset(&stream_);
+  complete_ = false;
+}
+
 bool Inflater::Take(std::span<const uint8_t> piece,
                     const std::function<bool(std::span<const uint8_t>)>& take) {
   std::array<uint8_t, 4096> out;

@@ -8,7 +8,8 @@
 
 namespace vantrel::elastic::format {
 
-// Inflates one zlib stream that comes in pieces, into pieces of bounded size. For one thread at a time.
+// Inflates zlib streams that come in pieces, into pieces of at most 4 KiB. How long a stream may become is for the
+// caller to bound: a stream inflates to as much as 1,032 times its size. For one thread at a time.
 class Inflater {
  public:
   // Throws std::bad_alloc.
@@ -17,8 +18,11 @@ class Inflater {
   Inflater& operator=(const Inflater&) = delete;
   ~Inflater();
 
-  // Hands what comes out of a piece to `take`. False where the stream is damaged, has ended before the piece has,
-  // or `take` returned false.
+  // Begins another stream.
+  void Restart();
+
+  // Hands what comes out of a piece to `take`, which may throw. False where the stream is damaged, has ended before
+  // the piece has, or `take` returned false.
   bool Take(std::span<const uint8_t> piece, const std::function<bool(std::span<const uint8_t>)>& take);
 
   // Whether the stream has come to its end.

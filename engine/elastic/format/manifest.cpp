@@ -49,7 +49,8 @@ class Lines {
   std::string_view Word() {
     const size_t end = std::min(text_.find_first_of(" \n", at_), text_.size());
     if (end == at_) Refuse("a word is missing");
-    return text_.substr(std::exchange(at_, end), end - at_);
+    const size_t start = std::exchange(at_, end);
+    return text_.substr(start, end - start);
   }
   template <typename Number>
   Number TakeNumber(int base = 10) {
@@ -189,15 +190,16 @@ std::optional<Manifest> FindManifest(const Folder& folder, const Commit& commit)
   return std::nullopt;
 }
 
-std::set<std::string> FilesOf(const Folder& folder, const SegmentInfo& segment) {
+std::set<std::string> FilesOf(const Folder& folder, const SegmentInfo& segment, SharedFiles& shared) {
   const RecordingFolder recording(folder);
-  [[maybe_unused]] const WholeSegment opened(recording, segment);
+  [[maybe_unused]] const WholeSegment opened(recording, segment, shared);
   return recording.names();
 }
 
 Manifest MakeManifest(const Folder& folder, const Commit& commit, const std::optional<Manifest>& known) {
   std::set<std::string> names = {CommitFileName(commit.generation)};
-  for (const SegmentInfo& segment : commit.segments) names.merge(FilesOf(folder, segment));
+  SharedFiles shared(folder);
+  for (const SegmentInfo& segment : commit.segments) names.merge(FilesOf(folder, segment, shared));
   Manifest manifest;
   manifest.generation = commit.generation;
   for (const std::string& name : names) {

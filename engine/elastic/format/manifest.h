@@ -11,6 +11,7 @@
 #include "elastic/format/byte_source.h"
 #include "elastic/format/commit.h"
 #include "elastic/format/folder.h"
+#include "elastic/format/shared_files.h"
 
 namespace vantrel::elastic::format {
 
@@ -63,9 +64,9 @@ std::optional<Manifest> ReadManifest(const ByteSource& source);
 // IndexIoError where the system fails.
 std::optional<Manifest> FindManifest(const Folder& folder, const Commit& commit);
 
-// The names of the files that make up a segment, as far as they are in the folder. Throws IndexIoError where the system
-// fails.
-std::set<std::string> FilesOf(const Folder& folder, const SegmentInfo& segment);
+// The names of the files that make up a segment, as far as they are in the folder; `shared` is as for WholeSegment.
+// Throws IndexIoError where the system fails.
+std::set<std::string> FilesOf(const Folder& folder, const SegmentInfo& segment, SharedFiles& shared);
 
 // The manifest of a commit. What `known` has of its files, which are written once, is taken from there; the others are
 // read. Throws IndexError where the system does not let them be.

@@ -11,9 +11,11 @@ bool IsMissingError(const IndexIoError& error) {
   return error.error_number() == EACCES || error.error_number() == EPERM || IsAbsenceError(error);
 }
 
-bool IsAbsenceError(const IndexIoError& error) {
+bool IsAbsenceError(const IndexIoError& error) { return IsAbsence(error.error_number()); }
+
+bool IsAbsence(int error_number) {
   constexpr std::array kErrors = {ENOENT, EISDIR, ENOTDIR, ELOOP, ENAMETOOLONG};
-  return std::find(kErrors.begin(), kErrors.end(), error.error_number()) != kErrors.end();
+  return std::find(kErrors.begin(), kErrors.end(), error_number) != kErrors.end();
 }
 
 FileMissingError AsMissing(const IndexError& error) {

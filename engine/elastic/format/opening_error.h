@@ -16,6 +16,7 @@ bool IsMissingError(const IndexIoError& error);
 
 // Whether a failed opening means that there is no such file: none of that name, or something else in its place.
 bool IsAbsenceError(const IndexIoError& error);
+bool IsAbsence(int error_number);
 
 // A failed opening for which the index can be blamed.
 FileMissingError AsMissing(const IndexError& error);

@@ -94,8 +94,8 @@ bool PostingsReader::PassQuickly(int32_t count) {
   return true;
 }
 
-// Adds up what is most frequent without decoding each number. Returns how many documents of `count` it has passed; what
-// it leaves, only the others can tell.
+// Adds up postings without decoding each number. Returns how many of `count` documents it has passed. It leaves what is
+// rare or damaged to the other ways.
 int32_t PostingsReader::PassWide(int32_t count) {
   const auto window = reader_.Window(kScanStep);
   const uint8_t* next = window.data();

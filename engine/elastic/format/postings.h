@@ -56,16 +56,16 @@ class PostingsReader {
   void PassBlock(int32_t count);
   static constexpr int32_t kLongestBlock = 128;
 
-  // Of the documents of the block: how often all of them together hold the term, and a bound for each.
+  // The sum of the frequencies in the block, and a number that none of them exceeds.
   uint64_t block_occurrences() const { return block_occurrences_; }
   uint32_t block_bound() const { return block_bound_; }
-  // How often each of them does. May read the block once more. Throws like Next().
+  // The frequencies in the block. May read the block again. Throws like Next().
   std::span<const uint32_t> BlockFrequencies();
 
   int32_t document() const { return document_; }
   uint32_t frequency() const { return frequency_; }
 
-  // Reads ahead, so that the next bytes lie in the buffer, if it is large enough for them.
+  // Fills the buffer with the next bytes, as many of these as fit it.
   void ReadAhead(size_t bytes) { reader_.Window(std::min(bytes, reader_.buffer_size())); }
   // For a reader of the same source to borrow from.
   const ByteReader& reader() const { return reader_; }

@@ -11,8 +11,8 @@ std::string Quoted(std::string_view name) {
   std::string quoted = "\"";
   for (const char c : name) {
     const auto byte = static_cast<unsigned char>(c);
-    const bool starts_character = (byte & 0xc0) != 0x80;
-    if (quoted.size() >= kMostBytes && starts_character) return quoted + "...\"";
+    const bool may_cut = !is_text || (byte & 0xc0) != 0x80;  // text is not cut within a character
+    if (quoted.size() >= kMostBytes && may_cut) return quoted + "...\"";
     const bool is_plain = byte >= 0x80 ? is_text : byte >= 0x20 && byte != 0x7f && c != '"' && c != '\\';
     if (is_plain) {
       quoted += c;

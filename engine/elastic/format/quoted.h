@@ -5,8 +5,8 @@
 
 namespace vantrel::elastic::format {
 
-// A name from outside as an error message can show it: in quotes, on one line, cut where it is long, and with
-// every byte that is no part of printable text as \xNN.
+// A name from outside as an error message can show it: in quotes, on one line, with every byte that is not part of
+// printable text as \xNN. A long name is cut: whatever its bytes, at most 90 bytes are returned.
 std::string Quoted(std::string_view name);
 
 }  // namespace vantrel::elastic::format

@@ -10,6 +10,9 @@
 namespace vantrel::elastic::format {
 namespace {
 
+// Of all segments together, in the files: ten times as much in memory where they are very short.
+constexpr uint64_t kMostNames = uint64_t{8} << 20;
+
 bool IsCompound(const Folder& folder, const SegmentInfo& info, const std::string& compound_name) {
   if (info.compound == SegmentInfo::Compound::kLookForFile) return folder.Exists(compound_name);
   return info.compound == SegmentInfo::Compound::kYes;
@@ -54,8 +57,15 @@ std::vector<SegmentFiles> OpenNewestSegments(const Folder& folder, Need need) {
   UseNewestCommit(folder, [&](Commit commit) {
     // Apart, so that a failure closes what is open before another commit is tried.
     std::vector<SegmentFiles> segments;
+    uint64_t names = 0;
     for (SegmentInfo& segment : commit.segments) {
-      segments.push_back(OpenSegment(folder, std::move(segment), need));
+      const SegmentFiles& files = segments.emplace_back(OpenSegment(folder, std::move(segment), need));
+      names += files.field_infos->size();
+      if (names > kMostNames) {
+        throw IndexDamagedError(files.field_infos->name(), 0,
+                                "the field names of the segments up to this one take more than " +
+                                    std::to_string(kMostNames) + " bytes together");
+      }
     }
     opened = std::move(segments);
   });

@@ -6,7 +6,7 @@
 namespace vantrel::elastic::format {
 namespace {
 
-constexpr size_t kBufferSize = size_t{16} << 10;
+constexpr size_t kSkipBufferSize = size_t{16} << 10;
 
 // Five numbers of up to 5, 5, 5, 5 and 9 bytes.
 constexpr uint64_t kLongestEntry = 29;
@@ -29,7 +29,7 @@ void SkipListReader::Prepare(int32_t document_frequency, bool has_payloads) {
   has_payloads_ = has_payloads;
   document_frequency_ = document_frequency;
   level_count_ = LevelsOf(document_frequency);
-  while (levels_.size() < static_cast<size_t>(level_count_)) levels_.emplace_back(source_, kBufferSize);
+  while (levels_.size() < static_cast<size_t>(level_count_)) levels_.emplace_back(source_, kSkipBufferSize);
 }
 
 void SkipListReader::Seek(uint64_t pointer, int32_t document_frequency, bool has_payloads) {

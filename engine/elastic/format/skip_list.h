@@ -50,8 +50,8 @@ class SkipListReader {
   // Moves before the first entry of each level of a term. Throws IndexDamagedError, IndexIoError, as does Next().
   void Seek(uint64_t pointer, int32_t document_frequency, bool has_payloads);
 
-  // Seek() where another reader of the same source may hold the skip data in its buffer: they are read from there. To
-  // be given back before that reader reads on.
+  // Seek() that takes from the buffer of `lender`, which reads the same source, what it holds of the skip data. GiveBack()
+  // must come before the next Seek() and before Next() once that buffer has changed (ByteReader::Borrow).
   void SeekBorrowing(const ByteReader& lender, uint64_t pointer, int32_t document_frequency,
                      bool has_payloads);
   void GiveBack();

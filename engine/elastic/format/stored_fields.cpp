@@ -3,14 +3,13 @@
 #include <string>
 #include <utility>
 
-#include "elastic/format/inflate.h"
 #include "elastic/format/text.h"
 
 namespace vantrel::elastic::format {
 namespace {
 
 // Format numbers, each named after what it brought.
-constexpr int32_t kWithUtf8 = 1;
+constexpr int32_t kWithUtf8Values = 1;
 constexpr int32_t kWithoutCompression = 2;
 
 constexpr size_t kIndexBufferSize = size_t{64} << 10;
@@ -92,7 +91,7 @@ void StoredFieldsReader::PassValue() {
     PassCompressed(start, length);
   } else if ((flags_ & kBinary) != 0) {
     records_.Skip(length);
-  } else if (format_ >= kWithUtf8) {
+  } else if (format_ >= kWithUtf8Values) {
     PassText(start, length);
   } else {
     PassUtf16(start, length);
@@ -121,18 +120,40 @@ void StoredFieldsReader::PassUtf16(uint64_t start, uint64_t count) {
 }
 
 void StoredFieldsReader::PassCompressed(uint64_t start, uint64_t length) {
-  Inflater inflater;
+  if (inflater_.has_value()) {
+    inflater_->Restart();
+  } else {
+    inflater_.emplace();
+  }
   Utf8Scanner scanner;
   const bool is_text = (flags_ & kBinary) == 0;
+  uint64_t value_size = 0;
   while (length > 0) {
     const auto piece = records_.Take(length);
-    const bool good = inflater.Take(
-        piece, [&](std::span<const uint8_t> inflated) { return !is_text || scanner.Take(inflated); });
+    compressed_ += piece.size();
+    const bool good = inflater_->Take(piece, [&](std::span<const uint8_t> inflated) {
+      value_size += inflated.size();
+      inflated_ += inflated.size();
+      RequireWithinBounds(start, value_size);
+      records_.AllowCancel();
+      return !is_text || scanner.Take(inflated);
+    });
     if (!good) records_.Damaged(start, "compressed value cannot be inflated to what it should be");
     length -= piece.size();
   }
-  if (!inflater.IsComplete() || !scanner.IsComplete()) {
+  if (!inflater_->IsComplete() || !scanner.IsComplete()) {
     records_.Damaged(start, "compressed value is cut off");
+  }
+}
+
+void StoredFieldsReader::RequireWithinBounds(uint64_t start, uint64_t value_size) const {
+  if (value_size > kLongestInflated) {
+    records_.Damaged(start,
+                     "compressed value inflates to more than " + std::to_string(kLongestInflated) + " bytes");
+  }
+  if (inflated_ > kFreelyInflated && inflated_ - kFreelyInflated > kMostInflation * compressed_) {
+    records_.Damaged(start, "compressed values up to this one inflate to more than " +
+                                std::to_string(kMostInflation) + " times their size");
   }
 }
 

@@ -2,9 +2,11 @@
 
 #include <cstdint>
 #include <memory>
+#include <optional>
 
 #include "elastic/format/byte_reader.h"
 #include "elastic/format/byte_source.h"
+#include "elastic/format/inflate.h"
 
 namespace vantrel::elastic::format {
 
@@ -24,6 +26,14 @@ class StoredFieldsReader {
   static constexpr uint8_t kCut = 1;
   static constexpr uint8_t kBinary = 2;
   static constexpr uint8_t kCompressed = 4;
+
+  // The longest that a compressed value may become, in bytes. The index library inflates it into memory, and takes
+  // five times as much for a text.
+  static constexpr uint64_t kLongestInflated = uint64_t{16} << 20;
+  // All compressed values that a reader has passed may become kMostInflation times their compressed size, and
+  // kFreelyInflated bytes beyond. So the time that a file takes is bounded by its size.
+  static constexpr uint64_t kMostInflation = 32;
+  static constexpr uint64_t kFreelyInflated = uint64_t{4} << 20;
 
   // The headers are read and checked. Throws IndexDamagedError, IndexIoError, as does everything below.
   StoredFieldsReader(std::shared_ptr<const ByteSource> index, std::shared_ptr<const ByteSource> records);
@@ -50,8 +60,8 @@ class StoredFieldsReader {
   uint8_t flags() const { return flags_; }
   uint8_t known_flags() const;  // those that the format has
 
-  // Moves past the value. It must lie within the record, be valid UTF-8 where it is text, and whole where it is
-  // compressed.
+  // Moves past the value. It must lie within the record, be valid UTF-8 where it is text, and where it is compressed
+  // be whole and inflate within the bounds above. It is not held in memory.
   void PassValue();
 
  private:
@@ -61,6 +71,7 @@ class StoredFieldsReader {
   void PassText(uint64_t start, uint64_t length);
   void PassUtf16(uint64_t start, uint64_t count);
   void PassCompressed(uint64_t start, uint64_t length);
+  void RequireWithinBounds(uint64_t start, uint64_t value_size) const;
 
   ByteReader index_;
   ByteReader records_;
@@ -72,6 +83,10 @@ class StoredFieldsReader {
   uint64_t field_offset_ = 0;
   uint32_t number_ = 0;
   uint8_t flags_ = 0;
+
+  std::optional<Inflater> inflater_;  // made for the first compressed value
+  uint64_t compressed_ = 0;           // bytes of compressed values that were read
+  uint64_t inflated_ = 0;             // bytes that they became
 };
 
 }  // namespace vantrel::elastic::format

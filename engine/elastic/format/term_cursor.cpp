@@ -1,10 +1,10 @@
 #include "elastic/format/term_cursor.h"
 
 #include <limits>
+#include <span>
 #include <utility>
 
 #include "elastic/format/text.h"
-#include "elastic/format/utf16_text.h"
 
 namespace vantrel::elastic::format {
 namespace {
@@ -12,17 +12,57 @@ namespace {
 // Format numbers, each named after what it brought.
 constexpr int32_t kWithFormat = -1;
 constexpr int32_t kWithSkipLevels = -3;
-constexpr int32_t kWithUtf8 = -4;
-static_assert(kWithUtf8 == TermCursor::kNewestFormat);
+constexpr int32_t kWithUtf8Terms = -4;
+static_assert(kWithUtf8Terms == TermCursor::kNewestFormat);
 
 constexpr int32_t kNeverSkips = std::numeric_limits<int32_t>::max();
-constexpr size_t kBufferSize = size_t{64} << 10;
+constexpr size_t kTermsBufferSize = size_t{64} << 10;
+
+constexpr uint64_t kLargestPointer = std::numeric_limits<int64_t>::max();
+
+// The most bytes that a term's numbers take, before its text and behind it.
+constexpr size_t kLengths = size_t{2} * 5;
+constexpr size_t kNumbers = 3 * 5 + 3 * 9;
+
+// Decodes numbers that lie within a window. What is not well-formed is left to the reader, which reports it.
+class WindowDecoder {
+ public:
+  explicit WindowDecoder(const uint8_t* next) : next_(next) {}
+
+  const uint8_t* next() const { return next_; }
+  void Skip(size_t length) { next_ += length; }
+  bool ok() const { return ok_; }
+
+  uint32_t VInt() {
+    const uint64_t value = Variable(5);
+    if (value > std::numeric_limits<uint32_t>::max()) ok_ = false;
+    return static_cast<uint32_t>(value);
+  }
+  uint64_t VLong() { return Variable(9); }
+
+ private:
+  uint64_t Variable(int most_bytes) {
+    const uint8_t first = *next_++;
+    if (first < 0x80) return first;
+    uint64_t value = first & 0x7fU;
+    for (int shift = 7; shift < 7 * most_bytes; shift += 7) {
+      const uint8_t byte = *next_++;
+      value |= uint64_t{byte & 0x7fU} << shift;
+      if (byte < 0x80) return value;
+    }
+    ok_ = false;
+    return value;
+  }
+
+  const uint8_t* next_;
+  bool ok_ = true;
+};
 
 }  // namespace
 
 TermCursor::TermCursor(std::shared_ptr<const ByteSource> source, File file, uint32_t field_count,
                        int32_t document_count)
-    : reader_(std::move(source), kBufferSize),
+    : reader_(std::move(source), kTermsBufferSize),
       file_(file),
       field_count_(field_count),
       document_count_(document_count) {
@@ -58,9 +98,10 @@ void TermCursor::ReadHeader() {
                                      std::to_string(reader_.size()) + " bytes");
   }
   count_ = static_cast<uint64_t>(count);
+  text_ = TermText(is_utf8());
 }
 
-bool TermCursor::is_utf8() const { return format_ <= kWithUtf8; }
+bool TermCursor::is_utf8() const { return format_ <= kWithUtf8Terms; }
 
 uint64_t TermCursor::index_entries() const {
   const auto interval = static_cast<uint64_t>(index_interval_);
@@ -75,7 +116,9 @@ bool TermCursor::Next() {
     if (reader_.remaining() == 0) return false;
     Damaged("terms end here, but the file goes on to " + std::to_string(reader_.size()));
   }
-  is_utf8() ? ReadUtf8Text() : ReadUtf16Text();
+  field_before_ = field_;
+  if (is_utf8() && NextFromWindow()) return true;
+  text_.Read(reader_, term_offset_);
   ReadField();
   ReadInfo();
   if (file_ == File::kIndex) dictionary_pointer_ = Advanced(dictionary_pointer_);
@@ -83,10 +126,45 @@ bool TermCursor::Next() {
   return true;
 }
 
-void TermCursor::CopyPlace(TermPlace& place) const {
+// The same as the rest of Next(), for a term that lies in the reader's buffer with some bytes behind it, and is not
+// damaged; else false, and nothing has changed.
+bool TermCursor::NextFromWindow() {
+  const std::span<const uint8_t> window = reader_.Window(4 * (kLengths + kNumbers));
+  if (window.size() < kLengths + kNumbers) return false;
+  WindowDecoder decoder(window.data());
+  const uint32_t prefix = decoder.VInt();
+  const uint32_t suffix = decoder.VInt();
+  if (!decoder.ok() || prefix > text_.text().size() || size_t{prefix} + suffix > kLongestTerm ||
+      window.size() < kLengths + suffix + kNumbers) {
+    return false;
+  }
+  const uint8_t* const text = decoder.next();
+  decoder.Skip(suffix);
+  const auto field = static_cast<int32_t>(decoder.VInt());
+  const auto documents = static_cast<int32_t>(decoder.VInt());
+  const uint64_t postings = decoder.VLong();
+  const uint64_t positions = decoder.VLong();
+  const uint32_t skip_offset = HasSkipOffset(documents) ? decoder.VInt() : 0;
+  const uint64_t pointer = file_ == File::kIndex ? decoder.VLong() : 0;
+  if (!decoder.ok() || !IsField(field) || documents < FewestDocuments() || documents > document_count_ ||
+      postings < static_cast<uint64_t>(info_.document_frequency) ||
+      postings > kLargestPointer - info_.postings_pointer ||
+      positions > kLargestPointer - info_.positions_pointer ||
+      pointer > kLargestPointer - dictionary_pointer_) {
+    return false;
+  }
+  text_.TakeNext(prefix, text, suffix);
+  field_ = field;
+  info_ = {documents, info_.postings_pointer + postings, info_.positions_pointer + positions, skip_offset};
+  dictionary_pointer_ += pointer;
+  reader_.Advance(static_cast<size_t>(decoder.next() - window.data()));
+  ++walked_;
+  return true;
+}
+
+void TermCursor::UpdateCopy(TermPlace& place) const {
   place.field = field_;
-  place.text = text_;
-  place.units = units_;
+  text_.UpdateCopy(place.text);
   place.info = info_;
   place.dictionary_pointer = dictionary_pointer_;
 }
@@ -101,56 +179,26 @@ void TermCursor::Resume(const TermPlace& place, uint64_t walked) {
   reader_.Seek(place.dictionary_pointer);
   walked_ = walked;
   field_ = place.field;
-  text_ = place.text;
-  units_ = place.units;
-  text_is_stale_ = !is_utf8();
+  text_.Assign(place.text);
   info_ = place.info;
-}
-
-void TermCursor::ReadUtf8Text() {
-  const uint32_t prefix = reader_.ReadVInt();
-  const uint32_t suffix = reader_.ReadVInt();
-  shared_length_ = prefix;
-  if (prefix > text_.size()) {
-    Damaged("term shares " + std::to_string(prefix) + " bytes with one of " + std::to_string(text_.size()));
-  }
-  const size_t length = size_t{prefix} + suffix;
-  if (length > kLongestTerm) Damaged("term of " + std::to_string(length) + " bytes is too long");
-  text_.resize(length);
-  reader_.ReadBytes(std::span(reinterpret_cast<uint8_t*>(text_.data()) + prefix, suffix));
-}
-
-void TermCursor::ReadUtf16Text() {
-  const uint32_t prefix = reader_.ReadVInt();
-  const uint32_t suffix = reader_.ReadVInt();
-  shared_length_ = prefix;
-  if (prefix > units_.size()) {
-    Damaged("term shares " + std::to_string(prefix) + " characters with one of " +
-            std::to_string(units_.size()));
-  }
-  units_.resize(prefix);
-  ReadUtf16Units(reader_, suffix, units_);
-  text_is_stale_ = true;
-}
-
-void TermCursor::ConvertText() const {
-  text_ = FromUtf16(units_);
-  text_is_stale_ = false;
 }
 
 void TermCursor::ReadField() {
   field_ = static_cast<int32_t>(reader_.ReadVInt());
-  if (field_ >= 0 && static_cast<uint32_t>(field_) < field_count_) return;
-  if (field_ == -1 && file_ == File::kIndex && walked_ == 0) return;
+  if (IsField(field_)) return;
   Damaged("term bears field number " + std::to_string(field_) + " of " + std::to_string(field_count_));
+}
+
+bool TermCursor::IsField(int32_t field) const {
+  if (field >= 0) return static_cast<uint32_t>(field) < field_count_;
+  return field == -1 && file_ == File::kIndex && walked_ == 0;
 }
 
 void TermCursor::ReadInfo() {
   const int32_t documents_before = info_.document_frequency;
   info_.document_frequency = static_cast<int32_t>(reader_.ReadVInt());
   // The index's first entry stands before all terms and has no documents.
-  const int32_t fewest = file_ == File::kIndex && walked_ == 0 ? 0 : 1;
-  if (info_.document_frequency < fewest || info_.document_frequency > document_count_) {
+  if (info_.document_frequency < FewestDocuments() || info_.document_frequency > document_count_) {
     Damaged("term is in " + std::to_string(info_.document_frequency) + " documents of " +
             std::to_string(document_count_));
   }
@@ -162,18 +210,18 @@ void TermCursor::ReadInfo() {
             std::to_string(info_.postings_pointer - postings_before) + " bytes before this term's begin");
   }
   info_.positions_pointer = Advanced(info_.positions_pointer);
-  info_.skip_offset = HasSkipOffset() ? reader_.ReadVInt() : 0;
+  info_.skip_offset = HasSkipOffset(info_.document_frequency) ? reader_.ReadVInt() : 0;
 }
 
-bool TermCursor::HasSkipOffset() const {
-  if (format_ != kWithFormat) return info_.document_frequency >= skip_interval_;
+bool TermCursor::HasSkipOffset(int32_t document_frequency) const {
+  if (format_ != kWithFormat) return document_frequency >= skip_interval_;
   // That layout's skip data is of no use any more, but its offset stands in the dictionary.
-  return file_ == File::kDictionary && info_.document_frequency > skip_interval_;
+  return file_ == File::kDictionary && document_frequency > skip_interval_;
 }
 
 uint64_t TermCursor::Advanced(uint64_t pointer) {
   const uint64_t delta = reader_.ReadVLong();
-  if (delta > static_cast<uint64_t>(std::numeric_limits<int64_t>::max()) - pointer) {
+  if (delta > kLargestPointer - pointer) {
     Damaged("pointer " + std::to_string(pointer) + " plus " + std::to_string(delta) +
             " does not fit 63 bits");
   }

@@ -8,6 +8,7 @@
 
 #include "elastic/format/byte_reader.h"
 #include "elastic/format/byte_source.h"
+#include "elastic/format/term_text.h"
 
 namespace vantrel::elastic::format {
 
@@ -22,14 +23,14 @@ struct TermInfo {
 // A place in a dictionary, as the index over it tells: behind a term, whose numbers and text the next one builds on.
 struct TermPlace {
   int32_t field = -1;
-  std::string text;      // in the layout of today,
-  std::u16string units;  // or in the older ones
+  RawText text;
   TermInfo info;
   uint64_t dictionary_pointer = 0;  // where the next term begins
 };
 
 // Walks a term dictionary (.tis) or the index over it (.tii), which holds every n-th term of the dictionary.
-// Memory does not grow with the number of terms. For one thread at a time. Layout, by format F (the newer the
+// Memory does not grow with the number of terms, and a walk takes time in proportion to the bytes of the file, however
+// long the texts are that its terms share (TermText). For one thread at a time. Layout, by format F (the newer the
 // smaller; -4 is written today):
 //
 //   Int F                 absent when the first Int is 0 or more: the oldest layout, and that is the count
@@ -37,8 +38,7 @@ struct TermPlace {
 //   Int index interval, Int skip interval    F = -1: in .tis only, and the second means something else
 //   F <= -3: Int most skip levels            before: 1
 //   then for each term
-//     VInt prefix shared with the term before, VInt length of what follows, that text
-//       (F = -4: in bytes, UTF-8; before: in UTF-16 code units, see text.h)
+//     VInt prefix shared with the term before, VInt length of what follows, that text (TermText)
 //     VInt field number     in .tii the first term is empty and bears field number -1
 //     VInt document frequency, VLong postings pointer, VLong positions pointer (both from the term before)
 //     VInt offset of skip data, where the document frequency reaches the skip interval
@@ -72,38 +72,46 @@ class TermCursor {
   // file ends there too.
   bool Next();
 
-  // The term at the cursor, while Next() has returned true last.
+  // The term at the cursor, while Next() has returned true last; before the first term and behind a place to go on from,
+  // that place.
   int32_t field() const { return field_; }
   // The bytes of the file: UTF-8 if undamaged. Valid until Next().
-  std::string_view text() const {
-    if (text_is_stale_) ConvertText();
-    return text_;
-  }
+  std::string_view text() const { return text_.text(); }
+  // What the text has in common with the one before, and how it compares with it.
+  const TermText& term_text() const { return text_; }
+  bool HasValidText() { return text_.IsValid(); }
+  bool HasKeptText() { return text_.IsKept(); }
+  // The field of the term before, -1 before the first one.
+  int32_t field_before() const { return field_before_; }
   const TermInfo& info() const { return info_; }
-  // How much of its text it takes from the term before, in bytes or, in the older layouts, UTF-16 units.
-  uint32_t shared_length() const { return shared_length_; }
   uint64_t dictionary_pointer() const { return dictionary_pointer_; }  // in .tii only
 
-  // Copies the place that the entry at the cursor tells; in .tii only.
-  void CopyPlace(TermPlace& place) const;
+  // Makes a copy of the place that the entry at the cursor tells, out of a copy of that of the entry before; at the
+  // first entry, out of an empty one. In .tii only.
+  void UpdateCopy(TermPlace& place) const;
 
   // Moves to a place in this dictionary, behind the first `walked` of its terms; Next() goes on from there. Throws
   // IndexDamagedError where the dictionary has no such place. A place that lies between terms by mistake shows as
   // damage or as wrong terms, as wrong bytes of a dictionary do.
   void Resume(const TermPlace& place, uint64_t walked);
 
-  // Where the term at the cursor begins, and throws IndexDamagedError about it.
+  // Where the term at the cursor begins, and where it ends.
   uint64_t offset() const { return term_offset_; }
+  uint64_t end_offset() const { return reader_.offset(); }
+  // Throws IndexDamagedError about the term at the cursor, or about what follows it.
   [[noreturn]] void Damaged(const std::string& problem) const { reader_.Damaged(term_offset_, problem); }
+  [[noreturn]] void DamagedBehind(const std::string& problem) const {
+    reader_.Damaged(reader_.offset(), problem);
+  }
 
  private:
   void ReadHeader();
-  void ReadUtf8Text();
-  void ReadUtf16Text();
-  void ConvertText() const;
+  bool NextFromWindow();
   void ReadField();
   void ReadInfo();
-  bool HasSkipOffset() const;
+  bool IsField(int32_t field) const;
+  bool HasSkipOffset(int32_t document_frequency) const;
+  int32_t FewestDocuments() const { return file_ == File::kIndex && walked_ == 0 ? 0 : 1; }
   uint64_t Advanced(uint64_t pointer);
 
   ByteReader reader_;
@@ -120,10 +128,8 @@ class TermCursor {
   uint64_t walked_ = 0;
   uint64_t term_offset_ = 0;
   int32_t field_ = -1;
-  uint32_t shared_length_ = 0;
-  mutable std::string text_;
-  std::u16string units_;  // the text of the older layouts, which is converted only when it is asked for
-  mutable bool text_is_stale_ = false;
+  int32_t field_before_ = -1;
+  TermText text_{true};
   TermInfo info_;
   uint64_t dictionary_pointer_ = 0;
 };

@@ -3,9 +3,6 @@
 #include <limits>
 #include <utility>
 
-#include "elastic/format/text.h"
-#include "elastic/format/utf16_text.h"
-
 namespace vantrel::elastic::format {
 namespace {
 
@@ -13,24 +10,24 @@ namespace {
 constexpr int32_t kOldest = 1;
 constexpr int32_t kWithFlags = 2;
 constexpr int32_t kWithTermsPointer = 3;
-constexpr int32_t kWithUtf8 = 4;
+constexpr int32_t kWithUtf8Vectors = 4;
 
-constexpr size_t kIndexBufferSize = size_t{64} << 10;
-constexpr size_t kListBufferSize = size_t{64} << 10;
-constexpr size_t kTermsBufferSize = size_t{128} << 10;
+constexpr size_t kVectorIndexBufferSize = size_t{64} << 10;
+constexpr size_t kVectorListBufferSize = size_t{64} << 10;
+constexpr size_t kVectorTermsBufferSize = size_t{128} << 10;
 
 }  // namespace
 
 TermVectorsReader::TermVectorsReader(std::shared_ptr<const ByteSource> index,
                                      std::shared_ptr<const ByteSource> documents,
                                      std::shared_ptr<const ByteSource> fields, uint32_t field_count)
-    : index_(std::move(index), kIndexBufferSize),
-      documents_(std::move(documents), kListBufferSize),
-      fields_(std::move(fields), kTermsBufferSize),
+    : index_(std::move(index), kVectorIndexBufferSize),
+      documents_(std::move(documents), kVectorListBufferSize),
+      fields_(std::move(fields), kVectorTermsBufferSize),
       field_count_(field_count),
       seen_in_(field_count) {
   format_ = index_.ReadInt();
-  if (format_ < kOldest || format_ > kWithUtf8) {
+  if (format_ < kOldest || format_ > kWithUtf8Vectors) {
     index_.Damaged(0, "format is " + std::to_string(format_) + ", but 1 to 4 are known");
   }
   for (ByteReader* reader : {&documents_, &fields_}) {
@@ -40,6 +37,8 @@ TermVectorsReader::TermVectorsReader(std::shared_ptr<const ByteSource> index,
           0, "format is " + std::to_string(again) + ", but the index has format " + std::to_string(format_));
     }
   }
+  text_ = TermText(format_ >= kWithUtf8Vectors);
+  order_ = OrderOfTerms(format_ >= kWithUtf8Vectors);
   entry_size_ = index_tells_terms_start() ? 16 : 8;
   if ((index_.size() - kHeader) % entry_size_ != 0) {
     index_.Damaged(index_.size(), "the file ends within an entry");
@@ -121,17 +120,17 @@ void TermVectorsReader::SeekTerms(size_t field) {
 }
 
 void TermVectorsReader::PassTerms() {
-  text_.clear();
-  units_.clear();
+  text_.Clear();
   at_first_ = true;
   for (; term_count_ > 0; --term_count_) ReadTerm();
 }
 
 void TermVectorsReader::ReadTerm() {
   const uint64_t start = fields_.offset();
-  text_before_.assign(text_);
-  format_ >= kWithUtf8 ? ReadUtf8Text(start) : ReadUtf16Text(start);
-  if (!at_first_ && text_ <= text_before_) fields_.Damaged(start, "term does not come after the one before");
+  text_.Read(fields_, start);
+  if (!text_.IsValid()) fields_.Damaged(start, "term is not valid UTF-8");
+  if (!at_first_ && !order_.Take(text_.ascends_by()))
+    fields_.Damaged(start, "term does not come after the one before");
   at_first_ = false;
   const uint64_t frequency_start = fields_.offset();
   const uint32_t frequency = fields_.ReadVInt();
@@ -139,31 +138,6 @@ void TermVectorsReader::ReadTerm() {
     fields_.Damaged(frequency_start, "frequency is " + std::to_string(static_cast<int32_t>(frequency)));
   }
   if (flags_ != 0) PassPlaces(frequency);
-}
-
-void TermVectorsReader::ReadUtf8Text(uint64_t start) {
-  const uint32_t prefix = fields_.ReadVInt();
-  const uint32_t suffix = fields_.ReadVInt();
-  const uint64_t length = uint64_t{prefix} + suffix;
-  if (prefix > text_.size() || length > kLongestTerm || suffix > fields_.remaining()) {
-    fields_.Damaged(start, "term shares " + std::to_string(prefix) + " bytes with one of " +
-                               std::to_string(text_.size()) + ", and goes on for " + std::to_string(suffix));
-  }
-  text_.resize(length);
-  fields_.ReadBytes(std::span(reinterpret_cast<uint8_t*>(text_.data()) + prefix, suffix));
-  if (!IsValidUtf8(text_)) fields_.Damaged(start, "term is not valid UTF-8");
-}
-
-void TermVectorsReader::ReadUtf16Text(uint64_t start) {
-  const uint32_t prefix = fields_.ReadVInt();
-  const uint32_t suffix = fields_.ReadVInt();
-  if (prefix > units_.size()) {
-    fields_.Damaged(start, "term shares " + std::to_string(prefix) + " characters with one of " +
-                               std::to_string(units_.size()));
-  }
-  units_.resize(prefix);
-  ReadUtf16Units(fields_, suffix, units_);
-  text_ = FromUtf16(units_);
 }
 
 void TermVectorsReader::PassPlaces(uint32_t frequency) {

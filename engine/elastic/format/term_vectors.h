@@ -8,6 +8,7 @@
 
 #include "elastic/format/byte_reader.h"
 #include "elastic/format/byte_source.h"
+#include "elastic/format/term_text.h"
 
 namespace vantrel::elastic::format {
 
@@ -22,9 +23,8 @@ namespace vantrel::elastic::format {
 //     for each field but the first: VLong how many bytes the one before takes in .tvf
 //   .tvf  for each field of each document, without gaps: VInt count of terms, 1 or more
 //     F >= 2: Byte flags (1 positions, 2 offsets);  F = 1: a VInt of no meaning
-//     for each term, in ascending order
-//       VInt prefix shared with the term before, VInt length of what follows, that text
-//         (F = 4: in bytes, UTF-8; before: in UTF-16 code units, see text.h)
+//     for each term, in ascending order (term_order.h)
+//       VInt prefix shared with the term before, VInt length of what follows, that text (TermText)
 //       VInt frequency
 //       with positions: that many VInts, each the distance from the one before; the first may be -1
 //       with offsets: that many times VInt distance of the start from the end before (may be negative), VInt length
@@ -73,7 +73,7 @@ class TermVectorsReader {
   uint8_t flags() const { return flags_; }
 
   // Moves past all terms of the field. They must ascend, be valid, and hold as many positions and offsets as
-  // announced.
+  // announced. Takes time in proportion to the bytes that are read, however long the texts are that terms share.
   void PassTerms();
   uint64_t terms_end() const { return fields_.offset(); }
 
@@ -83,8 +83,6 @@ class TermVectorsReader {
   void ReadFieldNumbers(uint32_t count);
   void ReadTermsStarts();
   void ReadTerm();
-  void ReadUtf8Text(uint64_t start);
-  void ReadUtf16Text(uint64_t start);
   void PassPlaces(uint32_t frequency);
 
   ByteReader index_;
@@ -104,9 +102,8 @@ class TermVectorsReader {
   uint32_t term_count_ = 0;
   uint8_t flags_ = 0;
   bool at_first_ = true;
-  std::string text_;
-  std::string text_before_;
-  std::u16string units_;
+  TermText text_{true};
+  OrderOfTerms order_{true};
 };
 
 }  // namespace vantrel::elastic::format

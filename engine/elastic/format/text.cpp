@@ -1,6 +1,8 @@
 #include "elastic/format/text.h"
 
 #include <algorithm>
+#include <array>
+#include <bit>
 #include <cstdint>
 #include <cstring>
 
@@ -8,9 +10,6 @@ namespace vantrel::elastic::format {
 namespace {
 
 constexpr char32_t kReplacement = 0xfffd;
-
-bool IsHighSurrogate(char32_t unit) { return unit >= 0xd800 && unit <= 0xdbff; }
-bool IsLowSurrogate(char32_t unit) { return unit >= 0xdc00 && unit <= 0xdfff; }
 
 // Decodes the sequence that begins at `next` and moves past it; false where it is ill-formed. The caller has
 // seen that it does not begin with an ASCII byte.
@@ -33,17 +32,75 @@ bool DecodeMultibyte(const uint8_t*& next, const uint8_t* end, char32_t& code_po
 // How many bytes a sequence has that begins with `lead`, as far as that tells.
 size_t SequenceLength(uint8_t lead) { return lead >= 0xf0 ? 4 : lead >= 0xe0 ? 3 : lead >= 0xc0 ? 2 : 1; }
 
-// Moves past ASCII, eight bytes at a time.
+template <typename Word>
+Word Load(const uint8_t* from) {
+  Word word = 0;
+  std::memcpy(&word, from, sizeof word);
+  return word;
+}
+
+constexpr uint64_t kHighBits = 0x8080808080808080;
+static_assert(std::endian::native == std::endian::little, "the first byte of a word is its lowest");
+
+// Moves past ASCII, 16 bytes at a time.
 const uint8_t* SkipAscii(const uint8_t* next, const uint8_t* end) {
+  while (end - next >= 16) {
+    if (((Load<uint64_t>(next) | Load<uint64_t>(next + 8)) & kHighBits) != 0) break;
+    next += 16;
+  }
   while (end - next >= 8) {
-    uint64_t eight = 0;
-    std::memcpy(&eight, next, sizeof eight);
-    if ((eight & 0x8080808080808080U) != 0) break;
+    const uint64_t high = Load<uint64_t>(next) & kHighBits;
+    if (high != 0) return next + std::countr_zero(high) / 8;
     next += 8;
   }
-  while (next != end && *next < 0x80) ++next;
+  // Words that overlap: most texts end here, and most are ASCII.
+  const auto left = static_cast<size_t>(end - next);
+  if (left >= 4) {
+    if (((Load<uint32_t>(next) | Load<uint32_t>(end - 4)) & static_cast<uint32_t>(kHighBits)) == 0)
+      return end;
+  } else if (left == 0 || (next[0] | next[left / 2] | next[left - 1]) < 0x80) {
+    return end;
+  }
+  while (*next < 0x80) ++next;
   return next;
 }
+
+// An automaton that accepts well-formed UTF-8. A state is a shift: the entry of a byte, shifted by the state, has the
+// next state in its lowest bits, so that a byte takes one load and one shift.
+enum : uint64_t {
+  kReject = 0,
+  kAccept = 6,  // between characters
+  kOneMore = 12,
+  kTwoMore = 18,
+  kThreeMore = 24,
+  kAfterE0 = 30,  // of two more, the next one must not make an overlong form,
+  kAfterEd = 36,  // a surrogate,
+  kAfterF0 = 42,  // of three more, an overlong form,
+  kAfterF4 = 48,  // a code point above U+10FFFF
+};
+constexpr uint64_t kStateBits = 63;
+
+constexpr uint64_t AutomatonEntry(uint64_t byte) {
+  const auto in = [byte](uint64_t first, uint64_t last) { return byte >= first && byte <= last; };
+  uint64_t start = kReject;
+  if (byte < 0x80) start = kAccept;
+  if (in(0xc2, 0xdf)) start = kOneMore;
+  if (in(0xe0, 0xef)) start = byte == 0xe0 ? kAfterE0 : byte == 0xed ? kAfterEd : kTwoMore;
+  if (in(0xf0, 0xf4)) start = byte == 0xf0 ? kAfterF0 : byte == 0xf4 ? kAfterF4 : kThreeMore;
+  uint64_t entry = start << kAccept;
+  if (in(0x80, 0xbf)) entry |= kAccept << kOneMore | kOneMore << kTwoMore | kTwoMore << kThreeMore;
+  if (in(0xa0, 0xbf)) entry |= kOneMore << kAfterE0;
+  if (in(0x80, 0x9f)) entry |= kOneMore << kAfterEd;
+  if (in(0x90, 0xbf)) entry |= kTwoMore << kAfterF0;
+  if (in(0x80, 0x8f)) entry |= kTwoMore << kAfterF4;
+  return entry;
+}
+
+constexpr std::array<uint64_t, 256> kAutomaton = [] {
+  std::array<uint64_t, 256> entries{};
+  for (size_t byte = 0; byte < entries.size(); ++byte) entries[byte] = AutomatonEntry(byte);
+  return entries;
+}();
 
 template <typename Sink>
 bool ForEachCodePoint(std::string_view text, Sink sink) {
@@ -95,26 +152,44 @@ void AppendUtf8(char32_t code_point, std::string& out) {
   }
 }
 
-bool IsValidUtf8(std::string_view text) {
-  const auto* next = reinterpret_cast<const uint8_t*>(text.data());
-  const uint8_t* const end = next + text.size();
-  char32_t ignored = 0;
-  while ((next = SkipAscii(next, end)) != end) {
-    if (!DecodeMultibyte(next, end, ignored)) return false;
+size_t WellFormedLength(std::string_view text) {
+  const auto* const begin = reinterpret_cast<const uint8_t*>(text.data());
+  const uint8_t* const end = begin + text.size();
+  constexpr ptrdiff_t kStride = 16;
+  const uint8_t* next = begin;
+  const uint8_t* good = begin;  // up to here, all is well-formed
+  uint64_t state = kAccept;
+  while (true) {
+    if (state == kAccept) good = next = SkipAscii(next, end);
+    if (next == end || state == kReject) break;
+    const uint8_t* const stop = next + std::min(kStride, end - next);
+    for (; next != stop; ++next) state = kAutomaton[*next] >> (state & kStateBits);
+    state &= kStateBits;
   }
-  return true;
+  char32_t ignored = 0;
+  while ((good = SkipAscii(good, end)) != end) {
+    if (!DecodeMultibyte(good, end, ignored)) break;
+  }
+  return static_cast<size_t>(good - begin);
 }
 
-bool IsKeptText(std::string_view text) {
-  const auto* next = reinterpret_cast<const uint8_t*>(text.data());
-  const uint8_t* const end = next + text.size();
-  char32_t code_point = 0;
-  while ((next = SkipAscii(next, end)) != end) {
-    if (!DecodeMultibyte(next, end, code_point)) return false;
-    if (code_point == 0xfffe || code_point == 0xffff || code_point == 0x1ffff) return false;
+bool IsValidUtf8(std::string_view text) { return WellFormedLength(text) == text.size(); }
+
+size_t KeptLength(std::string_view text) {
+  const auto* const begin = reinterpret_cast<const uint8_t*>(text.data());
+  const uint8_t* const end = begin + text.size();
+  // The last two bytes of each of them are BF BE or BF BF.
+  for (const uint8_t* next = SkipAscii(begin, end); next != end; ++next) {
+    if (*next != 0xbf || end - next < 2 || (next[1] | 1) != 0xbf) continue;
+    if (next - begin >= 1 && next[-1] == 0xef) return static_cast<size_t>(next - 1 - begin);
+    if (next - begin >= 2 && next[-1] == 0x9f && next[-2] == 0xf0 && next[1] == 0xbf) {
+      return static_cast<size_t>(next - 2 - begin);
+    }
   }
-  return true;
+  return text.size();
 }
+
+bool IsKeptText(std::string_view text) { return IsValidUtf8(text) && KeptLength(text) == text.size(); }
 
 bool Utf8Scanner::CompleteHeld(std::span<const uint8_t>& piece) {
   const size_t length = SequenceLength(held_[0]);
@@ -157,9 +232,7 @@ bool AppendCodePoints(std::string_view text, std::wstring& out) {
   return valid;
 }
 
-std::string FromUtf16(std::u16string_view units) {
-  std::string out;
-  out.reserve(units.size());
+void AppendUtf16(std::u16string_view units, std::string& out) {
   for (size_t i = 0; i < units.size(); ++i) {
     char32_t code_point = units[i];
     if (IsHighSurrogate(code_point) && i + 1 < units.size() && IsLowSurrogate(units[i + 1])) {
@@ -169,6 +242,12 @@ std::string FromUtf16(std::u16string_view units) {
     }
     AppendUtf8(code_point, out);
   }
+}
+
+std::string FromUtf16(std::u16string_view units) {
+  std::string out;
+  out.reserve(units.size());
+  AppendUtf16(units, out);
   return out;
 }
 

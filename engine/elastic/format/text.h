@@ -29,9 +29,16 @@ void AppendUtf8(char32_t code_point, std::string& out);
 // Well-formed UTF-8: shortest forms only, no surrogates, nothing above U+10FFFF.
 bool IsValidUtf8(std::string_view text);
 
+// How many leading bytes of `text` are well-formed UTF-8, up to the end of a whole character.
+size_t WellFormedLength(std::string_view text);
+
 // Well-formed UTF-8 that the index library can keep: it takes U+FFFE and U+FFFF for errors and loses the whole text
 // over them, and U+1FFFF for the text's end.
 bool IsKeptText(std::string_view text);
+
+// How many leading bytes of `text`, which is well-formed, lie before the first character that the library does not
+// keep; all of them where there is none.
+size_t KeptLength(std::string_view text);
 
 // IsValidUtf8 for a text that comes in pieces, which may cut a character in two. For one thread at a time.
 class Utf8Scanner {
@@ -52,7 +59,11 @@ class Utf8Scanner {
 // Appends the code points of `text` to `out`; false, with `out` half filled, where it is not well-formed.
 bool AppendCodePoints(std::string_view text, std::wstring& out);
 
+inline bool IsHighSurrogate(char32_t unit) { return unit >= 0xd800 && unit <= 0xdbff; }
+inline bool IsLowSurrogate(char32_t unit) { return unit >= 0xdc00 && unit <= 0xdfff; }
+
 // UTF-16 to UTF-8; a surrogate without its partner becomes U+FFFD.
+void AppendUtf16(std::u16string_view units, std::string& out);
 std::string FromUtf16(std::u16string_view units);
 
 }  // namespace vantrel::elastic::format

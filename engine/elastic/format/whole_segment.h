@@ -13,6 +13,8 @@
 #include "elastic/format/commit.h"
 #include "elastic/format/compound_file.h"
 #include "elastic/format/folder.h"
+#include "elastic/format/opening_error.h"
+#include "elastic/format/shared_files.h"
 
 namespace vantrel::elastic::format {
 
@@ -27,7 +29,8 @@ class WholeSegment {
  public:
   // Throws where the system has no room for one more open file, or fails otherwise: whatever is the matter, it is
   // not the index.
-  WholeSegment(const Folder& folder, SegmentInfo info);
+  // `shared` is of the same folder, and the same for all segments of the commit; it is not needed afterwards.
+  WholeSegment(const Folder& folder, SegmentInfo info, SharedFiles& shared);
 
   const SegmentInfo& info() const { return info_; }
 
@@ -55,8 +58,11 @@ class WholeSegment {
   // How many files it holds open, or could not open: one at least.
   size_t files_tried() const { return files_tried_; }
 
+  // About how much memory the names of sub-files take, in bytes: at most 12 MiB.
+  uint64_t NamesMemory() const;
+
  private:
-  // A file or why it is not there.
+  // A file, or why it cannot be opened; neither where there is none.
   struct Slot {
     std::shared_ptr<const ByteSource> source;
     std::exception_ptr failure;
@@ -68,13 +74,18 @@ class WholeSegment {
 
   Slot OpenPlain(const Folder& folder, const std::string& name);
   void OpenCompound(const Folder& folder, const std::string& name, CompoundSlot& slot);
+  void OpenStore(const Folder& folder, SharedFiles& shared);
   void OpenParts(const Folder& folder, const std::string& segment, const CompoundSlot* compound,
                  std::span<const std::string_view> extensions);
-  void OpenOldNorms(const Folder& folder);
-  void OpenOwnNorms(const Folder& folder);
+  void OpenOldNorms(const Folder& folder, SharedFiles& shared);
+  void OpenOwnNorms(const Folder& folder, SharedFiles& shared);
+  int64_t OwnNormsGeneration(size_t field) const;
+  void Keep(const std::string& extension, Slot slot);
+  std::string NameOf(const std::string& extension) const;
+  FileMissingError Missing(const std::string& name) const;
 
   SegmentInfo info_;
-  std::map<std::string, Slot> slots_;  // by extension
+  std::map<std::string, Slot> slots_;  // by extension; none for a file that is missing
   std::optional<CompoundSlot> compound_;
   std::optional<CompoundSlot> store_;
   bool has_deletions_ = false;

@@ -5,17 +5,17 @@
 
 #if defined(__x86_64__)
 #include <immintrin.h>
-// The functions of this name are compiled for these instructions, whatever the rest of the program needs.
+// Compiles a function for these instructions; the rest of the program does not need them.
 #define QUORELASTIC_WIDE __attribute__((target("avx2,bmi,bmi2,popcnt")))
 #endif
 
 namespace vantrel::elastic::format {
 namespace {
 
-// In masks of a step the lowest bit stands for the first byte.
+// In a mask of a step, the lowest bit stands for the first byte. This one selects the bytes up to number `bit`.
 constexpr uint64_t UpTo(int bit) { return (uint64_t{2} << bit) - 1; }
 
-// The bytes after two that announce another one.
+// The bytes that announce a fourth one.
 constexpr uint64_t FourthBytes(uint64_t high_bits) { return high_bits & high_bits << 1 & high_bits << 2; }
 
 #if defined(__x86_64__)
@@ -114,7 +114,7 @@ QUORELASTIC_WIDE bool PassShortVIntsWide(const uint8_t*& next, const uint8_t* en
 
 namespace {
 
-// Of 32 bytes those whose bit is set; of the others, 0.
+// Replaces each of 32 bytes whose bit is not set by 0.
 QUORELASTIC_WIDE inline __m256i Selected(__m256i bytes, uint32_t bits) {
   const __m256i byte_of_bit =
       _mm256_setr_epi64x(0x0000000000000000, 0x0101010101010101, 0x0202020202020202, 0x0303030303030303);
@@ -124,7 +124,7 @@ QUORELASTIC_WIDE inline __m256i Selected(__m256i bytes, uint32_t bits) {
   return _mm256_and_si256(bytes, is_set);
 }
 
-// In each of four lanes the sum of its selected bytes, which takes 12 bits.
+// The sum of the selected bytes of each of four lanes. It takes 12 bits.
 QUORELASTIC_WIDE inline __m256i SumsOf(const Step& step, uint64_t bits) {
   const __m256i zero = _mm256_setzero_si256();
   const __m256i low = _mm256_sad_epu8(Selected(step.low, static_cast<uint32_t>(bits)), zero);
@@ -137,9 +137,9 @@ QUORELASTIC_WIDE inline uint64_t AddLanes(__m256i lanes) {
   return static_cast<uint64_t>(_mm_cvtsi128_si64(_mm_add_epi64(halves, _mm_unpackhi_epi64(halves, halves))));
 }
 
-// Which numbers are frequencies, where a bit stands for each number and is set where that is even. A frequency follows
-// an even number that is none itself: in a run of even numbers it is every second one, and what comes behind the run
-// where its length is odd. The carry of a subtraction goes through each run.
+// Which numbers are frequencies. Each bit stands for a number; in `even` it is set where the number is even. A frequency
+// follows an even number that is not itself a frequency: every second number of a run of even ones is one, and the
+// number behind the run where the run's length is odd. The carry of the subtraction passes through a whole run.
 constexpr uint64_t FrequenciesAmong(uint64_t even) {
   constexpr uint64_t kOddPlaces = 0xaaaaaaaaaaaaaaaa;
   return (((even << 1 | kOddPlaces) - even) ^ kOddPlaces) ^ even;
@@ -167,14 +167,14 @@ QUORELASTIC_WIDE PostingsRun PassPostingsWide(const uint8_t*& next, const uint8_
     const int last = BitNumber(document_ends, passed - 1);
     const uint64_t mask = UpTo(last);
 
-    // Refused are a fourth byte, a longer frequency, a last byte of 0 (a frequency or a distance of 0, or a number
-    // that could be shorter), and a number of 1 in one byte (a distance of 0, or a frequency that need not be there).
+    // Left to the slow path: a fourth byte; a frequency of two bytes; a byte of 0 (a frequency or a distance of 0, or a
+    // number that could be shorter); a number of 1 in one byte (a distance of 0, or a frequency that is needless).
     const uint64_t refused =
         FourthBytes(more) | (frequencies & more) | EqualTo(step, 0) | (EqualTo(step, 1) & starts);
     if ((refused & mask) != 0) break;
 
     const Step plain{_mm256_and_si256(step.low, low_bits), _mm256_and_si256(step.high, low_bits)};
-    // Shifted across bytes, but the bit that comes in is cleared.
+    // The shift moves a bit of the neighbouring byte in, which the mask clears.
     const __m256i six_bits = _mm256_set1_epi8(0x3f);
     const Step halves{_mm256_and_si256(_mm256_srli_epi16(step.low, 1), six_bits),
                       _mm256_and_si256(_mm256_srli_epi16(step.high, 1), six_bits)};
@@ -200,7 +200,7 @@ QUORELASTIC_WIDE PostingsRun PassPostingsWide(const uint8_t*& next, const uint8_
 
 ScanInstructions FindBestScanInstructions() {
 #if defined(__x86_64__)
-  // The first two generations of AMD's Zen have BMI2, but take hundreds of cycles for its deposits of bits.
+  // The first two generations of AMD's Zen have BMI2, but take hundreds of cycles for PDEP and PEXT.
   const bool is_wide = __builtin_cpu_supports("avx2") != 0 && __builtin_cpu_supports("bmi") != 0 &&
                        __builtin_cpu_supports("bmi2") != 0 && __builtin_cpu_supports("popcnt") != 0 &&
                        __builtin_cpu_is("znver1") == 0 && __builtin_cpu_is("znver2") == 0;

@@ -1,11 +1,7 @@
 #include "elastic/health/commit_check.h"
 
-#include <algorithm>
 #include <charconv>
-#include <limits>
-#include <set>
 #include <string>
-#include <utility>
 
 #include "elastic/format/file_names.h"
 #include "elastic/format/opening_error.h"
@@ -52,51 +48,21 @@ void RequireCommitNames(const format::Folder& folder) {
   Refuse(Grade::kDamaged, folder.path(), 0, "an index", "no segments file");
 }
 
-void RefuseTooLarge(const format::Folder& folder, int64_t hinted) {
-  const auto newest = folder.Open(format::CommitFileName(std::max(hinted, format::ListedGeneration(folder))));
-  if (newest->size() <= format::kLargestCommit) return;
-  Refuse(Grade::kUnsafe, newest->name(), 0,
-         "a commit of up to " + std::to_string(format::kLargestCommit) + " bytes",
-         std::to_string(newest->size()));
-}
-
-// A newer commit that is incomplete is passed over, but not one that the disk cannot read: there is no verdict then.
-void RequireReadable(const format::Folder& folder, const Commit& found) {
-  const int64_t newest = format::ListedGeneration(folder);
-  if (newest <= found.generation) return;
-  try {
-    format::ReadCommit(folder.Open(format::CommitFileName(newest)), newest);
-  } catch (const IndexIoError& error) {
-    if (!format::IsMissingError(error)) throw;
-  } catch (const IndexError&) {
-    // Incomplete, as was to be expected.
-  }
-}
-
 void CheckSegment(const std::string& file, const Commit& commit, const SegmentInfo& segment) {
-  const auto refuse = [&](Grade grade, const std::string& expected, const std::string& found) {
-    Refuse(grade, file, 0, "segment " + segment.name + " with " + expected, found);
+  const auto refuse = [&](const std::string& expected, const std::string& found) {
+    Refuse(Grade::kDamaged, file, 0, "segment " + segment.name + " with " + expected, found);
   };
   const std::optional<int64_t> number = NumberOf(segment.name);
   if (!number.has_value() || *number >= commit.counter) {
-    refuse(Grade::kDamaged, "a number below the next one's, " + std::to_string(commit.counter),
+    refuse("a number below the next one's, " + std::to_string(commit.counter),
            "that the next segment could take its place");
   }
-  if (segment.store_offset < SegmentInfo::kOwnStore) {
-    refuse(Grade::kUnsafe, "a place in its document store", std::to_string(segment.store_offset));
-  }
   if (segment.deleted_count < SegmentInfo::kNotCounted || segment.deleted_count > segment.document_count) {
-    refuse(Grade::kDamaged, "a count of deleted documents up to " + std::to_string(segment.document_count),
+    refuse("a count of deleted documents up to " + std::to_string(segment.document_count),
            std::to_string(segment.deleted_count));
   }
   if (segment.deletions_generation == SegmentInfo::kNoDeletions && segment.deleted_count > 0) {
-    refuse(Grade::kDamaged, "no deleted documents, having no file of them",
-           std::to_string(segment.deleted_count));
-  }
-  if (!segment.norm_generations.has_value()) return;
-  for (const int64_t generation : *segment.norm_generations) {
-    if (generation < SegmentInfo::kNoOwnNorms)
-      refuse(Grade::kDamaged, "generations of norms", std::to_string(generation));
+    refuse("no deleted documents, having no file of them", std::to_string(segment.deleted_count));
   }
 }
 
@@ -107,16 +73,10 @@ Commit FindCommit(const format::Folder& folder) {
   const int64_t hinted = format::HintedGeneration(folder);
   Commit found;
   try {
-    format::UseNewestCommit(folder, [&](Commit commit) { found = std::move(commit); });
-    RequireReadable(folder, found);
+    found = format::ReadNewestCommit(folder);
   } catch (const IndexIoError& error) {
-    if (error.path() == folder.path()) throw;
-    format::RethrowOpening(error);
-  } catch (const IndexDamagedError&) {
-    throw;
-  } catch (const IndexError&) {
-    RefuseTooLarge(folder, hinted);
-    throw;
+    if (error.path() == folder.path() || !format::IsAbsenceError(error)) throw;
+    throw format::AsMissing(error);
   }
   if (hinted > found.generation && IsCommitLost(folder, hinted)) {
     Refuse(Grade::kDamaged, format::JoinPath(folder.path(), std::string(format::kSegmentsGen)), 4,
@@ -129,19 +89,7 @@ Commit FindCommit(const format::Folder& folder) {
 void CheckCommit(const format::Folder& folder, const Commit& commit) {
   const std::string file = CommitPath(folder, commit);
   RequireEqual(Grade::kDamaged, file, commit.end, "the commit to end at", commit.end, commit.size);
-  std::set<std::string> names;
-  int64_t documents = 0;
-  for (const SegmentInfo& segment : commit.segments) {
-    CheckSegment(file, commit, segment);
-    if (!names.insert(segment.name).second) {
-      Refuse(Grade::kDamaged, file, 0, "each segment once", segment.name + " twice");
-    }
-    documents += segment.document_count;
-  }
-  if (documents > std::numeric_limits<int32_t>::max()) {
-    Refuse(Grade::kUnsafe, file, 0, "documents up to " + std::to_string(std::numeric_limits<int32_t>::max()),
-           std::to_string(documents));
-  }
+  for (const SegmentInfo& segment : commit.segments) CheckSegment(file, commit, segment);
 }
 
 }  // namespace vantrel::elastic::health

@@ -7,11 +7,12 @@
 
 namespace vantrel::elastic::health {
 
-// The newest commit that can be read, as the index library would find it. Throws Mismatch, IndexDamagedError and
-// FileMissingError where there is none, or one was lost; IndexIoError where the system fails.
+// The newest commit, as every reader finds it (commit.h). Throws Mismatch, IndexDamagedError and FileMissingError where
+// there is none, or one was lost; IndexIoError where the system refuses something.
 format::Commit FindCommit(const format::Folder& folder);
 
-// Checks what a commit says in itself, before the files of its segments. Throws Mismatch.
+// Checks what a commit says in itself, before the files of its segments, beyond what ReadCommit demands. Throws
+// Mismatch.
 void CheckCommit(const format::Folder& folder, const format::Commit& commit);
 
 }  // namespace vantrel::elastic::health

@@ -12,9 +12,10 @@
 #include "elastic/format/file_names.h"
 #include "elastic/format/manifest.h"
 #include "elastic/format/opening_error.h"
+#include "elastic/format/watched_folder.h"
 #include "elastic/health/commit_check.h"
 #include "elastic/health/digest_check.h"
-#include "elastic/health/metered_folder.h"
+#include "elastic/health/meter.h"
 #include "elastic/health/mismatch.h"
 #include "elastic/health/parallel.h"
 #include "elastic/health/segment_check.h"
@@ -27,8 +28,15 @@ namespace {
 // limit of open files. Those that are missing count: why they are takes memory.
 constexpr size_t kMostFiles = 512;
 
+// How much memory the names in those segments may take before no more of them are opened.
+constexpr uint64_t kMostNamesMemory = uint64_t{8} << 20;
+
 // How many newer commits are taken up before the index is given up as one that does not hold still.
 constexpr int kMostCommits = 100;
+
+// Findings beyond so many are kept only where they are unsafe, since a repair needs to know of those. A commit of missing
+// segments would have hundreds of thousands.
+constexpr size_t kMostFindings = 20'000;
 
 // Gathers findings from several threads.
 class Findings {
@@ -80,6 +88,7 @@ class Findings {
   }
 
   void AddLocked(const std::string& segment, HealthFinding finding) {
+    if (all_.size() >= kMostFindings && finding.grade == Grade::kDamaged) return;
     finding.segment = segment;
     all_.push_back(std::move(finding));
   }
@@ -102,7 +111,8 @@ class CommitRun {
         meter_(meter),
         manifest_(FindManifest(folder)),
         metered_(folder, meter),
-        folder_(metered_, manifest_) {}
+        folder_(metered_, manifest_),
+        shared_(folder_) {}
 
   void Run() {
     findings_.Run("", [this] { CheckCommit(folder_, commit_); });
@@ -115,9 +125,14 @@ class CommitRun {
     meter_.SetSegments(commit_.segments.size());
     for (size_t next = 0; next < commit_.segments.size();) {
       std::vector<std::unique_ptr<SegmentCheck>> batch;
-      for (size_t files = 0; next < commit_.segments.size() && files < kMostFiles; ++next) {
-        batch.push_back(std::make_unique<SegmentCheck>(folder_, commit_.segments[next]));
-        files += batch.back()->files().files_tried();
+      size_t files = 0;
+      uint64_t names = 0;
+      for (; next < commit_.segments.size() && files < kMostFiles && names < kMostNamesMemory; ++next) {
+        SegmentCheck& segment =
+            *batch.emplace_back(std::make_unique<SegmentCheck>(folder_, commit_.segments[next], shared_));
+        findings_.Run(segment.files().info().name, [&] { segment.ReadFields(); });
+        files += segment.files().files_tried();
+        names += segment.NamesMemory();
         meter_.AddSegmentOpened();
       }
       RunBatch(batch);
@@ -153,7 +168,6 @@ class CommitRun {
   void RunBatch(const std::vector<std::unique_ptr<SegmentCheck>>& batch) {
     std::vector<SegmentCheck::Part> parts;
     for (const auto& segment : batch) {
-      findings_.Run(segment->files().info().name, [&] { segment->ReadFields(); });
       std::vector<SegmentCheck::Part> more = segment->Parts();
       std::move(more.begin(), more.end(), std::back_inserter(parts));
     }
@@ -198,15 +212,16 @@ class CommitRun {
   Findings findings_;
   HealthReport::Manifest manifest_use_ = HealthReport::Manifest::kNone;
   format::Manifest manifest_;
-  MeteredFolder metered_;
+  format::WatchedFolder metered_;
   DigestCheckedFolder folder_;
+  format::SharedFiles shared_;
 };
 
 }  // namespace
 
 HealthReport CheckFolder(const format::Folder& folder, const HealthOptions& options) {
   Meter meter(options.progress);
-  const MeteredFolder metered(folder, meter);
+  const format::WatchedFolder metered(folder, meter);
   for (int left = kMostCommits;; --left) {
     HealthReport report;
     format::Commit commit;
@@ -227,7 +242,7 @@ HealthReport CheckFolder(const format::Folder& folder, const HealthOptions& opti
     report.manifest = run.manifest_use();
     report.findings = run.findings().Take();
     report.files = meter.TakeFiles();
-    meter.Tell();
+    meter.Report();
     // Not by the names alone: a newer one that is incomplete does not take over.
     format::Commit newest;
     if (run.findings().file_is_missing()) finding_it.Run("", [&] { newest = FindCommit(metered); });

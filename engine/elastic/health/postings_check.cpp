@@ -11,7 +11,7 @@ namespace {
 
 constexpr size_t kBufferSize = size_t{128} << 10;
 
-// What a skip entry takes, with what it costs in higher levels; some take more.
+// The usual size of a skip entry with its share of higher levels. Longer skip data are read by themselves.
 constexpr size_t kUsualSkipEntry = 8;
 
 }  // namespace
@@ -42,15 +42,16 @@ void PostingsCheck::Check(const format::TermCursor& dictionary, const format::Fi
   if (has_skips_) CheckSkipEnds(dictionary);
 }
 
-// Most terms lie in the buffer as a whole, so that their skip data need not be read for themselves.
+// Most terms fit the buffer of the postings together with their skip data, which are then read from there.
 void PostingsCheck::SeekSkips(const format::TermInfo& term, bool has_payloads) {
   const uint64_t pointer = term.postings_pointer + term.skip_offset;
   const auto entries = static_cast<uint64_t>(term.document_frequency / skip_interval_);
   const uint64_t length = term.skip_offset + entries * kUsualSkipEntry + format::kScanStep;
   if (length > kBufferSize) return skips_.Seek(pointer, term.document_frequency, has_payloads);
   postings_.ReadAhead(length);
-  skips_.SeekBorrowing(postings_.reader(), pointer, term.document_frequency, has_payloads);
+  // Noted first: what throws leaves readers that have borrowed.
   borrowed_fill_ = postings_.reader().fills();
+  skips_.SeekBorrowing(postings_.reader(), pointer, term.document_frequency, has_payloads);
 }
 
 void PostingsCheck::GiveSkipsBack() {

@@ -53,7 +53,8 @@ class PostingsCheck {
   bool has_positions_ = false;
   bool has_skips_ = false;
   bool must_state_length_ = false;
-  std::optional<uint64_t> borrowed_fill_;  // of the postings' buffer, while the skip data are read from there
+  std::optional<uint64_t>
+      borrowed_fill_;  // fills() of the postings' reader while the skip data borrow its buffer
 
   uint64_t postings_end_ = 0;
   uint64_t positions_end_ = 0;

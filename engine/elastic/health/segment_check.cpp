@@ -52,9 +52,17 @@ bool IsKnownPart(std::string_view extension, bool is_store) {
 
 }  // namespace
 
-SegmentCheck::SegmentCheck(const format::Folder& folder, const SegmentInfo& info) : files_(folder, info) {}
+SegmentCheck::SegmentCheck(const format::Folder& folder, const SegmentInfo& info, format::SharedFiles& shared)
+    : files_(folder, info, shared) {}
 
 void SegmentCheck::ReadFields() { fields_ = format::ReadFieldInfos(files_.Open(".fnm")); }
+
+uint64_t SegmentCheck::NamesMemory() const {
+  uint64_t bytes = files_.NamesMemory();
+  if (!fields_.has_value()) return bytes;
+  for (const FieldInfo& field : *fields_) bytes += sizeof(FieldInfo) + field.name.capacity();
+  return bytes;
+}
 
 void SegmentCheck::AddPart(std::vector<Part>& parts, std::initializer_list<const char*> extensions,
                            void (SegmentCheck::*check)() const) {
@@ -105,7 +113,7 @@ void SegmentCheck::CheckCompounds() const {
     RequireEqual(Grade::kDamaged, file, compound.file->table_end(), "the first sub-file at",
                  compound.file->table_end(), compound.file->first_offset());
     const bool is_store = file.ends_with(".cfx");
-    for (const std::string& name : compound.file->Names()) {
+    for (const auto& [name, part] : compound.file->parts()) {
       if (name.starts_with(compound.segment) && IsKnownPart(name.substr(compound.segment.size()), is_store))
         continue;
       Refuse(Grade::kDamaged, file, 0, "only sub-files of segment " + compound.segment, format::Quoted(name));

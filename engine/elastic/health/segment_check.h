@@ -26,8 +26,9 @@ class SegmentCheck {
     std::function<void()> run;
   };
 
-  // Opens the segment's files and reads nothing yet but the tables of compound files. Throws where the system fails.
-  SegmentCheck(const format::Folder& folder, const format::SegmentInfo& info);
+  // Opens the segment's files and reads nothing yet but the tables of compound files; `shared` is as for WholeSegment.
+  // Throws where the system fails.
+  SegmentCheck(const format::Folder& folder, const format::SegmentInfo& info, format::SharedFiles& shared);
   SegmentCheck(const SegmentCheck&) = delete;
   SegmentCheck& operator=(const SegmentCheck&) = delete;
 
@@ -38,6 +39,9 @@ class SegmentCheck {
   std::vector<Part> Parts();
 
   const format::WholeSegment& files() const { return files_; }
+
+  // About how much memory the names of its fields and sub-files take, in bytes: at most 20 MiB.
+  uint64_t NamesMemory() const;
 
  private:
   void CheckFields() const;

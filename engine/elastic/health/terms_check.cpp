@@ -1,8 +1,9 @@
 #include "elastic/health/terms_check.h"
 
+#include <algorithm>
+
 #include "elastic/format/quoted.h"
 #include "elastic/format/skip_list.h"
-#include "elastic/format/text.h"
 #include "elastic/health/mismatch.h"
 
 namespace vantrel::elastic::health {
@@ -15,6 +16,8 @@ TermsCheck::TermsCheck(const TermSources& sources, const std::vector<format::Fie
                   static_cast<uint32_t>(fields.size()), document_count),
       index_(sources.index, format::TermCursor::File::kIndex, static_cast<uint32_t>(fields.size()),
              document_count),
+      field_order_(fields),
+      order_(dictionary_.is_utf8()),
       postings_(sources.postings, sources.positions, document_count, dictionary_) {
   CheckHeaders();
 }
@@ -35,8 +38,10 @@ void TermsCheck::CheckHeaders() const {
 }
 
 void TermsCheck::Run() {
-  for (number_ = 0; dictionary_.Next(); ++number_) {
-    if (number_ % static_cast<uint64_t>(dictionary_.index_interval()) == 0) CheckIndexEntry();
+  const auto interval = static_cast<uint64_t>(dictionary_.index_interval());
+  for (number_ = 0;; ++number_) {
+    if (number_ % interval == 0 && number_ < dictionary_.count()) CheckIndexEntry();
+    if (!dictionary_.Next()) break;
     CheckTerm();
   }
   // Past its last entry the cursor looks whether the file ends there, too.
@@ -53,57 +58,57 @@ void TermsCheck::CheckTerm() {
            "term of a field that is indexed and has a name",
            "field " + format::Quoted(field.name) + (field.indexed ? "" : ", which is not indexed"));
   }
-  CheckOrder(field);
+  CheckText(field);
   CheckPlace();
   postings_.Check(dictionary_, field);
-
-  at_first_ = false;
-  field_before_ = dictionary_.field();
-  text_before_.assign(dictionary_.text());
-  info_before_ = dictionary_.info();
 }
 
-void TermsCheck::CheckOrder(const format::FieldInfo& field) const {
-  const std::string_view text = dictionary_.text();
-  if (!format::IsKeptText(text)) {
+void TermsCheck::CheckText(const format::FieldInfo& field) {
+  const format::TermText& text = dictionary_.term_text();
+  same_text_ = std::min(same_text_, text.same_length());
+  if (!dictionary_.HasKeptText()) {
     Refuse(Grade::kUnsafe, dictionary_.name(), dictionary_.offset(), "text that the index library keeps",
-           format::Quoted(text));
+           format::Quoted(text.text()));
   }
-  if (at_first_) return;
-  const std::string& field_before = fields_[static_cast<size_t>(field_before_)].name;
-  const bool ascends = dictionary_.field() == field_before_ ? text > text_before_ : field.name > field_before;
-  if (ascends) return;
-  Refuse(Grade::kUnsafe, dictionary_.name(), dictionary_.offset(),
-         "term after " + format::Quoted(text_before_) + " of field " + format::Quoted(field_before),
-         format::Quoted(text) + " of field " + format::Quoted(field.name));
+  const format::TermOrders ascends_by =
+      dictionary_.field() == dictionary_.field_before()
+          ? text.ascends_by()
+          : field_order_.OrdersBefore(dictionary_.field_before(), dictionary_.field());
+  if (order_.Take(ascends_by)) return;
+  Refuse(Grade::kUnsafe, dictionary_.name(), dictionary_.offset(), "term after the one before it",
+         format::Quoted(text.text()) + " of field " + format::Quoted(field.name));
 }
 
-// Each entry of the index stands before a block of terms: it repeats the last term of the block before, and tells
-// where the block begins.
+// Each entry of the index stands before a block of terms: it repeats the last term of the block before, at which the
+// dictionary's cursor is, and tells where the block begins.
 void TermsCheck::CheckIndexEntry() {
   if (!index_.Next()) {
     Refuse(Grade::kUnsafe, index_.name(), index_.offset(), "an entry for term " + std::to_string(number_),
            "the end of the index");
   }
   const std::string& file = index_.name();
-  RequireEqual(Grade::kUnsafe, file, index_.offset(), "pointer into the dictionary", dictionary_.offset(),
+  RequireEqual(Grade::kUnsafe, file, index_.offset(), "pointer into the dictionary", dictionary_.end_offset(),
                index_.dictionary_pointer());
+  const format::TermInfo& term = dictionary_.info();
   const format::TermInfo& info = index_.info();
-  RequireEqual(Grade::kUnsafe, file, index_.offset(), "postings pointer", info_before_.postings_pointer,
+  RequireEqual(Grade::kUnsafe, file, index_.offset(), "postings pointer", term.postings_pointer,
                info.postings_pointer);
-  RequireEqual(Grade::kUnsafe, file, index_.offset(), "positions pointer", info_before_.positions_pointer,
+  RequireEqual(Grade::kUnsafe, file, index_.offset(), "positions pointer", term.positions_pointer,
                info.positions_pointer);
   RequireEqual(Grade::kUnsafe, file, index_.offset(), "document frequency",
-               static_cast<uint64_t>(info_before_.document_frequency),
+               static_cast<uint64_t>(term.document_frequency),
                static_cast<uint64_t>(info.document_frequency));
   if (dictionary_.index_repeats_skips()) {
-    RequireEqual(Grade::kUnsafe, file, index_.offset(), "offset of skip data", info_before_.skip_offset,
+    RequireEqual(Grade::kUnsafe, file, index_.offset(), "offset of skip data", term.skip_offset,
                  info.skip_offset);
   }
-  const bool same_field = index_.field() == field_before_ || at_first_;
-  if (same_field && index_.text() == text_before_) return;
+  const std::string_view text = dictionary_.text();
+  same_text_ =
+      format::SameLength(text, index_.text(), std::min(same_text_, index_.term_text().same_length()));
+  const bool same_field = index_.field() == dictionary_.field() || number_ == 0;
+  if (same_field && same_text_ == text.size() && same_text_ == index_.text().size()) return;
   Refuse(Grade::kUnsafe, file, index_.offset(),
-         format::Quoted(text_before_) + " of field number " + std::to_string(field_before_),
+         format::Quoted(text) + " of field number " + std::to_string(dictionary_.field()),
          format::Quoted(index_.text()) + " of field number " + std::to_string(index_.field()));
 }
 

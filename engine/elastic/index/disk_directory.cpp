@@ -12,6 +12,7 @@
 #include <span>
 #include <utility>
 
+#include "elastic/format/commit.h"
 #include "elastic/format/file_descriptor.h"
 #include "elastic/format/file_names.h"
 #include "elastic/format/folder.h"
@@ -151,9 +152,25 @@ void DiskDirectory::NoteReadProblem(const IndexError& error) {
   read_problem_ = AsToldByLibrary(error);
   const auto* const problem = dynamic_cast<const IndexIoError*>(&error);
   if (problem == nullptr || format::IsAbsenceError(*problem)) return;
+  if (problem->path() != format::JoinPath(path_, std::string(format::kSegmentsGen))) {
+    if (!refusal_.has_value()) refusal_ = *problem;
+    has_failed_reading_ = true;
+  }
   constexpr size_t kKept = 16;
   if (io_problems_.size() == kKept) io_problems_.pop_front();
   io_problems_.push_back(*problem);
+}
+
+std::optional<IndexIoError> DiskDirectory::refusal() const {
+  const std::lock_guard lock(read_problem_mutex_);
+  return refusal_;
+}
+
+std::shared_ptr<const format::ByteSource> DiskDirectory::Open(const std::string& name) const {
+  if (guard_ != nullptr) return guard_->Open(name);
+  auto file = format::DiskFolder(path_).Open(name);
+  if (const auto generation = format::CommitGeneration(name)) format::ReadCommit(file, *generation);
+  return file;
 }
 
 Lucene::IndexOutputPtr DiskDirectory::createOutput(const Lucene::String& name) {
@@ -176,9 +193,9 @@ Lucene::IndexInputPtr DiskDirectory::openInput(const Lucene::String& name, int32
   ensureOpen();
   const std::string own_name = StringUtils::toUTF8(name);
   try {
-    return newLucene<DiskInput>(
-        boost::static_pointer_cast<DiskDirectory>(shared_from_this()),
-        guard_ != nullptr ? guard_->Open(own_name) : format::DiskFolder(path_).Open(own_name), buffer_size);
+    if (const auto refused = refusal(); refused.has_value()) throw IndexIoError(*refused);
+    return newLucene<DiskInput>(boost::static_pointer_cast<DiskDirectory>(shared_from_this()), Open(own_name),
+                                buffer_size);
   } catch (const IndexError& error) {
     NoteReadProblem(error);
     boost::throw_exception(Lucene::FileNotFoundException(StringUtils::toUnicode(error.what())));

@@ -8,6 +8,7 @@
 #include <set>
 #include <string>
 
+#include "elastic/format/byte_source.h"
 #include "elastic/index/byte_path_directory.h"
 #include "elastic/index/library_guard.h"
 #include "vantrel/elastic/index_error.h"
@@ -24,7 +25,10 @@ namespace vantrel::elastic {
 // - It never syncs the folder, so that a new file's name could be lost with the power. Here a commit's folder
 //   is synced with it, before the library deletes the files of the commit before.
 // - It reads endlessly where the medium fails; here that is an error that names the file.
-// - It takes what it reads on trust. Here a guard, if there is one, has files verified.
+// - It takes what it reads on trust. Here a guard, if there is one, has files verified, and a commit's own file is
+//   handed out only where it can be decoded.
+// - Where the newest commit cannot be opened, it takes the one before, whatever the reason. Here nothing is opened any
+//   more once the system has refused to open or to read a file, but for segments.gen, which is only a hint.
 //
 // Exceptions are the library's own (Lucene::IOException), as it tidies up after no other. For one thread at a
 // time, but for openInput and what comes from it.
@@ -68,6 +72,8 @@ class DiskDirectory : public BytePathDirectory {
 
  private:
   void NoteReadProblem(const IndexError& error);
+  std::optional<IndexIoError> refusal() const;
+  std::shared_ptr<const format::ByteSource> Open(const std::string& name) const;
 
   std::string path_;
   // May be shared with other directories of the same folder; may be empty.
@@ -75,6 +81,7 @@ class DiskDirectory : public BytePathDirectory {
   std::set<std::string> uncommitted_;  // names created since the last commit
   std::optional<IndexIoError> failure_;
   mutable std::mutex read_problem_mutex_;
+  std::optional<IndexIoError> refusal_;   // the first, that of segments.gen left out
   std::string read_problem_;              // the newest, as the library tells it
   std::deque<IndexIoError> io_problems_;  // the newest that are the system's: each thread may meet one
   std::atomic<bool> has_failed_reading_ = false;

@@ -99,9 +99,10 @@ void LibraryGuard::AdmitUnknownSegments(const format::Folder& folder, const form
   format::Commit unknown = commit;
   unknown.segments.clear();
   Identities files;
+  format::SharedFiles shared(folder);
   for (const format::SegmentInfo& segment : commit.segments) {
     // As they are before the check: who changes one meanwhile makes it unknown.
-    Identities of_segment = IdentifyAll(format::FilesOf(folder, segment));
+    Identities of_segment = IdentifyAll(format::FilesOf(folder, segment, shared));
     if (!Knows(of_segment)) unknown.segments.push_back(segment);
     files.merge(of_segment);
   }

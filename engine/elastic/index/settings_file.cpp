@@ -21,7 +21,7 @@
 namespace vantrel::elastic {
 namespace {
 
-constexpr int kVersion = 1;
+constexpr int kSettingsVersion = 1;
 constexpr uint64_t kLargestFile = uint64_t{16} << 20;
 
 // One JSON object of the file. Members are taken one by one; what is left over at the end was unknown.
@@ -162,7 +162,7 @@ void CheckSettings(const std::string& folder, const IndexSettings& settings) {
 
 void WriteSettings(const std::string& folder, const IndexSettings& settings) {
   JsonValue root(Json::objectValue);
-  root["version"] = kVersion;
+  root["version"] = kSettingsVersion;
   root["compound_files"] = settings.compound_files;
   root["id_field"] = settings.id_field;
   root["fields"] = Json::arrayValue;
@@ -189,7 +189,7 @@ IndexSettings ReadSettings(const std::string& folder) {
   if (!root.fromString(ReadWholeFile(folder))) throw IndexError(path, "the settings are no JSON document");
   SettingsObject object(path, root, "settings file");
   const Json::Value& version = object.Take("version");
-  if (!version.isInt() || version.asInt() != kVersion) object.Refuse("is of an unknown version");
+  if (!version.isInt() || version.asInt() != kSettingsVersion) object.Refuse("is of an unknown version");
   IndexSettings settings;
   settings.compound_files = object.TakeBool("compound_files");
   settings.id_field = object.TakeString("id_field");

@@ -9,12 +9,12 @@
 namespace vantrel::elastic {
 namespace {
 
-constexpr auto kVersion = Lucene::LuceneVersion::LUCENE_30;
+constexpr auto kLibraryVersion = Lucene::LuceneVersion::LUCENE_30;
 constexpr int32_t kValueGap = 100;
 
 class TextAnalyzer : public Lucene::StandardAnalyzer {
  public:
-  TextAnalyzer() : StandardAnalyzer(kVersion, Lucene::HashSet<Lucene::String>::newInstance()) {
+  TextAnalyzer() : StandardAnalyzer(kLibraryVersion, Lucene::HashSet<Lucene::String>::newInstance()) {
     setMaxTokenLength(static_cast<int32_t>(kMostWordCharacters));
   }
 
@@ -37,8 +37,8 @@ Lucene::AnalyzerPtr NewTextAnalyzer() { return Lucene::newLucene<TextAnalyzer>()
 
 size_t FindTooLongWord(const std::wstring& text) {
   if (!HasLongRun(text)) return 0;
-  const auto words =
-      Lucene::newLucene<Lucene::StandardTokenizer>(kVersion, Lucene::newLucene<Lucene::StringReader>(text));
+  const auto words = Lucene::newLucene<Lucene::StandardTokenizer>(
+      kLibraryVersion, Lucene::newLucene<Lucene::StringReader>(text));
   words->setMaxTokenLength(std::numeric_limits<int32_t>::max());
   const auto word = words->getAttribute<Lucene::TermAttribute>();
   while (words->incrementToken()) {

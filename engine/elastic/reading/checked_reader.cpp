@@ -69,6 +69,9 @@ void CheckedReader::Open(const std::string& path) {
 }
 
 Lucene::TermPositionsPtr CheckedReader::Positions(int32_t document) const {
+  if (!opened_->term.has_value()) {
+    boost::throw_exception(Lucene::IllegalStateException(L"the reader was opened without a term"));
+  }
   RunCheck([&] { reading::CheckPositionsLookup(opened_->segments, *opened_->term, document); });
   return reader_->termPositions(term_);
 }

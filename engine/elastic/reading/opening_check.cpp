@@ -2,7 +2,6 @@
 
 #include <algorithm>
 #include <limits>
-#include <set>
 #include <utility>
 
 #include "elastic/format/byte_reader.h"
@@ -31,6 +30,10 @@ void ReadAlong(Check check) {
   }
 }
 
+// Of all segments together. The library takes about half a kibibyte for a field, and sixteen bytes for one of a name.
+constexpr uint64_t kMostNames = uint64_t{1} << 17;
+constexpr uint64_t kMostNameBytesOfAll = uint64_t{4} << 20;
+
 int32_t FirstInt(const std::shared_ptr<const format::ByteSource>& source) {
   return ByteReader(source, sizeof(int32_t)).ReadInt();
 }
@@ -43,19 +46,6 @@ void CheckHint(const std::shared_ptr<const format::ByteSource>& source) {
   const int64_t generation = reader.ReadLong();
   if (generation <= kNewest) return;
   reader.Damaged(4, "generation " + std::to_string(generation) + " is too large");
-}
-
-void CheckSegment(const std::string& file, const SegmentInfo& segment) {
-  const auto refuse = [&](const std::string& problem) {
-    throw IndexDamagedError(file, 0, "segment " + segment.name + " has " + problem);
-  };
-  if (segment.store_offset < SegmentInfo::kOwnStore) {
-    refuse("its documents at " + std::to_string(segment.store_offset) + " in the document store");
-  }
-  if (!segment.norm_generations.has_value()) return;
-  for (const int64_t generation : *segment.norm_generations) {
-    if (generation < SegmentInfo::kNoOwnNorms) refuse("norms of generation " + std::to_string(generation));
-  }
 }
 
 }  // namespace
@@ -87,7 +77,7 @@ void OpeningCheck::Check(const std::string& name, const Source& source) {
   if (extension == ".cfs") {
     CheckCompound(source);
   } else if (extension == ".cfx") {
-    ReadAlong([&] { current_->store_compound.emplace(source); });
+    ReadAlong([&] { CountSubFiles(current_->store_compound.emplace(source)); });
   } else if (extension == ".fnm") {
     ReadAlong([&] { CheckFields(source); });
   } else if (extension == ".tis") {
@@ -104,20 +94,9 @@ void OpeningCheck::Check(const std::string& name, const Source& source) {
 void OpeningCheck::CheckCommit(const Source& source, int64_t generation) {
   segments_.clear();
   current_ = nullptr;
+  names_ = name_bytes_ = 0;
   if (FirstInt(source) < format::kNewestCommitFormat) return;
   format::Commit commit = ReadCommit(source, generation, format::CommitChecksum::kPassOver);
-  std::set<std::string> names;
-  int64_t documents = 0;
-  for (const SegmentInfo& segment : commit.segments) {
-    CheckSegment(source->name(), segment);
-    documents += segment.document_count;
-    if (!names.insert(segment.name).second) {
-      throw IndexDamagedError(source->name(), 0, "segment " + segment.name + " is there twice");
-    }
-  }
-  if (documents > std::numeric_limits<int32_t>::max()) {
-    throw IndexDamagedError(source->name(), 0, std::to_string(documents) + " documents are too many");
-  }
   segments_.reserve(commit.segments.size());
   for (SegmentInfo& segment : commit.segments) segments_.push_back({.info = std::move(segment)});
 }
@@ -125,11 +104,24 @@ void OpeningCheck::CheckCommit(const Source& source, int64_t generation) {
 // The library opens the files within on its own.
 void OpeningCheck::CheckCompound(const Source& source) {
   ReadAlong([&] {
-    current_->compound.emplace(source);
+    CountSubFiles(current_->compound.emplace(source));
     if (const Source fields = current_->Core(".fnm")) CheckFields(fields);
     if (const Source dictionary = current_->Core(".tis")) CheckDictionary(dictionary);
     if (const Source index = current_->Core(".tii")) CheckTermsIndex(index);
   });
+}
+
+void OpeningCheck::CountSubFiles(const format::CompoundFile& compound) {
+  for (const auto& [name, part] : compound.parts()) CountName(compound.source().name(), name);
+}
+
+void OpeningCheck::CountName(const std::string& file, const std::string& name) {
+  name_bytes_ += name.size();
+  if (++names_ <= kMostNames && name_bytes_ <= kMostNameBytesOfAll) return;
+  throw IndexDamagedError(file, 0,
+                          "the segments up to this one have more than " + std::to_string(kMostNames) +
+                              " fields and sub-files, or names of more than " +
+                              std::to_string(kMostNameBytesOfAll) + " bytes");
 }
 
 void OpeningCheck::CheckFields(const Source& source) {
@@ -146,6 +138,7 @@ void OpeningCheck::CheckFields(const Source& source) {
   }
   // Terms of a field whose name the library loses are compared, and end, elsewhere than by the name in the file.
   for (const format::FieldInfo& field : current_->fields) {
+    CountName(source->name(), field.name);
     if (!format::IsKeptText(field.name)) {
       start.Damaged(field.offset,
                     "the index library cannot keep the field name " + format::Quoted(field.name));

@@ -1,5 +1,6 @@
 #pragma once
 
+#include <cstdint>
 #include <memory>
 #include <optional>
 #include <string>
@@ -15,7 +16,8 @@ namespace vantrel::elastic::reading {
 // over it, and deleted documents. Nothing else is read then.
 //
 // Refused is what the library could crash on, run astray on or take gigabytes for, and what contradicts itself, such as
-// deleted documents counted wrongly. Where the library finds out by itself (a version that is too new, a wrong
+// deleted documents counted wrongly; also more than 131,072 fields and sub-files in all segments together, and names of
+// more than 4 MiB, all of which the library keeps in memory, so that opening takes less than 128 MiB. Where the library finds out by itself (a version that is too new, a wrong
 // checksum, a file that is too short, a missing one), it is left to it. For one thread at a time.
 class OpeningCheck {
  public:
@@ -36,11 +38,15 @@ class OpeningCheck {
   void CheckDictionary(const Source& source) const;
   void CheckTermsIndex(const Source& source);
   void CheckCompound(const Source& source);
+  void CountSubFiles(const format::CompoundFile& compound);
+  void CountName(const std::string& file, const std::string& name);
   OpenedSegment* FindSegment(const std::string& name);
 
   std::optional<WantedTerm> term_;
   std::vector<OpenedSegment> segments_;
   OpenedSegment* current_ = nullptr;  // the one that is being opened
+  uint64_t names_ = 0;                // of fields and sub-files, in all segments so far
+  uint64_t name_bytes_ = 0;
 };
 
 }  // namespace vantrel::elastic::reading

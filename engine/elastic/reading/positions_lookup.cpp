@@ -6,6 +6,7 @@
 #include <string>
 
 #include "elastic/format/byte_reader.h"
+#include "elastic/format/dictionary_walk.h"
 #include "elastic/format/positions.h"
 #include "elastic/format/postings.h"
 #include "elastic/format/quoted.h"
@@ -57,21 +58,40 @@ class SegmentLookup {
     if (!segment_.place.has_value()) {
       throw IndexDamagedError(segment_.Core(".tii")->name(), 0, "no entry stands before all terms");
     }
-    const format::TermPlace& place = segment_.place->place;
+    CheckWay();
     // An entry of the index repeats a term of the dictionary; where it is the wanted one, the library has it already.
-    const int order =
-        CompareTerms(segment_.fields, place.field,
-                     dictionary_.is_utf8() ? place.text : format::FromUtf16(place.units), term_);
-    if (order == 0) return Indexed(place.info);
-    uint64_t walked = segment_.place->number * static_cast<uint64_t>(dictionary_.index_interval());
-    if (order > 0 || walked >= dictionary_.count()) return std::nullopt;
+    const format::TermPlace& place = segment_.place->place;
+    if (place.field >= 0 && segment_.fields[static_cast<size_t>(place.field)].name == term_.field &&
+        (dictionary_.is_utf8() ? place.text.bytes : format::FromUtf16(place.text.units)) == term_.text) {
+      return Indexed(place.info);
+    }
+    const uint64_t walked = segment_.place->number * static_cast<uint64_t>(dictionary_.index_interval());
+    if (walked >= dictionary_.count()) return std::nullopt;
     dictionary_.Resume(place, walked);
-    for (; walked < dictionary_.count() && dictionary_.Next(); ++walked) {
-      const std::string_view text = dictionary_.text();
-      if (!format::IsKeptText(text)) {
-        dictionary_.Damaged("term " + format::Quoted(text) + " is no text that can be kept");
+    return FindFurtherOn(walked);
+  }
+
+  // A wrong bit in the index over the dictionary could lead past the term, which would then seem not to be there.
+  void CheckWay() const {
+    try {
+      format::DictionaryWalk walk(
+          segment_.Core(".tis"), segment_.Core(".tii"), segment_.fields, segment_.info.document_count,
+          {.kind = format::TermSelection::Kind::kExact, .field = term_.field, .text = term_.text});
+      while (walk.Next()) {
       }
-      const int next = CompareTerms(segment_.fields, dictionary_.field(), text, term_);
+    } catch (const format::EndOfFileError& error) {
+      // The library may not come by there.
+      throw IndexDamagedError(error.path(), error.offset(), "a term goes on past the end of the file");
+    }
+  }
+
+  std::optional<TermInfo> FindFurtherOn(uint64_t walked) {
+    TermComparison comparison(segment_.fields, term_);
+    for (; walked < dictionary_.count() && dictionary_.Next(); ++walked) {
+      if (!dictionary_.HasKeptText()) {
+        dictionary_.Damaged("term " + format::Quoted(dictionary_.text()) + " is no text that can be kept");
+      }
+      const int next = comparison.Compare(dictionary_);
       if (next == 0) return Indexed(dictionary_.info());
       if (next > 0) break;
     }

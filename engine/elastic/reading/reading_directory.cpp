@@ -2,6 +2,8 @@
 
 #include <utility>
 
+#include "elastic/format/file_names.h"
+#include "elastic/format/opening_error.h"
 #include "elastic/reading/library_error.h"
 #include "elastic/reading/source_input.h"
 
@@ -17,10 +19,12 @@ Lucene::IndexInputPtr ReadingDirectory::openInput(const Lucene::String& name) {
 Lucene::IndexInputPtr ReadingDirectory::openInput(const Lucene::String& name, int32_t /*buffer_size*/) {
   ensureOpen();
   const std::string own_name = Lucene::StringUtils::toUTF8(name);
+  if (refusal_.has_value()) ThrowAsNotFound(*refusal_);
   const auto source = Open(own_name);
   try {
     check_.Check(own_name, source);
   } catch (const IndexError& error) {
+    NoteRefusal(own_name, error);
     ThrowAsLibrary(error);
   }
   return Lucene::newLucene<SourceInput>(source);
@@ -31,8 +35,15 @@ std::shared_ptr<const format::ByteSource> ReadingDirectory::Open(const std::stri
     if (!folder_.has_value()) folder_.emplace(path_);
     return folder_->Open(name);
   } catch (const IndexError& error) {
+    NoteRefusal(name, error);
     ThrowAsNotFound(error);
   }
+}
+
+void ReadingDirectory::NoteRefusal(const std::string& name, const IndexError& error) {
+  const auto* const problem = dynamic_cast<const IndexIoError*>(&error);
+  if (problem == nullptr || format::IsAbsenceError(*problem) || name == format::kSegmentsGen) return;
+  refusal_ = *problem;
 }
 
 }  // namespace vantrel::elastic::reading

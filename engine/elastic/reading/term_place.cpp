@@ -3,8 +3,7 @@
 #include <algorithm>
 
 #include "elastic/format/quoted.h"
-#include "elastic/format/term_cursor.h"
-#include "elastic/format/text.h"
+#include "elastic/format/term_order.h"
 
 namespace vantrel::elastic::reading {
 namespace {
@@ -22,7 +21,7 @@ class IndexWalk {
   bool Next() {
     if (walked_ == cursor_.count() || !cursor_.Next()) return false;
     ++walked_;
-    if (!format::IsKeptText(cursor_.text())) {
+    if (!cursor_.HasKeptText()) {
       cursor_.Damaged("term " + format::Quoted(cursor_.text()) + " is no text that can be kept");
     }
     return true;
@@ -37,38 +36,43 @@ class IndexWalk {
 
 }  // namespace
 
-int CompareTerms(const std::vector<format::FieldInfo>& fields, int32_t field, std::string_view text,
-                 const WantedTerm& other) {
-  if (field < 0) return -1;
-  const int by_field = fields[static_cast<size_t>(field)].name.compare(other.field);
-  return by_field != 0 ? by_field : text.compare(other.text);
+int TermComparison::Compare(const TermCursor& cursor) {
+  const std::string_view text = cursor.text();
+  same_ = format::SameLength(text, other_.text, std::min(same_, cursor.term_text().same_length()));
+  if (cursor.field() < 0) return -1;
+  const int by_field = fields_[static_cast<size_t>(cursor.field())].name.compare(other_.field);
+  return by_field != 0 ? by_field : text.substr(same_).compare(std::string_view(other_.text).substr(same_));
 }
 
 std::optional<LookupPlace> FindPlace(const std::shared_ptr<const format::ByteSource>& index,
                                      const std::vector<format::FieldInfo>& fields, int32_t document_count,
                                      const std::optional<WantedTerm>& term) {
   IndexWalk walk(index, fields, document_count);
+  if (!term.has_value()) {
+    while (walk.Next()) {
+    }
+    return std::nullopt;
+  }
+  TermComparison comparison(fields, *term);
   std::vector<bool> is_behind;
-  LookupPlace last;
+  uint64_t before = 0;  // so many entries come before all those that are behind the term
+  LookupPlace place;
   while (walk.Next()) {
-    if (!term.has_value()) continue;
-    const TermCursor& cursor = walk.cursor();
-    is_behind.push_back(CompareTerms(fields, cursor.field(), cursor.text(), *term) > 0);
-    if (is_behind.back()) continue;
-    last.number = is_behind.size() - 1;
-    cursor.CopyPlace(last.place);
+    is_behind.push_back(comparison.Compare(walk.cursor()) > 0);
+    if (before + 1 != is_behind.size() || is_behind.back()) continue;
+    ++before;
+    walk.cursor().UpdateCopy(place.place);
   }
   const auto end =
       std::partition_point(is_behind.begin(), is_behind.end(), [](bool behind) { return !behind; });
   if (end == is_behind.begin()) return std::nullopt;
-  const auto number = static_cast<uint64_t>(end - is_behind.begin()) - 1;
-  if (number == last.number) return last;
+  place.number = static_cast<uint64_t>(end - is_behind.begin()) - 1;
+  if (place.number + 1 == before) return place;
   // Out of order.
+  place.place = {};
   IndexWalk again(index, fields, document_count);
-  for (uint64_t i = 0; i <= number; ++i) again.Next();
-  last.number = number;
-  again.cursor().CopyPlace(last.place);
-  return last;
+  for (uint64_t i = 0; i <= place.number && again.Next(); ++i) again.cursor().UpdateCopy(place.place);
+  return place;
 }
 
 }  // namespace vantrel::elastic::reading

@@ -3,11 +3,11 @@
 #include <cstdint>
 #include <memory>
 #include <optional>
-#include <string_view>
 #include <vector>
 
 #include "elastic/format/byte_source.h"
 #include "elastic/format/field_infos.h"
+#include "elastic/format/term_cursor.h"
 #include "elastic/reading/opened_segment.h"
 
 namespace vantrel::elastic::reading {
@@ -19,9 +19,21 @@ std::optional<LookupPlace> FindPlace(const std::shared_ptr<const format::ByteSou
                                      const std::vector<format::FieldInfo>& fields, int32_t document_count,
                                      const std::optional<WantedTerm>& term);
 
-// Compares the term of a dictionary or its index with another one, in the dictionaries' order: by the names of the
-// fields, then by text. `field` is a number, or -1 for what stands before all fields.
-int CompareTerms(const std::vector<format::FieldInfo>& fields, int32_t field, std::string_view text,
-                 const WantedTerm& other);
+// Compares the terms of a dictionary or its index, one after the other, with another one, by the order in which the index
+// library looks for terms: by the names of the fields, then by code points. Takes time in proportion to what has changed
+// of their texts.
+class TermComparison {
+ public:
+  TermComparison(const std::vector<format::FieldInfo>& fields, const WantedTerm& other)
+      : fields_(fields), other_(other) {}
+
+  // To be called for each term in turn: below 0 where it comes before the other one, above 0 where it comes behind.
+  int Compare(const format::TermCursor& cursor);
+
+ private:
+  const std::vector<format::FieldInfo>& fields_;
+  const WantedTerm& other_;
+  size_t same_ = 0;  // how many leading bytes the last text and the other's have in common
+};
 
 }  // namespace vantrel::elastic::reading

@@ -19,7 +19,7 @@ namespace {
 constexpr rlim_t kMostMemory = rlim_t{2} << 30;
 
 // A sanitizer takes more address space than that for itself.
-#if defined(__SANITIZE_ADDRESS__) || defined(__SANITIZE_THREAD__)
+#ifdef QUORELASTIC_SANITIZED
 constexpr bool kLimitsMemory = false;
 #else
 constexpr bool kLimitsMemory = true;

@@ -16,11 +16,13 @@
 #include <set>
 #include <string>
 #include <utility>
+#include <vector>
 
 #include "elastic/format/commit.h"
 #include "elastic/format/folder.h"
 #include "elastic/index/manifest_keeper.h"
 #include "elastic/index/run_reading.h"
+#include "elastic/repair/blame.h"
 #include "elastic/repair/checked_directory.h"
 #include "elastic/repair/checker_trial.h"
 #include "vantrel/elastic/index_error.h"
@@ -97,18 +99,23 @@ UnsafeSegments FindUnsafeSegments(const std::string& path) {
 class Checker {
  public:
   explicit Checker(const std::string& path) : path_(path), commit_(ReadNewestCommit(path)) {
-    UnsafeSegments unsafe = FindUnsafeSegments(path);
-    condemned_ = std::move(unsafe.condemned);
-    directory_ = Lucene::newLucene<CheckedDirectory>(path_, condemned_);
+    const UnsafeSegments unsafe = FindUnsafeSegments(path);
     const std::function<void()> check = [this] {
       checker_ = Lucene::newLucene<Lucene::CheckIndex>(directory_);
       status_ = checker_->checkIndex();
     };
-    // Reading past the end of a table ends well in one memory and badly in another: so it is rehearsed in this one, and
-    // where that fails, segments are given up until it does not.
-    while (!unsafe.survived.empty() && !SurvivesTrial(path_, unsafe.index_bytes, check)) {
-      condemned_.insert(unsafe.survived.extract(unsafe.survived.begin()));
-      directory_ = Lucene::newLucene<CheckedDirectory>(path_, condemned_);
+    // Reading past the end of a table may crash or not, depending on what memory holds. So the check is rehearsed in a
+    // copy of this process, and where the copy does not survive, the segments to blame are condemned as well.
+    const auto survives = [&](const std::set<std::string>& without) {
+      Condemn(unsafe.condemned, without);
+      return SurvivesTrial(path_, unsafe.index_bytes, check);
+    };
+    Condemn(unsafe.condemned, {});
+    if (!unsafe.survived.empty() && !survives({})) {
+      // Once more, because the search has changed what memory holds.
+      if (!survives(FindBlame(LargestFirst(unsafe.survived), survives))) {
+        Condemn(unsafe.condemned, unsafe.survived);
+      }
     }
     RunReading(directory_, "cannot check the index", check);
     // What the system did not let it read would be dropped for that.
@@ -145,6 +152,24 @@ class Checker {
   }
 
  private:
+  void Condemn(std::set<std::string> segments, const std::set<std::string>& more) {
+    segments.insert(more.begin(), more.end());
+    condemned_ = std::move(segments);
+    directory_ = Lucene::newLucene<CheckedDirectory>(path_, condemned_);
+  }
+
+  // Those that hold the most documents are the last to be given up.
+  std::vector<std::string> LargestFirst(const std::set<std::string>& names) const {
+    std::vector<format::SegmentInfo> segments = commit_.segments;
+    std::erase_if(segments, [&](const auto& segment) { return !names.contains(segment.name); });
+    std::stable_sort(segments.begin(), segments.end(),
+                     [](const auto& left, const auto& right) { return CountLive(left) > CountLive(right); });
+    std::vector<std::string> sorted;
+    sorted.reserve(segments.size());
+    for (const format::SegmentInfo& segment : segments) sorted.push_back(segment.name);
+    return sorted;
+  }
+
   // As far as the commit tells.
   static uint64_t CountLive(const format::SegmentInfo& segment) {
     return static_cast<uint64_t>(std::max(segment.document_count - std::max(segment.deleted_count, 0), 0));

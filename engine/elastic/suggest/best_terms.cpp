@@ -4,25 +4,28 @@
 #include <string>
 #include <utility>
 
+#include "elastic/format/term_order.h"
+
 namespace vantrel::elastic {
 namespace {
 
-bool IsBetter(std::string_view left, uint64_t left_frequency, std::string_view right,
-              uint64_t right_frequency) {
-  return left_frequency != right_frequency ? left_frequency > right_frequency : left < right;
-}
-
 // As the order of a heap, it puts the worst on top.
 constexpr auto kBetter = [](const SuggestedTerm& left, const SuggestedTerm& right) {
-  return IsBetter(left.term, left.document_frequency, right.term, right.document_frequency);
+  return left.document_frequency != right.document_frequency
+             ? left.document_frequency > right.document_frequency
+             : left.term < right.term;
 };
 
 }  // namespace
 
-bool BestTerms::WouldTake(std::string_view term, uint64_t document_frequency) const {
+bool BestTerms::WouldTake(std::string_view term, uint64_t document_frequency, size_t same) {
+  same_as_worst_ = std::min(same_as_worst_, same);
   if (heap_.size() < most_) return true;
   if (heap_.empty()) return false;
-  return IsBetter(term, document_frequency, heap_.front().term, heap_.front().document_frequency);
+  const SuggestedTerm& worst = heap_.front();
+  if (document_frequency != worst.document_frequency) return document_frequency > worst.document_frequency;
+  same_as_worst_ = format::SameLength(term, worst.term, same_as_worst_);
+  return (format::OrdersBefore(term, worst.term, same_as_worst_) & format::kByCodePoints) != 0;
 }
 
 void BestTerms::Add(std::string_view term, uint64_t document_frequency) {
@@ -33,6 +36,7 @@ void BestTerms::Add(std::string_view term, uint64_t document_frequency) {
   }
   heap_.push_back({std::string(term), document_frequency});
   std::push_heap(heap_.begin(), heap_.end(), kBetter);
+  same_as_worst_ = 0;
 }
 
 std::vector<SuggestedTerm> BestTerms::Take() {

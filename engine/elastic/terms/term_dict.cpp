@@ -22,8 +22,6 @@ int TermDict::GetTermsCount() const {
   return static_cast<int>(count);
 }
 
-void TermDict::StartNear(const std::string& field, const std::string& text) { walk_->StartNear(field, text); }
-
 bool TermDict::Next() { return walk_->Next(); }
 
 Lucene::TermPtr TermDict::Term() const { return walk_->Term(); }

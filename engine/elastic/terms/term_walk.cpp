@@ -2,27 +2,13 @@
 
 #include <lucene++/LuceneHeaders.h>
 
+#include <algorithm>
 #include <exception>
 #include <utility>
 
 #include "elastic/format/text.h"
 
 namespace vantrel::elastic {
-
-LiveTermFilter::LiveTermFilter(const format::SegmentFiles& files)
-    : deletions_(files.deletions, files.info.document_count),
-      postings_(files.postings, files.info.document_count) {}
-
-bool LiveTermFilter::IsLive(const format::TermInfo& term, bool omits_frequencies,
-                            const std::function<void()>& on_posting) {
-  if (IsLiveAtFirstSight(term)) return true;
-  postings_.Seek(term, omits_frequencies);
-  while (postings_.Next()) {
-    if (on_posting) on_posting();
-    if (!deletions_.Contains(postings_.document())) return true;
-  }
-  return false;
-}
 
 TermWalk::TermWalk(format::SegmentFiles files, bool live_only)
     : files_(std::move(files)), fields_(format::ReadFieldInfos(files_.field_infos)), cursor_(OpenCursor()) {
@@ -53,26 +39,6 @@ uint64_t TermWalk::Count() {
     count_ = live;
   }
   return *count_;
-}
-
-// Entry k of the index tells where term k times the interval begins, and what stands before it. Dictionaries are
-// sorted by the fields' names, then by text, and UTF-8 sorts by its bytes as by its code points.
-void TermWalk::StartNear(const std::string& field, std::string_view text) {
-  if (files_.terms_index == nullptr || !cursor_.is_utf8()) return;
-  format::TermCursor index(files_.terms_index, format::TermCursor::File::kIndex,
-                           static_cast<uint32_t>(fields_.size()), files_.info.document_count);
-  const auto is_before = [&] {
-    if (index.field() < 0) return true;  // the first entry
-    const int order = fields_[static_cast<size_t>(index.field())].name.compare(field);
-    return order < 0 || (order == 0 && index.text() < text);
-  };
-  format::TermPlace place;
-  uint64_t entries = 0;
-  while (index.Next() && is_before()) {
-    index.CopyPlace(place);
-    ++entries;
-  }
-  if (entries > 0) cursor_.Resume(place, (entries - 1) * static_cast<uint64_t>(cursor_.index_interval()));
 }
 
 bool TermWalk::Next() {

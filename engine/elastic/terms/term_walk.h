@@ -1,40 +1,17 @@
 #pragma once
 
-#include <lucene++/Lucene.h>
-
-#include <functional>
-#include <memory>
 #include <optional>
 #include <string>
 #include <string_view>
 #include <vector>
 
-#include "elastic/format/deletions.h"
 #include "elastic/format/field_infos.h"
-#include "elastic/format/postings.h"
 #include "elastic/format/segment_files.h"
 #include "elastic/format/term_cursor.h"
+#include "elastic/terms/live_term_filter.h"
+#include "vantrel/elastic/library_types.h"
 
 namespace vantrel::elastic {
-
-// Tells whether a term still has a document that is not deleted.
-class LiveTermFilter {
- public:
-  explicit LiveTermFilter(const format::SegmentFiles& files);
-
-  // Not all of its documents can be deleted: most terms are settled so, without a look at their postings.
-  bool IsLiveAtFirstSight(const format::TermInfo& term) const {
-    return term.document_frequency > deletions_.count();
-  }
-
-  // `on_posting` is called for each posting that is read, if there is one; it may throw to end this.
-  bool IsLive(const format::TermInfo& term, bool omits_frequencies,
-              const std::function<void()>& on_posting = nullptr);
-
- private:
-  format::Deletions deletions_;
-  format::PostingsReader postings_;
-};
 
 // What stands behind a TermDict: one pass over a segment's dictionary, all terms or the live ones only.
 class TermWalk {
@@ -47,7 +24,6 @@ class TermWalk {
   // The number of terms from first to last; counted by a pass of its own where the header does not tell.
   uint64_t Count();
 
-  void StartNear(const std::string& field, std::string_view text);
   bool Next();
   Lucene::TermPtr Term();
 

@@ -16,8 +16,8 @@ using ::quorelastic::testing::TemporaryFolder;
 using ::quorelastic::testing::ThrowOutOfPageCache;
 using ::quorelastic::testing::WriteFile;
 
-constexpr uint64_t kMebibyte = uint64_t{1} << 20;
-constexpr uint64_t kFileSize = 12 * kMebibyte + 1000;  // more than is read at once
+constexpr uint64_t kMiB = uint64_t{1} << 20;
+constexpr uint64_t kFileSize = 12 * kMiB + 1000;  // more than is read at once
 
 class PageCacheTest : public ::testing::Test {
  protected:
@@ -50,8 +50,8 @@ TEST_F(PageCacheTest, HoldsEveryPageOnceItIsWarm) {
 }
 
 TEST_F(PageCacheTest, IsFilledNoFurtherThanThereIsRoomAndWithTheFirstThings) {
-  const PageCacheWarmUp result = BringIn(PlanWarmUp(folder_.path()), kFileSize + 2 * kMebibyte);
-  EXPECT_EQ(result.bytes, kFileSize + 2 * kMebibyte);
+  const PageCacheWarmUp result = BringIn(PlanWarmUp(folder_.path()), kFileSize + 2 * kMiB);
+  EXPECT_EQ(result.bytes, kFileSize + 2 * kMiB);
   EXPECT_FALSE(result.is_whole);
   EXPECT_TRUE(IsResident("_0.tii"));
   EXPECT_FALSE(IsResident("_0.frq"));
@@ -68,7 +68,7 @@ TEST_F(PageCacheTest, StaysAsItIsWhereThereIsNoRoom) {
 }
 
 TEST_F(PageCacheTest, TakesThePartsThatItIsTold) {
-  const PageCacheWarmUp result = BringIn({{Path("_0.fdt"), 2 * kMebibyte, 4096}}, kMebibyte);
+  const PageCacheWarmUp result = BringIn({{Path("_0.fdt"), 2 * kMiB, 4096}}, kMiB);
   EXPECT_EQ(result.bytes, 4096U);
   EXPECT_TRUE(result.is_whole);
   EXPECT_FALSE(IsCold("_0.fdt"));
@@ -78,10 +78,10 @@ TEST_F(PageCacheTest, TakesThePartsThatItIsTold) {
 TEST_F(PageCacheTest, FilesThatAreGoneOrShrankArePassedOver) {
   std::vector<Extent> plan = PlanWarmUp(folder_.path());
   std::filesystem::remove(Path("_0.tii"));
-  std::filesystem::resize_file(Path("_0.frq"), kMebibyte);
+  std::filesystem::resize_file(Path("_0.frq"), kMiB);
   plan.push_back({folder_.path(), 0, 4096});
-  const PageCacheWarmUp result = BringIn(plan, 1024 * kMebibyte);
-  EXPECT_EQ(result.bytes, kMebibyte + 2 * kFileSize);
+  const PageCacheWarmUp result = BringIn(plan, 1024 * kMiB);
+  EXPECT_EQ(result.bytes, kMiB + 2 * kFileSize);
   EXPECT_TRUE(result.is_whole);
   EXPECT_TRUE(IsResident("_0.fdt"));
 }

@@ -2,6 +2,10 @@
 
 #include <gtest/gtest.h>
 
+#include <initializer_list>
+#include <string>
+#include <vector>
+
 #include "support/byte_writer.h"
 #include "support/expect_damage.h"
 #include "support/memory_folder.h"
@@ -58,7 +62,9 @@ std::string CommitBytes(int format, const std::vector<SegmentBytes>& segments) {
   return out.bytes();
 }
 
-Commit Read(const std::string& bytes) { return ReadCommit(SourceOf(bytes), 5); }
+// The oldest layout stands in "segments" alone, the file of generation 0.
+Commit Read(const std::string& bytes, int64_t generation) { return ReadCommit(SourceOf(bytes), generation); }
+Commit Read(const std::string& bytes) { return Read(bytes, bytes[0] < 0 ? 5 : 0); }
 
 class CommitOfAnyFormatTest : public ::testing::TestWithParam<int> {};
 
@@ -67,11 +73,11 @@ INSTANTIATE_TEST_SUITE_P(Formats, CommitOfAnyFormatTest, ::testing::Range(-9, 1)
 
 TEST_P(CommitOfAnyFormatTest, YieldsItsSegmentsInOrder) {
   const int format = GetParam();
-  SegmentBytes plain{.name = "_z", .documents = 2147483647, .deletions_generation = 36, .compound = 0xff};
+  SegmentBytes plain{.name = "_z", .documents = 2147483640, .deletions_generation = 36, .compound = 0xff};
   SegmentBytes rich{
       .name = "_10", .documents = 0, .shares_store = true, .norm_generations = 3, .compound = 0};
   const Commit commit = Read(CommitBytes(format, {SegmentBytes{}, plain, rich}));
-  EXPECT_EQ(commit.generation, 5);
+  EXPECT_EQ(commit.generation, format < 0 ? 5 : 0);
   EXPECT_EQ(commit.format, format);
   EXPECT_EQ(commit.counter, 42);
   EXPECT_EQ(commit.end, commit.size);
@@ -79,7 +85,7 @@ TEST_P(CommitOfAnyFormatTest, YieldsItsSegmentsInOrder) {
   EXPECT_EQ(commit.segments[0].name, "_0");
   EXPECT_EQ(commit.segments[0].document_count, 7);
   EXPECT_EQ(commit.segments[1].name, "_z");
-  EXPECT_EQ(commit.segments[1].document_count, 2147483647);
+  EXPECT_EQ(commit.segments[1].document_count, 2147483640);
   EXPECT_EQ(commit.segments[2].name, "_10");
   EXPECT_EQ(commit.segments[2].document_count, 0);
   using Compound = SegmentInfo::Compound;
@@ -116,8 +122,14 @@ TEST_P(CommitOfAnyFormatTest, IsDamagedWhereverItIsCut) {
   }
 }
 
-TEST_P(CommitOfAnyFormatTest, IgnoresWhatFollows) {
-  EXPECT_EQ(Read(CommitBytes(GetParam(), {SegmentBytes{}}) + "more").segments.size(), 1U);
+// Without a checksum, what follows is all that shows that the bytes are of another layout.
+TEST_P(CommitOfAnyFormatTest, IgnoresWhatFollowsAChecksumAndNothingElse) {
+  const std::string bytes = CommitBytes(GetParam(), {SegmentBytes{}});
+  if (GetParam() <= -5) {
+    EXPECT_EQ(Read(bytes + "more").segments.size(), 1U);
+  } else {
+    ExpectDamage(bytes.size(), "4 bytes behind the end of the commit", [&] { Read(bytes + "more"); });
+  }
 }
 
 TEST_P(CommitOfAnyFormatTest, ShowsAnyFlippedBitWhereItHasAChecksum) {
@@ -129,6 +141,92 @@ TEST_P(CommitOfAnyFormatTest, ShowsAnyFlippedBitWhereItHasAChecksum) {
     flipped[bit / 8] = static_cast<char>(flipped[bit / 8] ^ 1 << bit % 8);
     EXPECT_THROW(Read(flipped), IndexDamagedError) << "bit " << bit;
   }
+}
+
+TEST(CommitTest, ABitOfTheFormatThatFlippedIsSeenInWhatIsWrittenToday) {
+  for (const std::vector<SegmentBytes>& segments : {std::vector<SegmentBytes>{}, {SegmentBytes{}}}) {
+    const std::string bytes = CommitBytes(-9, segments);
+    for (size_t bit = 0; bit < 32; ++bit) {
+      std::string flipped = bytes;
+      flipped[bit / 8] = static_cast<char>(flipped[bit / 8] ^ 1 << bit % 8);
+      EXPECT_THROW(Read(flipped, 5), IndexDamagedError) << "bit " << bit;
+    }
+  }
+}
+
+TEST(CommitTest, TheOldestLayoutIsRefusedInAFileWithAGeneration) {
+  const std::string bytes = CommitBytes(0, {SegmentBytes{}});
+  EXPECT_EQ(Read(bytes, 0).segments.size(), 1U);
+  ExpectDamage(0, "format is 42, but a file with a generation in its name has a negative one",
+               [&] { Read(bytes, 1); });
+}
+
+TEST(CommitTest, AFileOfZerosIsAnEmptyIndexOnlyWhereTheOldestLayoutEndsThere) {
+  EXPECT_TRUE(Read(std::string(8, '\0'), 0).segments.empty());
+  for (const size_t size : std::initializer_list<size_t>{9, 15, 16, 17, 23, 24, 100, 4096}) {
+    EXPECT_THROW(Read(std::string(size, '\0'), 0), IndexDamagedError) << size;
+  }
+  for (const size_t size : std::initializer_list<size_t>{8, 16, 4096}) {
+    EXPECT_THROW(Read(std::string(size, '\0'), 1), IndexDamagedError) << size;
+  }
+}
+
+TEST_P(CommitOfAnyFormatTest, RefusesASegmentThatIsThereTwice) {
+  const std::string bytes =
+      CommitBytes(GetParam(), {SegmentBytes{}, SegmentBytes{.name = "_1"}, SegmentBytes{}});
+  ExpectIndexError("memory: offset 0: segment _0 is there twice", [&] { Read(bytes); });
+}
+
+TEST_P(CommitOfAnyFormatTest, RefusesMoreDocumentsThanAnIndexCanHave) {
+  const std::string bytes = CommitBytes(
+      GetParam(), {SegmentBytes{.documents = 2147483647}, SegmentBytes{.name = "_1", .documents = 1}});
+  ExpectIndexError("memory: offset 0: 2147483648 documents are too many", [&] { Read(bytes); });
+}
+
+TEST(CommitTest, RefusesNumbersThatContradictThemselves) {
+  const ByteWriter one = ByteWriter().Int(-4).Long(1).Int(1).Int(1).String("_0").Int(1).Long(-1);
+  ExpectIndexError("memory: offset 0: segment _0 has its documents at -2 in the document store", [&] {
+    Read(ByteWriter(one).Int(-2).String("_0").Byte(1).Byte(1).Int(-1).Byte(1).bytes());
+  });
+  ExpectIndexError("memory: offset 0: segment _0 has norms of generation -2",
+                   [&] { Read(ByteWriter(one).Int(-1).Byte(1).Int(2).Long(3).Long(-2).Byte(1).bytes()); });
+}
+
+// A commit of segments of five documents each, which have them at these places in the store "_0".
+std::string CommitOfSlices(const std::vector<int32_t>& offsets) {
+  const auto count = static_cast<int32_t>(offsets.size());
+  ByteWriter out = ByteWriter().Int(-4).Long(1).Int(count).Int(count);
+  for (int32_t i = 0; i < count; ++i) {
+    out.String("_" + std::to_string(i)).Int(5).Long(-1);
+    out.Int(offsets[static_cast<size_t>(i)]).String("_0").Byte(0).Byte(1).Int(-1).Byte(1);
+  }
+  return out.bytes();
+}
+
+TEST(CommitTest, RefusesDocumentsOfASharedStoreThatTwoSegmentsHave) {
+  EXPECT_EQ(Read(CommitOfSlices({10, 0, 5})).segments.size(), 3U);
+  ExpectIndexError("memory: offset 0: two segments have document 10 of the document store _0", [&] {
+    Read(CommitOfSlices({10, 0, 6}));
+  });
+  ExpectIndexError("two segments have document 0 of the document store _0", [&] {
+    Read(CommitOfSlices({0, 20, 0}));
+  });
+}
+
+TEST(CommitTest, RefusesMoreNormGenerationsThanThereIsRoomFor) {
+  constexpr int32_t kEach = int32_t{1} << 16;
+  constexpr int32_t kSegments = kMostNormGenerations / kEach;
+  const auto commit_of = [&](int32_t segments) {
+    ByteWriter out = ByteWriter().Int(-2).Long(1).Int(segments).Int(segments);
+    for (int32_t i = 0; i < segments; ++i) {
+      out.String("_" + std::to_string(i)).Int(0).Long(-1).Int(kEach);
+      out.Raw(std::string(size_t{8} * kEach, '\0')).Byte(1);
+    }
+    return out.bytes();
+  };
+  EXPECT_EQ(Read(commit_of(kSegments)).segments.size(), static_cast<size_t>(kSegments));
+  ExpectIndexError("the commit has more than 2097152 norm generations",
+                   [&] { Read(commit_of(kSegments + 1)); });
 }
 
 TEST(CommitTest, RefusesALayoutNewerThanKnown) {
@@ -176,7 +274,7 @@ TEST(CommitTest, ASegmentsNameCannotLeaveTheFolder) {
 
 TEST(CommitTest, AFileThatIsLargerThanAnyCommitIsNotReadAtAll) {
   const std::string head = ByteWriter().Int(-9).Long(1).Int(1).Int(0).Int(0x7fffffff).bytes();
-  ExpectIndexError("memory: 1099511627800 bytes are too many for a commit",
+  ExpectIndexError("memory: offset 0: 1099511627800 bytes are too many for a commit",
                    [&] { ReadCommit(SourceOf(head, uint64_t{1} << 40, 0), 1); });
 }
 

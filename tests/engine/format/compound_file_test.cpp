@@ -3,6 +3,7 @@
 #include <gtest/gtest.h>
 
 #include "elastic/format/byte_reader.h"
+#include "elastic/format/name_budget.h"
 #include "support/byte_writer.h"
 #include "support/expect_damage.h"
 #include "support/memory_folder.h"
@@ -79,10 +80,35 @@ TEST(CompoundFileTest, RefusesTwoSubFilesOfOneName) {
   });
 }
 
+TEST(CompoundFileTest, RefusesNamesThatTakeTooMuch) {
+  constexpr int64_t kBegin = kMostNameBytes + 10'000;
+  // 512 names that take all there is, but for a byte, and one more.
+  const auto table = [](size_t first, size_t last) {
+    ByteWriter bytes;
+    bytes.VInt(513);
+    for (int number = 0; number < 512; ++number) {
+      const std::string start = std::to_string(1000 + number);
+      bytes.Long(kBegin).String(start +
+                                std::string((number == 0 ? first : kLongestName) - start.size(), 'a'));
+    }
+    return bytes.Long(kBegin).String(std::string(last, 'b'));
+  };
+  const auto open = [](const ByteWriter& bytes) {
+    return CompoundFile(SourceOf(bytes.bytes(), 10'000)).parts().size();
+  };
+  EXPECT_EQ(open(table(kLongestName - 1, 1)), 513U);
+  const uint64_t last_start = table(kLongestName - 1, 2).size() - 3 - sizeof(int64_t);
+  ExpectDamage(last_start, "names up to this one take more than 2097152 bytes",
+               [&] { open(table(kLongestName - 1, 2)); });
+  ExpectDamage(2, "name of 4097 bytes is too long", [&] { open(table(kLongestName + 1, 1)); });
+}
+
 TEST(CompoundFileTest, AHugeCountOverAHoleInTheFileEndsAtOnce) {
   const std::string huge = ByteWriter().VInt(-1).bytes();
   ExpectDamage(0, "sub-files are too many", [&] { CompoundFile(SourceOf(huge, uint64_t{1} << 40)); });
-  const std::string most = ByteWriter().VInt(65536).bytes();
+  const std::string too_many = ByteWriter().VInt(CompoundFile::kMostSubFiles + 1).bytes();
+  ExpectDamage(0, "sub-files are too many", [&] { CompoundFile(SourceOf(too_many, uint64_t{1} << 40)); });
+  const std::string most = ByteWriter().VInt(CompoundFile::kMostSubFiles).bytes();
   ExpectDamage(3, "table reaches", [&] { CompoundFile(SourceOf(most, uint64_t{1} << 40)); });
 }
 

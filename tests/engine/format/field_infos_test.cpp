@@ -2,6 +2,7 @@
 
 #include <gtest/gtest.h>
 
+#include "elastic/format/name_budget.h"
 #include "support/byte_writer.h"
 #include "support/expect_damage.h"
 #include "support/memory_folder.h"
@@ -106,13 +107,55 @@ TEST(FieldInfosTest, RefusesTwoFieldsOfOneName) {
 TEST(FieldInfosTest, AHugeCountOverAHoleInTheFileEndsAtOnce) {
   const std::string head = ByteWriter().VInt(-2).VInt(0x7fffffff).bytes();
   ExpectDamage(5, "fields are too many", [&] { ReadFieldInfos(SourceOf(head, uint64_t{1} << 40)); });
-  const std::string most = ByteWriter().VInt(-2).VInt(1 << 18).bytes();
+  const std::string too_many = ByteWriter().VInt(-2).VInt(kMostFields + 1).bytes();
+  ExpectDamage(5, "fields are too many", [&] { ReadFieldInfos(SourceOf(too_many, uint64_t{1} << 40)); });
+  const std::string most = ByteWriter().VInt(-2).VInt(kMostFields).bytes();
   ExpectDamage(10, "field 1 bears the name", [&] { ReadFieldInfos(SourceOf(most, uint64_t{1} << 40)); });
-  const std::string older = ByteWriter().VInt(1 << 18).bytes();
+  const std::string older = ByteWriter().VInt(kMostFields).bytes();
   ExpectDamage(5, "field 1 bears the name", [&] { ReadFieldInfos(SourceOf(older, uint64_t{1} << 40)); });
   const std::string long_name = ByteWriter().VInt(-2).VInt(1).VInt(-1).bytes();
   ExpectDamage(6, "string of 4294967295 bytes",
                [&] { ReadFieldInfos(SourceOf(long_name, uint64_t{1} << 40)); });
+}
+
+TEST(FieldInfosTest, RefusesANameThatIsTooLong) {
+  const auto one = [](size_t length) {
+    return ByteWriter().VInt(-2).VInt(1).String(std::string(length, 'a')).Byte(0);
+  };
+  EXPECT_EQ(Read(one(kLongestName)).size(), 1U);
+  ExpectDamage(6, "name of 4097 bytes is too long", [&] { Read(one(kLongestName + 1)); });
+}
+
+TEST(FieldInfosTest, RefusesNamesThatTakeTooMuchTogether) {
+  // 512 names that take all there is, but for a byte, and one more.
+  const auto fields = [](size_t last) {
+    ByteWriter bytes;
+    bytes.VInt(-2).VInt(513);
+    for (int number = 0; number < 512; ++number) {
+      const std::string start = std::to_string(1000 + number);
+      bytes.String(start + std::string(kLongestName - start.size() - (number == 0 ? 1 : 0), 'a')).Byte(0);
+    }
+    return bytes.String(std::string(last, 'b')).Byte(0);
+  };
+  static_assert(kMostNameBytes == 512 * kLongestName);
+  EXPECT_EQ(Read(fields(1)).size(), 513U);
+  ExpectDamage(fields(2).size() - 4, "names up to this one take more than 2097152 bytes",
+               [&] { Read(fields(2)); });
+}
+
+TEST(FieldInfosTest, RefusesNamesInCharactersThatTakeTooMuchTogether) {
+  const auto fields = [](int count) {
+    ByteWriter bytes;
+    bytes.VInt(count);
+    for (int number = 1; number <= count; ++number) {
+      // Three bytes of UTF-8 each.
+      const auto ending = static_cast<char16_t>(0x4e00 + number);
+      bytes.UnitsString(std::u16string(1300, u'\u4e00') + ending).Byte(0);
+    }
+    return bytes;
+  };
+  EXPECT_EQ(Read(fields(500)).size(), 500U);
+  EXPECT_THROW(Read(fields(600)), IndexDamagedError);
 }
 
 TEST(FieldInfosTest, PassesAMediumErrorOn) {

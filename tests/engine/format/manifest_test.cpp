@@ -30,7 +30,7 @@ std::string Sealed(const std::string& lines, const std::string& version = "1") {
   return body + "digest " + DigestText(Digest(body)) + "\n";
 }
 
-std::optional<Manifest> Read(const std::string& text) { return ReadManifest(*SourceOf(text)); }
+std::optional<Manifest> ReadText(const std::string& text) { return ReadManifest(*SourceOf(text)); }
 
 const std::string kTwoDigests = " 00000000000000ff fedcba9876543210";
 
@@ -63,31 +63,31 @@ TEST(ManifestTest, IsLinesOfText) {
                 {.name = "_0_1.del"}}};
   const std::string text = Sealed("commit 36\nfile _0.cfs 1048577" + kTwoDigests + "\nfile _0_1.del 0\n");
   EXPECT_EQ(WriteManifest(manifest), text);
-  EXPECT_EQ(Read(text), manifest);
+  EXPECT_EQ(ReadText(text), manifest);
 }
 
 TEST(ManifestTest, EveryFlippedBitInItIsSeen) {
   const std::string text = Sealed("commit 2\nfile _0.frq 3 0123456789abcdef\n");
-  ASSERT_TRUE(Read(text).has_value());
+  ASSERT_TRUE(ReadText(text).has_value());
   for (size_t bit = 0; bit < text.size() * 8; ++bit) {
     std::string flipped = text;
     flipped[bit / 8] = static_cast<char>(flipped[bit / 8] ^ (1 << bit % 8));
-    EXPECT_THROW(Read(flipped), IndexDamagedError) << "bit " << bit;
+    EXPECT_THROW(ReadText(flipped), IndexDamagedError) << "bit " << bit;
   }
 }
 
 TEST(ManifestTest, IsSeenToBeCutOff) {
   const std::string text = Sealed("commit 2\nfile _0.frq 3 0123456789abcdef\n");
   for (size_t size = 0; size < text.size(); ++size) {
-    EXPECT_THROW(Read(text.substr(0, size)), IndexDamagedError) << size << " bytes";
+    EXPECT_THROW(ReadText(text.substr(0, size)), IndexDamagedError) << size << " bytes";
   }
 }
 
-TEST(ManifestTest, OfALaterVersionSaysNothing) { EXPECT_EQ(Read(Sealed("whatever", "2")), std::nullopt); }
+TEST(ManifestTest, OfALaterVersionSaysNothing) { EXPECT_EQ(ReadText(Sealed("whatever", "2")), std::nullopt); }
 
 TEST(ManifestTest, RefusesWhatItsWriterWouldNotWrite) {
   const auto refuses = [](const std::string& lines, uint64_t offset, const std::string& problem) {
-    ExpectDamage(offset, problem, [&] { Read(Sealed(lines)); });
+    ExpectDamage(offset, problem, [&] { ReadText(Sealed(lines)); });
   };
   refuses("", 22, "\"\ncommit \" is missing");
   refuses("commit x\n", 30, "no number where one must be");
@@ -141,6 +141,42 @@ TEST_F(OwnManifestTest, DoesNotBelongToTheSameGenerationOfAnotherIndex) {
 TEST_F(OwnManifestTest, DoesNotBelongAnywhereWithoutACommitInIt) {
   manifest_.files.clear();
   EXPECT_FALSE(manifest_.BelongsTo(folder_, commit_));
+}
+
+// Segments of an older layout: their files of norms are looked for in the folder.
+TEST(ManifestOfSegmentsTest, ListsTheFolderOnceForAllSegments) {
+  MemoryFolder folder;
+  folder.files["segments_2"] = MemoryFile{.bytes = "the commit"};
+  Commit commit;
+  commit.generation = 2;
+  for (const char* segment : {"_0", "_00", "_1"}) {
+    commit.segments.push_back({.name = segment, .document_count = 1});
+    for (const char* extension : {".fnm", ".f0", ".f12", ".s3", ".fx", "_2.s3"}) {
+      folder.files[std::string(segment) + extension] = MemoryFile{.bytes = "x"};
+    }
+  }
+  const Manifest manifest = MakeManifest(folder, commit);
+  EXPECT_EQ(folder.listed, 1);
+  for (const char* segment : {"_0", "_00", "_1"}) {
+    for (const char* extension : {".fnm", ".f0", ".f12", ".s3"}) {
+      EXPECT_NE(manifest.Find(std::string(segment) + extension), nullptr) << segment << extension;
+    }
+  }
+  EXPECT_EQ(manifest.files.size(), 13U);
+}
+
+// A commit may name very many files of norms: only those that are there are asked for.
+TEST(ManifestOfSegmentsTest, AsksForNoFileOfNormsThatTheFolderDoesNotList) {
+  MemoryFolder folder;
+  folder.files["segments_2"] = MemoryFile{.bytes = "the commit"};
+  folder.files["_0_1.s7"] = MemoryFile{.bytes = "x"};
+  Commit commit;
+  commit.generation = 2;
+  SegmentInfo segment{.name = "_0", .document_count = 1, .compound = SegmentInfo::Compound::kNo};
+  segment.norm_generations.emplace(1000, 1);
+  commit.segments.push_back(segment);
+  EXPECT_NE(MakeManifest(folder, commit).Find("_0_1.s7"), nullptr);
+  EXPECT_LT(folder.opened, 100);
 }
 
 }  // namespace

@@ -1,6 +1,9 @@
 #include <gtest/gtest.h>
 
+#include <cerrno>
+#include <initializer_list>
 #include <limits>
+#include <string>
 
 #include "elastic/format/commit.h"
 #include "elastic/format/file_names.h"
@@ -133,6 +136,74 @@ TEST(NewestCommitTest, FallsBackWhereTheNewestCannotBeUsed) {
     used = commit.generation;
   });
   EXPECT_EQ(used, 3);
+}
+
+// What the system says of a commit's file is no reason to serve the commit before it.
+constexpr int kRefusals[] = {EACCES, EPERM, EMFILE, ENFILE, EIO, ENOMEM};
+
+// The error number of the IndexIoError that an operation throws; 0 without one.
+template <typename Operation>
+int RefusalOf(Operation operation) {
+  try {
+    operation();
+  } catch (const IndexIoError& error) {
+    return error.error_number();
+  }
+  return 0;
+}
+
+TEST(NewestCommitTest, DoesNotFallBackWhereTheSystemRefusesToOpenTheNewest) {
+  for (const int refusal : kRefusals) {
+    MemoryFolder folder;
+    PutCommit(folder, 3);
+    PutCommit(folder, 4);
+    folder.before_open = [&](const std::string& name) {
+      if (name == "segments_4") throw IndexIoError("memory/segments_4", "cannot open file", refusal);
+    };
+    EXPECT_EQ(RefusalOf([&] { Used(folder); }), refusal);
+  }
+}
+
+TEST(NewestCommitTest, DoesNotFallBackWhereTheNewestCannotBeRead) {
+  MemoryFolder folder;
+  PutCommit(folder, 3);
+  PutCommit(folder, 4);
+  folder.files["segments_4"].broken_from = 10;
+  EXPECT_EQ(RefusalOf([&] { Used(folder); }), EIO);
+}
+
+TEST(NewestCommitTest, DoesNotFallBackWhereTheSystemRefusesAFileOfTheNewest) {
+  for (const int refusal : kRefusals) {
+    MemoryFolder folder;
+    PutCommit(folder, 3);
+    PutCommit(folder, 4);
+    int tries = 0;
+    const auto use = [&](const Commit&) {
+      ++tries;
+      throw IndexIoError("memory/_4.cfs", "cannot open file", refusal);
+    };
+    EXPECT_EQ(RefusalOf([&] { UseNewestCommit(folder, use); }), refusal);
+    EXPECT_EQ(tries, 1);
+  }
+}
+
+TEST(NewestCommitTest, TheSystemsRefusalOfTheOneBeforeIsReportedToo) {
+  MemoryFolder folder;
+  PutCommit(folder, 3);
+  PutCommit(folder, 4);
+  folder.files["segments_4"].bytes.pop_back();
+  folder.files["segments_3"].broken_from = 10;
+  EXPECT_EQ(RefusalOf([&] { Used(folder); }), EIO);
+}
+
+TEST(NewestCommitTest, AFileOfZerosIsNoEmptyIndex) {
+  for (const size_t size : std::initializer_list<size_t>{8, 16, 17, 24, 46, 512, 4096}) {
+    MemoryFolder folder;
+    folder.files["segments_4"].bytes = std::string(size, '\0');
+    EXPECT_THROW(Used(folder), IndexDamagedError) << size;
+    PutCommit(folder, 3);
+    EXPECT_EQ(Used(folder), 3) << size;
+  }
 }
 
 TEST(NewestCommitTest, DoesNotFallBackPastAGap) {

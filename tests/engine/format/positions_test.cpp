@@ -103,7 +103,7 @@ TEST(PositionsTest, PassesBlocksAsItPassesDocuments) {
 }
 
 // What the error says of documents with one position each, passed in one block or one by one.
-std::string DamageIn(const std::string& positions, int32_t documents, bool in_a_block) {
+std::string PositionsDamage(const std::string& positions, int32_t documents, bool in_a_block) {
   const std::string postings = "\1" + std::string(static_cast<size_t>(documents) + 200, '\3');
   PostingsReader reader(SourceOf(postings), documents);
   reader.Seek({.document_frequency = documents}, false);
@@ -130,9 +130,9 @@ TEST(PositionsTest, RefusesInABlockWhatItRefusesOneByOneAtTheSamePlace) {
       for (const size_t behind : {size_t{0}, size_t{10}, size_t{2000}}) {
         const std::string bytes = std::string(place, '\3') + position.bytes() + std::string(behind, '\3');
         const auto documents = static_cast<int32_t>(place + 1 + std::min<size_t>(behind, 20));
-        const std::string expected = DamageIn(bytes, documents, false);
+        const std::string expected = PositionsDamage(bytes, documents, false);
         EXPECT_NE(expected, "");
-        EXPECT_EQ(DamageIn(bytes, documents, true), expected);
+        EXPECT_EQ(PositionsDamage(bytes, documents, true), expected);
       }
     }
   }

@@ -190,7 +190,7 @@ TEST_P(PostingsBlockTest, ANumberOfFiveBytesIsPassedWhereverItStands) {
 }
 
 // What the error says of the documents, passed in one block or one by one.
-std::string DamageIn(const std::string& bytes, int32_t count, bool in_a_block) {
+std::string PostingsDamage(const std::string& bytes, int32_t count, bool in_a_block) {
   PostingsReader reader(SourceOf(bytes), 5000);
   reader.Seek(Term(count, 0), false);
   try {
@@ -213,9 +213,9 @@ TEST(PostingsTest, RefusesInABlockWhatItRefusesOneByOneAtTheSamePlace) {
       for (const size_t behind : {size_t{0}, size_t{10}, size_t{2000}}) {
         const std::string bytes = std::string(place, '\3') + posting.bytes() + std::string(behind, '\3');
         const auto count = static_cast<int32_t>(place + 1 + std::min<size_t>(behind, 20));
-        const std::string expected = DamageIn(bytes, count, false);
+        const std::string expected = PostingsDamage(bytes, count, false);
         EXPECT_NE(expected, "");
-        EXPECT_EQ(DamageIn(bytes, count, true), expected);
+        EXPECT_EQ(PostingsDamage(bytes, count, true), expected);
       }
     }
   }

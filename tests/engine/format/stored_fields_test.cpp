@@ -86,6 +86,41 @@ TEST(StoredFieldsTest, RefusesValuesThatAreNotWhatTheyShouldBe) {
   ExpectDamage(7, "cannot be inflated", [&] { compressed(4, Compressed("\xff and more")); });
 }
 
+TEST(StoredFieldsTest, RefusesACompressedValueThatBecomesTooLong) {
+  // Words that compress to a tenth, so that the length alone is judged.
+  const auto text = [](size_t length) {
+    std::string words;
+    for (uint32_t number = 1; words.size() < length; ++number)
+      words += std::to_string(number * 2654435761U) + " and more of it ";
+    words.resize(length);
+    return words;
+  };
+  const auto read = [](const std::string& value) {
+    return ReadOne(1, ByteWriter().VInt(1).VInt(0).Byte(4).String(Compressed(value)));
+  };
+  EXPECT_EQ(read(text(StoredFieldsReader::kLongestInflated)), 1);
+  ExpectDamage(7, "compressed value inflates to more than 16777216 bytes",
+               [&] { read(text(StoredFieldsReader::kLongestInflated + 1)); });
+}
+
+TEST(StoredFieldsTest, RefusesCompressedValuesThatBecomeTooManyBytesTogether) {
+  const auto read = [](size_t length, int values) {
+    const std::string value = Compressed(std::string(length, 'x'));
+    ByteWriter record;
+    record.VInt(values);
+    for (int left = values; left > 0; --left) record.VInt(0).Byte(4).String(value);
+    return ReadOne(1, record);
+  };
+  // A small store may hold what compresses to nearly nothing.
+  EXPECT_EQ(read(size_t{1} << 20, 4), 4);
+  EXPECT_THROW(read(size_t{1} << 20, 5), IndexDamagedError);
+  // 8 MiB that would become 8 GiB.
+  ExpectDamage(8, "compressed values up to this one inflate to more than 32 times their size",
+               [&] { read(StoredFieldsReader::kLongestInflated, 512); });
+  // Short values do not compress well: however many there are, all are read.
+  EXPECT_EQ(read(100, 100'000), 100'000);
+}
+
 TEST(StoredFieldsTest, RefusesTextThatIsCutByAPieceOnlyWhereItIsBroken) {
   // Longer than any buffer, so that characters of three bytes lie across its ends.
   std::string text;

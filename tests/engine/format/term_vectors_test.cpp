@@ -13,7 +13,7 @@ using ::quorelastic::testing::ByteWriter;
 using ::quorelastic::testing::ExpectDamage;
 using ::quorelastic::testing::SourceOf;
 
-constexpr uint32_t kFields = 9;
+constexpr uint32_t kVectorFields = 9;
 
 // A store of one document, whose lists and terms begin at 4.
 struct Store {
@@ -26,7 +26,7 @@ struct Store {
     ByteWriter index = ByteWriter().Int(format).Long(4);
     if (format >= 3) index.Long(terms_start);
     return {SourceOf(index.bytes()), SourceOf(ByteWriter().Int(format).Raw(list.bytes()).bytes()),
-            SourceOf(ByteWriter().Int(format).Raw(terms.bytes()).bytes()), kFields};
+            SourceOf(ByteWriter().Int(format).Raw(terms.bytes()).bytes()), kVectorFields};
   }
 
   void PassAll() const {
@@ -130,7 +130,7 @@ TEST(TermVectorsTest, RefusesHeadersThatDoNotAgree) {
   ExpectDamage(0, "format is 0", [] { Store{.format = 0}.Open(); });
   const auto open = [](int index, int lists, int terms) {
     TermVectorsReader(SourceOf(ByteWriter().Int(index).bytes()), SourceOf(ByteWriter().Int(lists).bytes()),
-                      SourceOf(ByteWriter().Int(terms).bytes()), kFields);
+                      SourceOf(ByteWriter().Int(terms).bytes()), kVectorFields);
   };
   open(4, 4, 4);
   ExpectDamage(0, "the index has format 4", [&] { open(4, 3, 4); });

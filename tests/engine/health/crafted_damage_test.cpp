@@ -50,11 +50,11 @@ void ExpectLookupsToEnd(const std::string& path) {
   for (const char* document : {"0", "1", "2", "3"}) expect_end("doc_term", "", document);
 }
 
-enum class Index { kSmall, kCompound, kSkips };
+enum class CraftedIndex { kSmall, kCompound, kSkips };
 
 struct Craft {
   const char* name;
-  Index index;
+  CraftedIndex index;
   const char* file;   // how its name ends
   uint64_t offset;    // where bytes are replaced
   std::string bytes;  // by these
@@ -72,123 +72,123 @@ std::string Bytes(std::string_view bytes) { return std::string(bytes); }
 
 const Craft kCrafts[] = {
     // Field names.
-    {"FieldNamesFormat", Index::kSmall, ".fnm", 0, VInt(-3), ".fnm"},
-    {"FieldCountNegative", Index::kSmall, ".fnm", 5, VInt(-1), ".fnm"},
-    {"FieldNameLengthNegative", Index::kSmall, ".fnm", 6, VInt(-1), ".fnm"},
-    {"FieldNameTooLong", Index::kSmall, ".fnm", 6, "\x70", ".fnm"},
-    {"FieldFlagUnknown", Index::kSmall, ".fnm", 11, "\x8f", ".fnm", Grade::kDamaged},
-    {"FieldVectorsWithoutFlag", Index::kSmall, ".fnm", 11, "\x01", ".fnm", Grade::kDamaged},
-    {"FieldVectorPartsWithoutFlag", Index::kSmall, ".fnm", 11, "\x0d", ".fnm", Grade::kDamaged},
-    {"FieldNotIndexed", Index::kSmall, ".fnm", 11, "\x0e", ".tis"},
-    {"FieldOmitsFrequencies", Index::kSmall, ".fnm", 11, "\x4f", ".frq"},
-    {"FieldHasPayloads", Index::kSmall, ".fnm", 11, "\x2f", ".prx"},
-    {"FieldOmitsNorms", Index::kSmall, ".fnm", 11, "\x1f", ".nrm", Grade::kDamaged},
+    {"FieldNamesFormat", CraftedIndex::kSmall, ".fnm", 0, VInt(-3), ".fnm"},
+    {"FieldCountNegative", CraftedIndex::kSmall, ".fnm", 5, VInt(-1), ".fnm"},
+    {"FieldNameLengthNegative", CraftedIndex::kSmall, ".fnm", 6, VInt(-1), ".fnm"},
+    {"FieldNameTooLong", CraftedIndex::kSmall, ".fnm", 6, "\x70", ".fnm"},
+    {"FieldFlagUnknown", CraftedIndex::kSmall, ".fnm", 11, "\x8f", ".fnm", Grade::kDamaged},
+    {"FieldVectorsWithoutFlag", CraftedIndex::kSmall, ".fnm", 11, "\x01", ".fnm", Grade::kDamaged},
+    {"FieldVectorPartsWithoutFlag", CraftedIndex::kSmall, ".fnm", 11, "\x0d", ".fnm", Grade::kDamaged},
+    {"FieldNotIndexed", CraftedIndex::kSmall, ".fnm", 11, "\x0e", ".tis"},
+    {"FieldOmitsFrequencies", CraftedIndex::kSmall, ".fnm", 11, "\x4f", ".frq"},
+    {"FieldHasPayloads", CraftedIndex::kSmall, ".fnm", 11, "\x2f", ".prx"},
+    {"FieldOmitsNorms", CraftedIndex::kSmall, ".fnm", 11, "\x1f", ".nrm", Grade::kDamaged},
     // The dictionary.
-    {"DictionaryFormat", Index::kSmall, ".tis", 0, Int(-5), ".tis"},
-    {"DictionaryOfOldText", Index::kSmall, ".tis", 0, Int(-3), ".tii"},
-    {"DictionaryCountHuge", Index::kSmall, ".tis", 4, Long(int64_t{1} << 40), ".tis"},
-    {"DictionaryCountNegative", Index::kSmall, ".tis", 4, Long(-1), ".tis"},
-    {"DictionaryCountTooSmall", Index::kSmall, ".tis", 4, Long(2), ".tis"},
-    {"IndexIntervalZero", Index::kSmall, ".tis", 12, Int(0), ".tis"},
-    {"IndexIntervalOther", Index::kSmall, ".tis", 12, Int(127), ".tii"},
-    {"SkipIntervalZero", Index::kSmall, ".tis", 16, Int(0), ".tis"},
-    {"SkipIntervalOne", Index::kSmall, ".tis", 16, Int(1), ".tis"},
-    {"SkipIntervalOther", Index::kSmall, ".tis", 16, Int(17), ".tii"},
-    {"SkipLevelsNone", Index::kSmall, ".tis", 20, Int(0), ".tis"},
-    {"SkipLevelsNegative", Index::kSmall, ".tis", 20, Int(-1), ".tis"},
-    {"SkipLevelsHuge", Index::kSmall, ".tis", 20, Int(1 << 28), ".tis"},
-    {"TermPrefixOfTheFirst", Index::kSmall, ".tis", 24, "\x01", ".tis"},
-    {"TermPrefixNegative", Index::kSmall, ".tis", 35, VInt(-1), ".tis"},
-    {"TermPrefixHuge", Index::kSmall, ".tis", 35, VInt(1 << 30), ".tis"},
-    {"TermSuffixNegative", Index::kSmall, ".tis", 25, VInt(-5), ".tis"},
-    {"TermSuffixHuge", Index::kSmall, ".tis", 25, VInt(1 << 30), ".tis"},
-    {"TermTextNoUtf8", Index::kSmall, ".tis", 26, "\xff", ".tis"},
-    {"TermTextLost", Index::kSmall, ".tis", 26, "\xef\xbf\xbf", ".tis"},
-    {"TermTwice", Index::kSmall, ".tis", 35, "\x01\x04lpha", ".tis"},
-    {"TermsOutOfOrder", Index::kSmall, ".tis", 26, "z", ".tis"},
-    {"TermFieldTooLarge", Index::kSmall, ".tis", 31, "\x01", ".tis"},
-    {"TermFieldNegative", Index::kSmall, ".tis", 31, VInt(-1), ".tis"},
-    {"DocumentFrequencyNone", Index::kSmall, ".tis", 32, Bytes(std::string_view("\0", 1)), ".tis"},
-    {"DocumentFrequencyTooLarge", Index::kSmall, ".tis", 32, "\x04", ".tis"},
-    {"DocumentFrequencyTooSmall", Index::kSmall, ".tis", 32, "\x02", ".tis"},
-    {"DocumentFrequencyNegative", Index::kSmall, ".tis", 32, VInt(-1), ".tis"},
-    {"PostingsPointerOfTheFirst", Index::kSmall, ".tis", 33, "\x01", ".tis"},
-    {"PostingsPointerOfAnother", Index::kSmall, ".tis", 43, "\x05", ".tis"},
-    {"PositionsPointer", Index::kSmall, ".tis", 44, "\x05", ".tis"},
+    {"DictionaryFormat", CraftedIndex::kSmall, ".tis", 0, Int(-5), ".tis"},
+    {"DictionaryOfOldText", CraftedIndex::kSmall, ".tis", 0, Int(-3), ".tii"},
+    {"DictionaryCountHuge", CraftedIndex::kSmall, ".tis", 4, Long(int64_t{1} << 40), ".tis"},
+    {"DictionaryCountNegative", CraftedIndex::kSmall, ".tis", 4, Long(-1), ".tis"},
+    {"DictionaryCountTooSmall", CraftedIndex::kSmall, ".tis", 4, Long(2), ".tis"},
+    {"IndexIntervalZero", CraftedIndex::kSmall, ".tis", 12, Int(0), ".tis"},
+    {"IndexIntervalOther", CraftedIndex::kSmall, ".tis", 12, Int(127), ".tii"},
+    {"SkipIntervalZero", CraftedIndex::kSmall, ".tis", 16, Int(0), ".tis"},
+    {"SkipIntervalOne", CraftedIndex::kSmall, ".tis", 16, Int(1), ".tis"},
+    {"SkipIntervalOther", CraftedIndex::kSmall, ".tis", 16, Int(17), ".tii"},
+    {"SkipLevelsNone", CraftedIndex::kSmall, ".tis", 20, Int(0), ".tis"},
+    {"SkipLevelsNegative", CraftedIndex::kSmall, ".tis", 20, Int(-1), ".tis"},
+    {"SkipLevelsHuge", CraftedIndex::kSmall, ".tis", 20, Int(1 << 28), ".tis"},
+    {"TermPrefixOfTheFirst", CraftedIndex::kSmall, ".tis", 24, "\x01", ".tis"},
+    {"TermPrefixNegative", CraftedIndex::kSmall, ".tis", 35, VInt(-1), ".tis"},
+    {"TermPrefixHuge", CraftedIndex::kSmall, ".tis", 35, VInt(1 << 30), ".tis"},
+    {"TermSuffixNegative", CraftedIndex::kSmall, ".tis", 25, VInt(-5), ".tis"},
+    {"TermSuffixHuge", CraftedIndex::kSmall, ".tis", 25, VInt(1 << 30), ".tis"},
+    {"TermTextNoUtf8", CraftedIndex::kSmall, ".tis", 26, "\xff", ".tis"},
+    {"TermTextLost", CraftedIndex::kSmall, ".tis", 26, "\xef\xbf\xbf", ".tis"},
+    {"TermTwice", CraftedIndex::kSmall, ".tis", 35, "\x01\x04lpha", ".tis"},
+    {"TermsOutOfOrder", CraftedIndex::kSmall, ".tis", 26, "z", ".tis"},
+    {"TermFieldTooLarge", CraftedIndex::kSmall, ".tis", 31, "\x01", ".tis"},
+    {"TermFieldNegative", CraftedIndex::kSmall, ".tis", 31, VInt(-1), ".tis"},
+    {"DocumentFrequencyNone", CraftedIndex::kSmall, ".tis", 32, Bytes(std::string_view("\0", 1)), ".tis"},
+    {"DocumentFrequencyTooLarge", CraftedIndex::kSmall, ".tis", 32, "\x04", ".tis"},
+    {"DocumentFrequencyTooSmall", CraftedIndex::kSmall, ".tis", 32, "\x02", ".tis"},
+    {"DocumentFrequencyNegative", CraftedIndex::kSmall, ".tis", 32, VInt(-1), ".tis"},
+    {"PostingsPointerOfTheFirst", CraftedIndex::kSmall, ".tis", 33, "\x01", ".tis"},
+    {"PostingsPointerOfAnother", CraftedIndex::kSmall, ".tis", 43, "\x05", ".tis"},
+    {"PositionsPointer", CraftedIndex::kSmall, ".tis", 44, "\x05", ".tis"},
     // The index over it.
-    {"TermsIndexCountHuge", Index::kSmall, ".tii", 4, Long(int64_t{1} << 31), ".tii"},
-    {"TermsIndexCountNone", Index::kSmall, ".tii", 4, Long(0), ".tii"},
-    {"TermsIndexFirstHasText", Index::kSmall, ".tii", 25, "\x01", ".tii"},
-    {"TermsIndexPointer", Index::kSmall, ".tii", 34, "\x19", ".tii"},
-    {"TermsIndexPostings", Index::kSmall, ".tii", 32, "\x01", ".tii"},
+    {"TermsIndexCountHuge", CraftedIndex::kSmall, ".tii", 4, Long(int64_t{1} << 31), ".tii"},
+    {"TermsIndexCountNone", CraftedIndex::kSmall, ".tii", 4, Long(0), ".tii"},
+    {"TermsIndexFirstHasText", CraftedIndex::kSmall, ".tii", 25, "\x01", ".tii"},
+    {"TermsIndexPointer", CraftedIndex::kSmall, ".tii", 34, "\x19", ".tii"},
+    {"TermsIndexPostings", CraftedIndex::kSmall, ".tii", 32, "\x01", ".tii"},
     // Documents, positions.
-    {"DocumentTooLarge", Index::kSmall, ".frq", 2, "\x06", ".frq"},
-    {"DocumentTwice", Index::kSmall, ".frq", 2, Bytes(std::string_view("\0", 1)), ".frq"},
-    {"FrequencyNone", Index::kSmall, ".frq", 1, Bytes(std::string_view("\0", 1)), ".frq"},
-    {"FrequencyTooLarge", Index::kSmall, ".frq", 1, "\x7f", ".prx"},
-    {"PositionNegative", Index::kSmall, ".prx", 1, VInt(-7), ".prx"},
+    {"DocumentTooLarge", CraftedIndex::kSmall, ".frq", 2, "\x06", ".frq"},
+    {"DocumentTwice", CraftedIndex::kSmall, ".frq", 2, Bytes(std::string_view("\0", 1)), ".frq"},
+    {"FrequencyNone", CraftedIndex::kSmall, ".frq", 1, Bytes(std::string_view("\0", 1)), ".frq"},
+    {"FrequencyTooLarge", CraftedIndex::kSmall, ".frq", 1, "\x7f", ".prx"},
+    {"PositionNegative", CraftedIndex::kSmall, ".prx", 1, VInt(-7), ".prx"},
     // Skip data.
-    {"SkipOffset", Index::kSkips, ".tis", 37, VInt(302), ".frq"},
-    {"SkipLevelLength", Index::kSkips, ".frq", 300, "\x7f", ".frq"},
-    {"SkipDocument", Index::kSkips, ".frq", 301, "\x80", ".frq"},
-    {"SkipLowestDocument", Index::kSkips, ".frq", 309, "\x0d", ".frq"},
-    {"SkipPostings", Index::kSkips, ".frq", 310, "\x0e", ".frq"},
-    {"SkipPositions", Index::kSkips, ".frq", 311, "\x0e", ".frq"},
+    {"SkipOffset", CraftedIndex::kSkips, ".tis", 37, VInt(302), ".frq"},
+    {"SkipLevelLength", CraftedIndex::kSkips, ".frq", 300, "\x7f", ".frq"},
+    {"SkipDocument", CraftedIndex::kSkips, ".frq", 301, "\x80", ".frq"},
+    {"SkipLowestDocument", CraftedIndex::kSkips, ".frq", 309, "\x0d", ".frq"},
+    {"SkipPostings", CraftedIndex::kSkips, ".frq", 310, "\x0e", ".frq"},
+    {"SkipPositions", CraftedIndex::kSkips, ".frq", 311, "\x0e", ".frq"},
     // Stored fields.
-    {"StoredFormat", Index::kSmall, ".fdx", 0, Int(3), ".fdx"},
-    {"StoredFormatNegative", Index::kSmall, ".fdx", 0, Int(-1), ".fdx"},
-    {"StoredFormatOfRecords", Index::kSmall, ".fdt", 0, Int(1), ".fdt"},
-    {"RecordPointerOfTheFirst", Index::kSmall, ".fdx", 4, Long(5), ".fdt"},
-    {"RecordPointerNegative", Index::kSmall, ".fdx", 4, Long(-4), ".fdx"},
-    {"RecordPointerHuge", Index::kSmall, ".fdx", 12, Long(int64_t{1} << 40), ".fdx"},
-    {"StoredCountHuge", Index::kSmall, ".fdt", 4, "\x7f", ".fdt"},
-    {"StoredCountNone", Index::kSmall, ".fdt", 4, Bytes(std::string_view("\0", 1)), ".fdt"},
-    {"StoredFieldTooLarge", Index::kSmall, ".fdt", 5, "\x01", ".fdt"},
-    {"StoredFieldNegative", Index::kSmall, ".fdt", 5, VInt(-1), ".fdt"},
-    {"StoredFlags", Index::kSmall, ".fdt", 6, "\x09", ".fdt"},
-    {"StoredCompressed", Index::kSmall, ".fdt", 6, "\x05", ".fdt"},
-    {"StoredLengthNegative", Index::kSmall, ".fdt", 7, VInt(-1), ".fdt"},
-    {"StoredLengthTooLarge", Index::kSmall, ".fdt", 7, "\x7f", ".fdt"},
-    {"StoredTextNoUtf8", Index::kSmall, ".fdt", 8, "\xc0", ".fdt"},
+    {"StoredFormat", CraftedIndex::kSmall, ".fdx", 0, Int(3), ".fdx"},
+    {"StoredFormatNegative", CraftedIndex::kSmall, ".fdx", 0, Int(-1), ".fdx"},
+    {"StoredFormatOfRecords", CraftedIndex::kSmall, ".fdt", 0, Int(1), ".fdt"},
+    {"RecordPointerOfTheFirst", CraftedIndex::kSmall, ".fdx", 4, Long(5), ".fdt"},
+    {"RecordPointerNegative", CraftedIndex::kSmall, ".fdx", 4, Long(-4), ".fdx"},
+    {"RecordPointerHuge", CraftedIndex::kSmall, ".fdx", 12, Long(int64_t{1} << 40), ".fdx"},
+    {"StoredCountHuge", CraftedIndex::kSmall, ".fdt", 4, "\x7f", ".fdt"},
+    {"StoredCountNone", CraftedIndex::kSmall, ".fdt", 4, Bytes(std::string_view("\0", 1)), ".fdt"},
+    {"StoredFieldTooLarge", CraftedIndex::kSmall, ".fdt", 5, "\x01", ".fdt"},
+    {"StoredFieldNegative", CraftedIndex::kSmall, ".fdt", 5, VInt(-1), ".fdt"},
+    {"StoredFlags", CraftedIndex::kSmall, ".fdt", 6, "\x09", ".fdt"},
+    {"StoredCompressed", CraftedIndex::kSmall, ".fdt", 6, "\x05", ".fdt"},
+    {"StoredLengthNegative", CraftedIndex::kSmall, ".fdt", 7, VInt(-1), ".fdt"},
+    {"StoredLengthTooLarge", CraftedIndex::kSmall, ".fdt", 7, "\x7f", ".fdt"},
+    {"StoredTextNoUtf8", CraftedIndex::kSmall, ".fdt", 8, "\xc0", ".fdt"},
     // Term vectors.
-    {"VectorFormat", Index::kSmall, ".tvx", 0, Int(5), ".tvx"},
-    {"VectorFormatZero", Index::kSmall, ".tvx", 0, Int(0), ".tvx"},
-    {"VectorFormatOfDocuments", Index::kSmall, ".tvd", 0, Int(3), ".tvd"},
-    {"VectorFormatOfTerms", Index::kSmall, ".tvf", 0, Int(3), ".tvf"},
-    {"VectorListPointer", Index::kSmall, ".tvx", 4, Long(6), ".tvx"},
-    {"VectorListPointerNegative", Index::kSmall, ".tvx", 4, Long(-1), ".tvx"},
-    {"VectorTermsPointer", Index::kSmall, ".tvx", 12, Long(int64_t{1} << 40), ".tvd"},
-    {"VectorFieldCountHuge", Index::kSmall, ".tvd", 4, VInt(1 << 28), ".tvd"},
-    {"VectorFieldCountNone", Index::kSmall, ".tvd", 4, Bytes(std::string_view("\0", 1)), ".tvx"},
-    {"VectorFieldTooLarge", Index::kSmall, ".tvd", 5, "\x01", ".tvd"},
-    {"VectorTermCountNone", Index::kSmall, ".tvf", 4, Bytes(std::string_view("\0", 1)), ".tvf"},
-    {"VectorTermCountHuge", Index::kSmall, ".tvf", 4, VInt(1 << 28), ".tvf"},
-    {"VectorFlags", Index::kSmall, ".tvf", 5, "\x07", ".tvf"},
-    {"VectorPrefixHuge", Index::kSmall, ".tvf", 6, VInt(1 << 30), ".tvf"},
-    {"VectorSuffixNegative", Index::kSmall, ".tvf", 7, VInt(-1), ".tvf"},
-    {"VectorTextNoUtf8", Index::kSmall, ".tvf", 8, "\xfe", ".tvf"},
-    {"VectorTermsOutOfOrder", Index::kSmall, ".tvf", 8, "z", ".tvf"},
-    {"VectorFrequencyNone", Index::kSmall, ".tvf", 13, Bytes(std::string_view("\0", 1)), ".tvf"},
-    {"VectorFrequencyHuge", Index::kSmall, ".tvf", 13, VInt(1 << 30), ".tvf"},
-    {"VectorPositionNegative", Index::kSmall, ".tvf", 15, VInt(-9), ".tvf"},
+    {"VectorFormat", CraftedIndex::kSmall, ".tvx", 0, Int(5), ".tvx"},
+    {"VectorFormatZero", CraftedIndex::kSmall, ".tvx", 0, Int(0), ".tvx"},
+    {"VectorFormatOfDocuments", CraftedIndex::kSmall, ".tvd", 0, Int(3), ".tvd"},
+    {"VectorFormatOfTerms", CraftedIndex::kSmall, ".tvf", 0, Int(3), ".tvf"},
+    {"VectorListPointer", CraftedIndex::kSmall, ".tvx", 4, Long(6), ".tvx"},
+    {"VectorListPointerNegative", CraftedIndex::kSmall, ".tvx", 4, Long(-1), ".tvx"},
+    {"VectorTermsPointer", CraftedIndex::kSmall, ".tvx", 12, Long(int64_t{1} << 40), ".tvd"},
+    {"VectorFieldCountHuge", CraftedIndex::kSmall, ".tvd", 4, VInt(1 << 28), ".tvd"},
+    {"VectorFieldCountNone", CraftedIndex::kSmall, ".tvd", 4, Bytes(std::string_view("\0", 1)), ".tvx"},
+    {"VectorFieldTooLarge", CraftedIndex::kSmall, ".tvd", 5, "\x01", ".tvd"},
+    {"VectorTermCountNone", CraftedIndex::kSmall, ".tvf", 4, Bytes(std::string_view("\0", 1)), ".tvf"},
+    {"VectorTermCountHuge", CraftedIndex::kSmall, ".tvf", 4, VInt(1 << 28), ".tvf"},
+    {"VectorFlags", CraftedIndex::kSmall, ".tvf", 5, "\x07", ".tvf"},
+    {"VectorPrefixHuge", CraftedIndex::kSmall, ".tvf", 6, VInt(1 << 30), ".tvf"},
+    {"VectorSuffixNegative", CraftedIndex::kSmall, ".tvf", 7, VInt(-1), ".tvf"},
+    {"VectorTextNoUtf8", CraftedIndex::kSmall, ".tvf", 8, "\xfe", ".tvf"},
+    {"VectorTermsOutOfOrder", CraftedIndex::kSmall, ".tvf", 8, "z", ".tvf"},
+    {"VectorFrequencyNone", CraftedIndex::kSmall, ".tvf", 13, Bytes(std::string_view("\0", 1)), ".tvf"},
+    {"VectorFrequencyHuge", CraftedIndex::kSmall, ".tvf", 13, VInt(1 << 30), ".tvf"},
+    {"VectorPositionNegative", CraftedIndex::kSmall, ".tvf", 15, VInt(-9), ".tvf"},
     // Deleted documents.
-    {"DeletionsOfFewerDocuments", Index::kSmall, ".del", 0, Int(2), ".del"},
-    {"DeletionsOfMoreDocuments", Index::kSmall, ".del", 0, Int(1 << 30), ".del"},
-    {"DeletionsNegative", Index::kSmall, ".del", 0, Int(-2), ".del"},
-    {"DeletionsSparseNegative", Index::kSmall, ".del", 0, Int(-1), ".del"},
-    {"DeletionsCount", Index::kSmall, ".del", 4, Int(2), ".del"},
-    {"DeletionsBits", Index::kSmall, ".del", 8, "\x06", ".del"},
-    {"DeletionsPastTheEnd", Index::kSmall, ".del", 8, "\x08", ".del", Grade::kDamaged},
+    {"DeletionsOfFewerDocuments", CraftedIndex::kSmall, ".del", 0, Int(2), ".del"},
+    {"DeletionsOfMoreDocuments", CraftedIndex::kSmall, ".del", 0, Int(1 << 30), ".del"},
+    {"DeletionsNegative", CraftedIndex::kSmall, ".del", 0, Int(-2), ".del"},
+    {"DeletionsSparseNegative", CraftedIndex::kSmall, ".del", 0, Int(-1), ".del"},
+    {"DeletionsCount", CraftedIndex::kSmall, ".del", 4, Int(2), ".del"},
+    {"DeletionsBits", CraftedIndex::kSmall, ".del", 8, "\x06", ".del"},
+    {"DeletionsPastTheEnd", CraftedIndex::kSmall, ".del", 8, "\x08", ".del", Grade::kDamaged},
     // Norms.
-    {"NormsHeader", Index::kSmall, ".nrm", 0, "M", ".nrm", Grade::kDamaged},
-    {"NormsHeaderVersion", Index::kSmall, ".nrm", 3, "\xfe", ".nrm", Grade::kDamaged},
+    {"NormsHeader", CraftedIndex::kSmall, ".nrm", 0, "M", ".nrm", Grade::kDamaged},
+    {"NormsHeaderVersion", CraftedIndex::kSmall, ".nrm", 3, "\xfe", ".nrm", Grade::kDamaged},
     // Compound files.
-    {"CompoundCountHuge", Index::kCompound, ".cfs", 0, VInt(1 << 30), ".cfs"},
-    {"CompoundCountTooSmall", Index::kCompound, ".cfs", 0, "\x05", ".cfs", Grade::kDamaged},
-    {"CompoundOffsetNegative", Index::kCompound, ".cfs", 1, Long(-1), ".cfs"},
-    {"CompoundOffsetTooSmall", Index::kCompound, ".cfs", 1, Long(1), ".cfs"},
-    {"CompoundNameLengthNegative", Index::kCompound, ".cfs", 9, VInt(-1), ".cfs"},
-    {"CompoundNameUnknown", Index::kCompound, ".cfs", 12, "?", ".cfs", Grade::kDamaged},
+    {"CompoundCountHuge", CraftedIndex::kCompound, ".cfs", 0, VInt(1 << 30), ".cfs"},
+    {"CompoundCountTooSmall", CraftedIndex::kCompound, ".cfs", 0, "\x05", ".cfs", Grade::kDamaged},
+    {"CompoundOffsetNegative", CraftedIndex::kCompound, ".cfs", 1, Long(-1), ".cfs"},
+    {"CompoundOffsetTooSmall", CraftedIndex::kCompound, ".cfs", 1, Long(1), ".cfs"},
+    {"CompoundNameLengthNegative", CraftedIndex::kCompound, ".cfs", 9, VInt(-1), ".cfs"},
+    {"CompoundNameUnknown", CraftedIndex::kCompound, ".cfs", 12, "?", ".cfs", Grade::kDamaged},
 };
 
 class CraftedDamageTest : public ::testing::TestWithParam<Craft> {
@@ -196,9 +196,9 @@ class CraftedDamageTest : public ::testing::TestWithParam<Craft> {
   // Written once: that takes longer than all of the tests.
   static void SetUpTestSuite() {
     originals_ = std::make_unique<TemporaryFolder>();
-    WriteSmallIndex(Original(Index::kSmall), false);
-    WriteSmallIndex(Original(Index::kCompound), true);
-    WriteSkippingIndex(Original(Index::kSkips));
+    WriteSmallIndex(Original(CraftedIndex::kSmall), false);
+    WriteSmallIndex(Original(CraftedIndex::kCompound), true);
+    WriteSkippingIndex(Original(CraftedIndex::kSkips));
   }
   static void TearDownTestSuite() { originals_.reset(); }
 
@@ -220,7 +220,9 @@ class CraftedDamageTest : public ::testing::TestWithParam<Craft> {
   }
 
  private:
-  static std::string Original(Index index) { return *originals_ / std::to_string(static_cast<int>(index)); }
+  static std::string Original(CraftedIndex index) {
+    return *originals_ / std::to_string(static_cast<int>(index));
+  }
 
   static inline std::unique_ptr<TemporaryFolder> originals_;
   TemporaryFolder folder_;

@@ -13,6 +13,7 @@
 #include "support/library_checker.h"
 #include "support/random_index.h"
 #include "support/run_size.h"
+#include "support/sanitized.h"
 #include "support/temporary_folder.h"
 #include "support/varied_index.h"
 #include "vantrel/elastic/index_health.h"
@@ -53,7 +54,7 @@ class HealthyIndexTest : public ::testing::Test {
 
 // QUORELASTIC_HEALTHY_INDEXES makes it a longer campaign.
 TEST_F(HealthyIndexTest, RandomIndexesOfEveryKindAreClean) {
-  const int count = RunSize("QUORELASTIC_HEALTHY_INDEXES", 150);
+  const int count = RunSize("QUORELASTIC_HEALTHY_INDEXES", 150 / ::quorelastic::testing::kFewer);
   for (int seed = 1; seed <= count; ++seed) {
     SCOPED_TRACE("seed " + std::to_string(seed));
     const TemporaryFolder folder;

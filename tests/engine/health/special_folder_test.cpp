@@ -3,9 +3,12 @@
 #include <gmock/gmock.h>
 #include <gtest/gtest.h>
 
+#include <cerrno>
 #include <filesystem>
+#include <set>
 #include <stdexcept>
 #include <string>
+#include <vector>
 
 #include "elastic/format/file_names.h"
 #include "elastic/health/index_check.h"
@@ -223,6 +226,70 @@ TEST_F(SpecialFolderTest, AFailingDiskUnderTheNewestCommitIsNoReasonToTakeTheOne
   newer.broken_from = 10;
   memory.files[format::CommitFileName(generation_ + 1)] = newer;
   EXPECT_THROW(health::CheckFolder(memory, {}), IndexIoError);
+}
+
+// Nor is anything else that the system refuses, and it is no verdict about the index either.
+TEST_F(SpecialFolderTest, ANewestCommitThatTheSystemRefusesToOpenIsAnErrorAndNoVerdict) {
+  for (const int refusal : {EACCES, EMFILE, ENFILE, EIO, ENOMEM}) {
+    for (const int64_t newer : {0, 1}) {
+      MemoryFolder memory;
+      Load(memory);
+      const std::string newest = format::CommitFileName(generation_ + newer);
+      memory.files[newest] = memory.files[format::CommitFileName(generation_)];
+      memory.before_open = [&](const std::string& name) {
+        if (name == newest) throw IndexIoError("memory/" + name, "cannot open file", refusal);
+      };
+      try {
+        health::CheckFolder(memory, {});
+        ADD_FAILURE() << "a verdict in spite of error " << refusal << ", " << newer << " commit later";
+      } catch (const IndexIoError& error) {
+        EXPECT_EQ(error.error_number(), refusal);
+      }
+    }
+  }
+}
+
+TEST_F(SpecialFolderTest, WithANewestCommitOfZerosIsDamagedUnlessTheOneBeforeIsThere) {
+  const std::string commit = ReadFile(CommitPath(generation_));
+  WriteFile(CommitPath(generation_ + 1), std::string(commit.size(), '\0'));
+  ExpectClean();
+  EXPECT_EQ(CheckIndexHealth(path()).generation, generation_);
+  std::filesystem::remove(CommitPath(generation_ + 1));
+  WriteFile(CommitPath(generation_), std::string(commit.size(), '\0'));
+  ExpectDamaged(format::CommitFileName(generation_), "format is 0");
+}
+
+// A commit of the layout that names the fewest things, with segments of one document each.
+std::string CommitOfSegments(const std::vector<std::string>& segments) {
+  const auto count = static_cast<int32_t>(segments.size());
+  ByteWriter commit = ByteWriter().Int(-1).Long(1).Int(count).Int(count);
+  for (const std::string& segment : segments) commit.String(segment).Int(1);
+  return commit.bytes();
+}
+
+TEST(SpecialCommitTest, ThatNamesASegmentOftenIsRefusedBeforeAnyFileOfTheSegmentIsOpened) {
+  MemoryFolder memory;
+  memory.files["segments_1"].bytes = CommitOfSegments(std::vector<std::string>(65'536, "_0"));
+  for (const char* name : {"_0.fnm", "_0.tis", "_0.tii", "_0.frq", "_0.fdx", "_0.fdt"})
+    memory.files[name] = {};
+  std::set<std::string> opened;
+  memory.before_open = [&](const std::string& name) { opened.insert(name); };
+  const HealthReport report = health::CheckFolder(memory, {});
+  ASSERT_EQ(report.findings.size(), 1U);
+  EXPECT_THAT(report.findings[0].found, HasSubstr("segment _0 is there twice"));
+  EXPECT_EQ(opened, (std::set<std::string>{"segments_1", "segments.gen"}));
+}
+
+TEST(SpecialCommitTest, OfAnOlderLayoutHasItsFolderListedOnceForAllSegments) {
+  const auto count_listings = [](int segments) {
+    std::vector<std::string> names;
+    for (int i = 0; i < segments; ++i) names.push_back("_" + std::to_string(i));
+    MemoryFolder memory;
+    memory.files["segments_1"].bytes = CommitOfSegments(names);
+    health::CheckFolder(memory, {});
+    return memory.listed;
+  };
+  EXPECT_EQ(count_listings(1000), count_listings(1));
 }
 
 TEST_F(SpecialFolderTest, FilesThatVanishWithTheirCommitAreNoDamage) {

@@ -1,3 +1,5 @@
+#include <lucene++/LuceneHeaders.h>
+
 #include <gmock/gmock.h>
 #include <gtest/gtest.h>
 

@@ -1,5 +1,7 @@
 #include "read_back.h"
 
+#include <lucene++/LuceneHeaders.h>
+
 #include "vantrel/elastic/library_setup.h"
 
 namespace quorelastic::testing {

@@ -1,12 +1,11 @@
 #pragma once
 
-#include <lucene++/LuceneHeaders.h>
-
 #include <string>
 #include <vector>
 
 #include "vantrel/elastic/document.h"
 #include "vantrel/elastic/index.h"
+#include "vantrel/elastic/library_types.h"
 
 namespace quorelastic::testing {
 

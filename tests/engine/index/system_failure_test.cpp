@@ -12,6 +12,7 @@
 #include <filesystem>
 #include <string>
 #include <thread>
+#include <utility>
 #include <vector>
 
 #include "read_back.h"
@@ -21,8 +22,11 @@
 #include "support/without_rights.h"
 #include "vantrel/elastic/index.h"
 #include "vantrel/elastic/index_error.h"
+#include "vantrel/elastic/index_health.h"
+#include "vantrel/elastic/index_info.h"
 #include "vantrel/elastic/index_repair.h"
 #include "vantrel/elastic/search.h"
+#include "vantrel/elastic/suggest_terms.h"
 
 namespace {
 
@@ -37,11 +41,15 @@ void FailReads(int first, int count = 1) {
   failing = count;
 }
 
-// No more reads fail. Returns whether one did.
-bool StopFailingReads() {
-  const bool has_failed = first_failing >= 0 && reads > first_failing;
+// No more reads fail. Returns whether one did since the call before.
+bool has_failed = false;
+void StopFailingReadsForNow() {
+  has_failed = has_failed || (first_failing >= 0 && reads > first_failing);
   first_failing = -1;
-  return has_failed;
+}
+bool StopFailingReads() {
+  StopFailingReadsForNow();
+  return std::exchange(has_failed, false);
 }
 
 }  // namespace
@@ -85,6 +93,24 @@ class SystemFailureTest : public ::testing::TestWithParam<bool> {
       index->Commit();
     }
     if (!GetParam()) fs::remove(path_ + "/quorelastic.manifest");
+  }
+
+  // Puts the commit before the newest one back, as where its writer could not remove it. Its only segment is the first
+  // one, which the newest commit has as well.
+  void PutBackTheCommitBefore() const {
+    const std::string newest = path_ + "/segments_3";
+    const std::string before = path_ + "/segments_2";
+    ASSERT_TRUE(fs::exists(newest) && !fs::exists(before));
+    const TemporaryFolder other;
+    {
+      IndexSettings settings = IdAndBody();
+      settings.compound_files = false;
+      const auto index = Index::Create(other / "index", settings);
+      index->Add(MakeDocument("a", "red word"));
+      index->Commit();
+    }
+    fs::copy(other / "index/segments_2", before);
+    fs::permissions(before, fs::perms::all);
   }
   ~SystemFailureTest() override { StopFailingReads(); }
 
@@ -186,6 +212,57 @@ TEST_P(SystemFailureTest, AMergeThatCannotReadTellsTheSystemsReasonAndLosesNothi
     index->Commit();
   });
   EXPECT_GT(refusals, 3);
+  EXPECT_EQ(CountWords(*Index::Open(path_)), 2U);
+}
+
+TEST_P(SystemFailureTest, ASearchIsNeverAnsweredFromTheCommitBefore) {
+  PutBackTheCommitBefore();
+  CountRefusalsOfReads([&](int read) {
+    const auto index = Index::Open(path_);
+    FailReads(read);
+    EXPECT_EQ(CountWords(*index), 2U);
+  });
+  if (kIsSanitized) GTEST_SKIP() << kSanitizerNeedsDescriptors;
+  CountRefusalsOfDescriptors([&](rlim_t more) {
+    const auto index = Index::Open(path_);
+    const FewOpenFiles few(CountOpenFiles() + more);
+    EXPECT_EQ(CountWords(*index), 2U);
+  });
+}
+
+TEST_P(SystemFailureTest, AWriterNeverGoesOnFromTheCommitBefore) {
+  CountRefusalsOfReads([&](int read) {
+    const TemporaryFolder copy;
+    PutBackTheCommitBefore();
+    fs::copy(path_, copy / "index", fs::copy_options::recursive);
+    fs::remove(path_ + "/segments_2");
+    const auto index = Index::Open(copy / "index");
+    FailReads(read);
+    try {
+      index->Add(MakeDocument("c", "red word"));
+      index->Commit();
+    } catch (const IndexIoError&) {
+      StopFailingReadsForNow();
+      EXPECT_EQ(CountWords(*Index::Open(copy / "index")), 2U);
+      throw;
+    }
+    StopFailingReadsForNow();
+    EXPECT_EQ(CountWords(*Index::Open(copy / "index")), 3U);
+  });
+}
+
+TEST_P(SystemFailureTest, ACommitThatMayNotBeReadIsARefusalWithTheCommitBeforeBesideIt) {
+  PutBackTheCommitBefore();
+  fs::permissions(path_ + "/segments_3", fs::perms::none);
+  {
+    const WithoutRights rights;
+    EXPECT_TRUE(IsRefused(EACCES, [&] { CheckIndexHealth(path_); }));
+    EXPECT_TRUE(IsRefused(EACCES, [&] { PlanRepair(path_); }));
+    EXPECT_TRUE(IsRefused(EACCES, [&] { SuggestTerms({path_}, {.field = "body", .prefix = "w"}); }));
+    EXPECT_TRUE(IsRefused(EACCES, [&] { IndexInfo(path_).initialize(); }));
+    EXPECT_TRUE(IsRefused(EACCES, [&] { Index::Open(path_)->Statistics(); }));
+  }
+  fs::permissions(path_ + "/segments_3", fs::perms::owner_all);
   EXPECT_EQ(CountWords(*Index::Open(path_)), 2U);
 }
 

@@ -10,18 +10,26 @@
 #include <lucene++/TermPositions.h>
 
 #include <cstdlib>
+#include <filesystem>
 #include <string>
 #include <vector>
 
 #include "engine/health/health_shapes.h"
+#include "support/files.h"
+#include "support/library_index.h"
+#include "support/open_files.h"
 #include "support/run_size.h"
+#include "support/sanitized.h"
+#include "support/small_index.h"
 #include "support/temporary_folder.h"
 #include "support/varied_index.h"
+#include "support/without_rights.h"
 #include "vantrel/elastic/library_setup.h"
 
 namespace quorelastic::testing {
 namespace {
 
+namespace fs = std::filesystem;
 using Lucene::IndexReaderPtr;
 using Lucene::newLucene;
 using Lucene::String;
@@ -133,6 +141,15 @@ TEST_P(CheckedReaderTest, AnswersAsTheLibraryDoes) {
   ExpectSame(folder_.path());
 }
 
+TEST(CheckedReaderUseTest, PositionsOfAReaderForTermVectorsAreAnError) {
+  vantrel::elastic::PrepareIndexLibrary();
+  const TemporaryFolder folder;
+  WriteSmallIndex(folder.path(), false);
+  const CheckedReader checked(folder.path());
+  EXPECT_THROW(checked.Positions(0), Lucene::IllegalStateException);
+  EXPECT_TRUE(checked.TermVector(0, L"body"));
+}
+
 // Three levels of skip data, with and without payloads.
 TEST(CheckedReaderSkipTest, JumpsAsTheLibraryDoes) {
   vantrel::elastic::PrepareIndexLibrary();
@@ -145,7 +162,7 @@ TEST(CheckedReaderSkipTest, JumpsAsTheLibraryDoes) {
 // QUORELASTIC_HEALTHY_INDEXES makes it a longer campaign.
 TEST(CheckedReaderRandomTest, AnswersAsTheLibraryDoesOnAnyIndex) {
   vantrel::elastic::PrepareIndexLibrary();
-  const int indexes = RunSize("QUORELASTIC_HEALTHY_INDEXES", 12);
+  const int indexes = RunSize("QUORELASTIC_HEALTHY_INDEXES", 12 / kFewer);
   for (int i = 0; i < indexes; ++i) {
     SCOPED_TRACE("seed " + std::to_string(31000 + i));
     const TemporaryFolder folder;
@@ -153,6 +170,65 @@ TEST(CheckedReaderRandomTest, AnswersAsTheLibraryDoesOnAnyIndex) {
     ExpectSame(folder.path());
     if (::testing::Test::HasFailure()) return;
   }
+}
+
+// An index of two commits, of one and of two documents, as where the writer of the second could not remove the first.
+class TwoCommitsTest : public ::testing::Test {
+ protected:
+  void SetUp() override {
+    vantrel::elastic::PrepareIndexLibrary();
+    const TemporaryFolder before;
+    {
+      LibraryIndex index(folder_.path());
+      index.Add({{.name = "body", .value = "word"}});
+      index.Commit();
+      CopyFolder(folder_.path(), before.path());
+      index.Add({{.name = "body", .value = "word"}});
+    }
+    for (const std::string& name : ListFolder(folder_.path())) {
+      if (name.starts_with("segments_")) newest_ = folder_ / name;
+    }
+    for (const std::string& name : ListFolder(before.path())) {
+      if (name.starts_with("segments_")) WriteFile(folder_ / name, ReadFile(before / name));
+    }
+    fs::permissions(folder_.path(), fs::perms::all);
+    for (const auto& file : fs::directory_iterator(folder_.path())) fs::permissions(file, fs::perms::all);
+  }
+
+  // How many documents a reader finds, and which error it meets else.
+  std::wstring CountDocuments() const {
+    return Told([&] { return std::to_wstring(CheckedReader(folder_.path()).reader()->numDocs()); });
+  }
+
+  TemporaryFolder folder_;
+  std::string newest_;
+};
+
+TEST_F(TwoCommitsTest, TheOlderIsReadWhereTheNewestIsIncompleteOrZeros) {
+  EXPECT_EQ(CountDocuments(), L"2");
+  const std::string whole = ReadFile(newest_);
+  WriteFile(newest_, std::string(whole.size(), '\0'));
+  EXPECT_EQ(CountDocuments(), L"1");
+  WriteFile(newest_, whole.substr(0, 10));
+  EXPECT_EQ(CountDocuments(), L"1");
+}
+
+TEST_F(TwoCommitsTest, TheOlderIsNotReadWhereTheSystemRefusesTheNewest) {
+  fs::permissions(newest_, fs::perms::none);
+  const WithoutRights rights;
+  EXPECT_EQ(CountDocuments(), L"error: " + StringUtils::toUnicode(newest_));
+}
+
+TEST_F(TwoCommitsTest, TheOlderIsNotReadWhereThereAreTooFewDescriptors) {
+  if (kIsSanitized) GTEST_SKIP() << kSanitizerNeedsDescriptors;
+  int refusals = 0;
+  for (std::wstring told; told != L"2"; ++refusals) {
+    ASSERT_LT(refusals, 100) << "not even with as many descriptors";
+    const FewOpenFiles few(CountOpenFiles() + static_cast<rlim_t>(refusals));
+    told = CountDocuments();
+    EXPECT_NE(told, L"1") << "with " << refusals << " descriptors";
+  }
+  EXPECT_GT(refusals, 3);
 }
 
 }  // namespace

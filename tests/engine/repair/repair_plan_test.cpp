@@ -97,6 +97,31 @@ TEST_F(RepairPlanTest, IsRefusedWhereTheCommitCannotBeRead) {
   EXPECT_THROW(PlanRepair(path_), IndexError);
 }
 
+// The index library takes zeros for an empty index of its oldest layout, and a negative length for a huge one.
+TEST_F(RepairPlanTest, IsOfTheCommitBeforeWhereTheNewestIsNone) {
+  index_.reset();
+  const int64_t generation = Index::Open(path_)->Statistics().generation;
+  const std::string commit = ReadFile(File("segments_" + std::to_string(generation)));
+  std::filesystem::remove(File("_1.frq"));
+  std::string negative_length = commit;
+  negative_length.replace(20, 5, ByteWriter().VInt(-1).bytes());
+  for (const std::string& newest : {std::string(commit.size(), '\0'), negative_length}) {
+    WriteFile(File("segments_" + std::to_string(generation + 1)), newest);
+    const RepairReport report = PlanRepair(path_);
+    EXPECT_EQ(report.generation, generation);
+    EXPECT_THAT(report.losses, ElementsAre(Loss{.segment = "_1", .documents = 9}));
+  }
+}
+
+TEST_F(RepairPlanTest, IsRefusedAtOnceWhereTheCommitNamesASegmentOften) {
+  index_.reset();
+  constexpr int kSegments = 65'536;
+  ByteWriter commit = ByteWriter().Int(-1).Long(1).Int(kSegments).Int(kSegments);
+  for (int i = 0; i < kSegments; ++i) commit.String("_0").Int(10);
+  WriteFile(File("segments_z"), commit.bytes());
+  EXPECT_THROW(PlanRepair(path_), IndexDamagedError);
+}
+
 TEST_F(RepairPlanTest, IsRefusedWhereThereIsNoIndex) {
   EXPECT_THROW(PlanRepair(folder_ / "nowhere"), IndexError);
   EXPECT_THROW(PlanRepair(folder_.path()), IndexError);

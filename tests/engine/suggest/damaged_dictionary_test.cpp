@@ -7,6 +7,7 @@
 #include "support/expect_damage.h"
 #include "support/files.h"
 #include "support/random_index.h"
+#include "support/sanitized.h"
 #include "support/temporary_folder.h"
 #include "vantrel/elastic/index_error.h"
 #include "vantrel/elastic/suggest_terms.h"
@@ -172,7 +173,7 @@ TEST(DamagedDictionaryTest, AnyByteEndsInSuggestionsOrAnErrorThatNamesTheFile) {
         {.seed = 5, .documents = 60, .deletions = 20, .compound = compound, .term_index_interval = 4});
     for (const std::string& name : ListFolder(folder.path())) {
       const std::string bytes = ReadFile(folder / name);
-      for (int i = 0; i < 150 && !bytes.empty(); ++i) {
+      for (int i = 0; i < 150 / ::quorelastic::testing::kFewer && !bytes.empty(); ++i) {
         std::string damaged = bytes;
         damaged[random() % bytes.size()] = static_cast<char>(random());
         // As a new file, which is quicker: some file systems flush one that is rewritten.
@@ -190,7 +191,7 @@ TEST(DamagedDictionaryTest, AnyByteEndsInSuggestionsOrAnErrorThatNamesTheFile) {
       WriteFile(folder / name, bytes);
     }
   }
-  EXPECT_GT(errors, 100) << "hardly a damage was seen";
+  EXPECT_GT(errors, 100 / ::quorelastic::testing::kFewer) << "hardly a damage was seen";
 }
 
 }  // namespace

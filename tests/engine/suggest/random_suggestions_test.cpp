@@ -7,6 +7,7 @@
 
 #include "engine/suggest/library_suggestions.h"
 #include "support/random_index.h"
+#include "support/sanitized.h"
 #include "support/temporary_folder.h"
 #include "vantrel/elastic/suggest_terms.h"
 
@@ -57,7 +58,8 @@ class RandomSuggestionsTest : public ::testing::TestWithParam<uint32_t> {
   LibraryFrequencies frequencies_;
 };
 
-INSTANTIATE_TEST_SUITE_P(Seeds, RandomSuggestionsTest, ::testing::Range(0U, 30U));
+INSTANTIATE_TEST_SUITE_P(Seeds, RandomSuggestionsTest,
+                         ::testing::Range(0U, 30U / ::quorelastic::testing::kFewer));
 
 TEST_P(RandomSuggestionsTest, AreThoseOfBruteForce) {
   std::vector<std::string> fields = {"", "absent", "\xff"};

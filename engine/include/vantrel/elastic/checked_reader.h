@@ -1,12 +1,11 @@
 #pragma once
 
-#include <lucene++/Lucene.h>
-
 #include <cstdint>
 #include <memory>
 #include <string>
 
 #include "vantrel/elastic/export.h"
+#include "vantrel/elastic/library_types.h"
 
 namespace vantrel::elastic {
 
@@ -32,7 +31,8 @@ class VANTREL_ELASTIC_EXPORT CheckedReader {
   const Lucene::IndexReaderPtr& reader() const { return reader_; }
 
   // The positions of the term, to be moved with skipTo(document) at once and read for the document reached, but no
-  // further. `document` is 0 or more.
+  // further. `document` is 0 or more. A reader that was opened for term vectors has no term: it throws
+  // Lucene::IllegalStateException.
   Lucene::TermPositionsPtr Positions(int32_t document) const;
 
   // The term vector of a document's field; empty where there is none, and for a document below 0 or of an index

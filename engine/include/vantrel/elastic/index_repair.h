@@ -31,7 +31,8 @@ struct RepairReport {
 //
 // The checker crashes on some damages. Segments that CheckIndexHealth calls unsafe are therefore tried first, each by
 // the checker in a child process with limits on memory and time. One that the child does not survive counts as bad;
-// the checker itself is kept from its files.
+// the checker itself is kept from its files. Where the checker survives them one by one but not all together, up to 20
+// more trials find out which of them count as bad; where 20 do not suffice, more are dropped than necessary.
 //
 // Takes the index's write lock before it changes anything. To be called where the process has no other thread: it
 // forks. Throws IndexLockedError where somebody has the index open for writing; IndexError and its kinds where there is

@@ -1,7 +1,6 @@
 #pragma once
 
 #include <json/value.h>
-#include <lucene++/LuceneHeaders.h>
 
 #include <cstdint>
 #include <map>
@@ -11,6 +10,7 @@
 
 #include "vantrel/elastic/export.h"
 #include "vantrel/elastic/index_settings.h"
+#include "vantrel/elastic/library_types.h"
 
 namespace vantrel::elastic {
 

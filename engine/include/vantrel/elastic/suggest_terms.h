@@ -16,7 +16,8 @@ struct SuggestRequest {
   uint64_t skip = 0;   // the best ones passed over
   uint64_t limit = 10;
 
-  // When it gives up, counted from its begin; 0 is never.
+  // When it gives up, counted from its beginning; 0 is never. The clock is looked at each time that bytes are read, at
+  // least every 256 KiB, from whichever file.
   std::chrono::milliseconds time_limit{0};
 };
 

@@ -1,11 +1,10 @@
 #pragma once
 
-#include <lucene++/Lucene.h>
-
 #include <memory>
 #include <string>
 
 #include "vantrel/elastic/export.h"
+#include "vantrel/elastic/library_types.h"
 
 namespace vantrel::elastic {
 
@@ -27,11 +26,6 @@ class VANTREL_ELASTIC_EXPORT TermDict {
   // How many terms the cursor walks from first to last. Where only live terms are walked and the segment has
   // deleted documents, the first call reads the whole dictionary; otherwise the number stands in its header.
   int GetTermsCount() const;
-
-  // To be called before the first Next(), if at all: the walk then begins not at the first term, but at one close
-  // before the place of the term of this field and text, both UTF-8, by the index over the dictionary; in the older
-  // layouts of index files, whose order is another, at the first one still. What GetTermsCount() counts stays.
-  void StartNear(const std::string& field, const std::string& text);
 
   // Moves to the next term, at first to the first one; false when there is none.
   bool Next();

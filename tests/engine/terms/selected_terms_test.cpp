@@ -1,4 +1,4 @@
-#include "elastic/suggest/prefix_walk.h"
+#include "elastic/terms/selected_terms.h"
 
 #include <gtest/gtest.h>
 
@@ -27,7 +27,14 @@ std::map<std::string, int> OpenFilesByEnding(const std::string& folder) {
   return counts;
 }
 
-TEST(PrefixWalkTest, HoldsOnlyTheFilesOpenThatItStillReads) {
+bool StepsToATerm(SelectedTerms& terms) {
+  while (true) {
+    const SelectedTerms::Move move = terms.Step();
+    if (move != SelectedTerms::Move::kPassedOver) return move == SelectedTerms::Move::kTerm;
+  }
+}
+
+TEST(SelectedTermsTest, HoldsOnlyTheFilesOpenThatItStillReads) {
   constexpr int kSegments = 4;
   const TemporaryFolder folder;
   {
@@ -41,21 +48,22 @@ TEST(PrefixWalkTest, HoldsOnlyTheFilesOpenThatItStillReads) {
     index.Delete("id", "0");
     index.Commit();
   }
-  Deadline deadline(std::chrono::milliseconds(0));
-  std::vector<std::unique_ptr<PrefixWalk>> walks;
+  std::vector<std::unique_ptr<SelectedTerms>> walks;
   for (auto& files : format::OpenNewestSegments(format::DiskFolder(folder.path()), format::Need::kAll)) {
-    walks.push_back(std::make_unique<PrefixWalk>(std::move(files), "body", "te", deadline));
+    walks.push_back(std::make_unique<SelectedTerms>(std::move(files),
+                                                    format::TermSelection{.field = "body", .text = "te"}));
   }
   ASSERT_EQ(walks.size(), static_cast<size_t>(kSegments));
   const std::map<std::string, int> expected = {{".tis", kSegments}, {".frq", 1}, {".del", 1}};
   EXPECT_EQ(OpenFilesByEnding(folder.path()), expected);
   for (const auto& walk : walks) {
-    EXPECT_TRUE(walk->Next());
-    EXPECT_EQ(walk->text(), "tea");
-    EXPECT_TRUE(walk->IsLive());
-    EXPECT_TRUE(walk->Next());
-    EXPECT_FALSE(walk->Next());
-    EXPECT_FALSE(walk->Next());
+    ASSERT_TRUE(StepsToATerm(*walk));
+    const format::TermCursor& cursor = walk->walk().cursor();
+    EXPECT_EQ(cursor.text(), "tea");
+    EXPECT_TRUE(walk->IsLive(cursor.info(), cursor.field()));
+    EXPECT_TRUE(StepsToATerm(*walk));
+    EXPECT_FALSE(StepsToATerm(*walk));
+    EXPECT_FALSE(StepsToATerm(*walk));
   }
   walks.clear();
   EXPECT_TRUE(OpenFilesByEnding(folder.path()).empty());

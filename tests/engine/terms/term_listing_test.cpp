@@ -1,4 +1,4 @@
-#include "commands/merged_terms.h"
+#include "vantrel/elastic/term_listing.h"
 
 #include <gmock/gmock.h>
 #include <gtest/gtest.h>
@@ -9,29 +9,27 @@
 #include "support/temporary_folder.h"
 #include "vantrel/elastic/index.h"
 
-namespace quorelasticd {
+namespace vantrel::elastic {
 namespace {
 
-using quorelastic::testing::TemporaryFolder;
+using ::quorelastic::testing::TemporaryFolder;
 using ::testing::ElementsAre;
-using vantrel::elastic::Index;
-using vantrel::elastic::IndexSettings;
 
-std::string Number(int number) {
+std::string Padded(int number) {
   const std::string digits = std::to_string(number);
   return std::string(5 - digits.size(), '0').append(digits);
 }
 
 // Three segments with thousands of terms in each of three fields.
-class MergedTermsTest : public ::testing::Test {
+class TermListingTest : public ::testing::Test {
  protected:
-  MergedTermsTest() {
+  TermListingTest() {
     IndexSettings settings;
     settings.fields = {{.name = "a"}, {.name = "b"}, {.name = "c"}};
     const auto index = Index::Create(path(), settings);
     for (int segment = 0; segment < 3; ++segment) {
       std::string words;
-      for (int i = segment; i < 9000; i += 3) words += " w" + Number(i);
+      for (int i = segment; i < 9000; i += 3) words += " w" + Padded(i);
       index->Add(
           {{{"id", std::to_string(segment)}, {"a", words}, {"b", words + " ünder zoo"}, {"c", words}}});
       index->Commit();
@@ -45,17 +43,17 @@ class MergedTermsTest : public ::testing::Test {
     std::vector<std::string> terms;
     int passed_over = 0;
   };
-  Walk WalkOver(TermSelection selection) const {
+  Walk WalkOver(const TermListingRequest& request) const {
     Walk walk;
-    MergedTerms terms(path(), false, std::move(selection));
+    TermListing terms(path(), request);
     for (;;) {
       switch (terms.Next()) {
-        case MergedTerms::Move::kEnd:
+        case TermListing::Move::kEnd:
           return walk;
-        case MergedTerms::Move::kPassedOver:
+        case TermListing::Move::kPassedOver:
           ++walk.passed_over;
           break;
-        case MergedTerms::Move::kTerm:
+        case TermListing::Move::kTerm:
           walk.terms.push_back(terms.field() + ":" + terms.text());
       }
     }
@@ -65,8 +63,9 @@ class MergedTermsTest : public ::testing::Test {
   TemporaryFolder folder_;
 };
 
-TEST_F(MergedTermsTest, AreFoundWithoutAWalkOverThoseBefore) {
-  constexpr int kPassed = 3 * 128 + 10;  // as many in each segment as stand between two entries of its index
+TEST_F(TermListingTest, AreFoundWithoutAWalkOverThoseBefore) {
+  // In each segment, as many as stand between two entries of its index, and some such blocks that are only checked.
+  constexpr int kPassed = 3 * 8 * 128;
   const Walk few = WalkOver({"b", "w0815"});
   EXPECT_THAT(few.terms, ElementsAre("b:w08150", "b:w08151", "b:w08152", "b:w08153", "b:w08154", "b:w08155",
                                      "b:w08156", "b:w08157", "b:w08158", "b:w08159"));
@@ -81,7 +80,7 @@ TEST_F(MergedTermsTest, AreFoundWithoutAWalkOverThoseBefore) {
   EXPECT_LT(last.passed_over, kPassed);
 }
 
-TEST_F(MergedTermsTest, AreTheSameWhereverTheWalkBegins) {
+TEST_F(TermListingTest, AreTheSameWhereverTheWalkBegins) {
   const Walk all = WalkOver({});
   EXPECT_EQ(all.terms.size(), 3U * 9000 + 2 + 3);
   for (const std::string& field : {std::string("a"), std::string("b"), std::string("c"), std::string("id")}) {
@@ -97,4 +96,4 @@ TEST_F(MergedTermsTest, AreTheSameWhereverTheWalkBegins) {
 }
 
 }  // namespace
-}  // namespace quorelasticd
+}  // namespace vantrel::elastic

@@ -1,0 +1,1 @@
+// What is precompiled has to belong to a target with a source.

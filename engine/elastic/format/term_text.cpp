@@ -1,0 +1,158 @@
+#include "elastic/format/term_text.h"
+
+#include <algorithm>
+#include <span>
+
+#include "elastic/format/text.h"
+#include "elastic/format/utf16_text.h"
+
+namespace vantrel::elastic::format {
+namespace {
+
+// The place of a UTF-16 code unit in the order of code points: surrogates, which stand for what lies beyond 16 bits,
+// behind all others.
+uint32_t CodePointRank(char16_t unit) {
+  if (unit < 0xd800) return unit;
+  return unit >= 0xe000 ? unit - 0x800U : unit + 0x2000U;
+}
+
+// By which orders `left` comes before `right`; they have the first `same` units in common, and there they differ.
+TermOrders UnitOrdersBefore(std::u16string_view left, std::u16string_view right, size_t same) {
+  if (same == right.size()) return 0;
+  if (same == left.size()) return kByBoth;
+  return static_cast<TermOrders>(
+      (CodePointRank(left[same]) < CodePointRank(right[same]) ? kByCodePoints : 0) |
+      (left[same] < right[same] ? kByUtf16 : 0));
+}
+
+}  // namespace
+
+RawText RawText::From(size_t length) const {
+  return {bytes.substr(std::min(length, bytes.size())), units.substr(std::min(length, units.size()))};
+}
+
+void RawText::Prepend(const RawText& text, size_t length) {
+  bytes.insert(0, text.bytes, 0, length);
+  units.insert(0, text.units, 0, length);
+}
+
+void TermText::Grow(size_t length) { bytes_.resize(std::max(2 * bytes_.size(), length + kSlack)); }
+
+void TermText::Read(ByteReader& reader, uint64_t start) {
+  is_utf8_ ? ReadUtf8(reader, start) : ReadUnits(reader, start);
+}
+
+void TermText::ReadUtf8(ByteReader& reader, uint64_t start) {
+  const uint32_t prefix = reader.ReadVInt();
+  const uint32_t suffix = reader.ReadVInt();
+  if (prefix > length_) {
+    reader.Damaged(start,
+                   "term shares " + std::to_string(prefix) + " bytes with one of " + std::to_string(length_));
+  }
+  const size_t length = size_t{prefix} + suffix;
+  if (length > kLongestTerm) {
+    reader.Damaged(start, "term of " + std::to_string(length) + " bytes is too long");
+  }
+  converted_.resize(suffix + kSlack);
+  const std::span bytes(reinterpret_cast<uint8_t*>(converted_.data()), suffix);
+  reader.ReadBytes(bytes);
+  TakeNext(prefix, bytes.data(), suffix);
+}
+
+void TermText::CompareOn(size_t same, const uint8_t* suffix, uint32_t length) {
+  const std::string_view before = text().substr(same);
+  const std::string_view next(reinterpret_cast<const char*>(suffix), length);
+  const size_t also_same = SameLength(before, next);
+  same_length_ += also_same;
+  ascends_by_ = OrdersBefore(before, next, also_same);
+}
+
+void TermText::ReadUnits(ByteReader& reader, uint64_t start) {
+  const uint32_t prefix = reader.ReadVInt();
+  const uint32_t suffix = reader.ReadVInt();
+  if (prefix > units_.size()) {
+    reader.Damaged(start, "term shares " + std::to_string(prefix) + " characters with one of " +
+                              std::to_string(units_.size()));
+  }
+  if (size_t{prefix} + suffix > kLongestText) {
+    reader.Damaged(reader.offset(),
+                   "text of " + std::to_string(size_t{prefix} + suffix) + " characters is too long");
+  }
+  shared_length_ = prefix;
+  next_units_.clear();
+  ReadUtf16Units(reader, suffix, next_units_);
+  TakeUnits(prefix);
+}
+
+// The text goes on with next_units_ behind its first `prefix` units.
+void TermText::TakeUnits(size_t prefix) {
+  const std::u16string_view before = std::u16string_view(units_).substr(prefix);
+  const auto [left, right] =
+      std::mismatch(before.begin(), before.end(), next_units_.begin(), next_units_.end());
+  const auto also_same = static_cast<size_t>(left - before.begin());
+  ascends_by_ = UnitOrdersBefore(before, next_units_, also_same);
+  // What is converted again begins with a whole character in both texts: it may take in half a pair of surrogates.
+  size_t same = prefix + also_same;
+  size_t converted = units_.size();
+  if (same > 0 && IsHighSurrogate(units_[same - 1])) --same;
+  while (converted > same) {
+    length_ = CharacterStart(length_ - 1);
+    // A character of four bytes was two units.
+    converted -= static_cast<unsigned char>(bytes_[length_]) >= 0xf0 ? 2U : 1U;
+  }
+  same_length_ = length_;
+  ForgetFrom(length_);
+  units_.resize(prefix);
+  units_.append(next_units_);
+  AppendConverted(std::u16string_view(units_).substr(same));
+}
+
+void TermText::AppendConverted(std::u16string_view units) {
+  converted_.clear();
+  AppendUtf16(units, converted_);
+  Reserve(length_ + converted_.size());
+  std::copy(converted_.begin(), converted_.end(), bytes_.begin() + static_cast<ptrdiff_t>(length_));
+  length_ += converted_.size();
+}
+
+bool TermText::IsValid() {
+  if (valid_length_ < length_) valid_length_ += WellFormedLength(text().substr(valid_length_));
+  return valid_length_ == length_;
+}
+
+bool TermText::IsKept() {
+  if (!IsValid()) return false;
+  if (kept_length_ < length_) kept_length_ += KeptLength(text().substr(kept_length_));
+  return kept_length_ == length_;
+}
+
+void TermText::Clear() {
+  length_ = shared_length_ = 0;
+  same_length_ = valid_length_ = kept_length_ = 0;
+  ascends_by_ = 0;
+  units_.clear();
+}
+
+void TermText::Assign(const RawText& text) {
+  Clear();
+  if (is_utf8_) {
+    Reserve(text.bytes.size());
+    std::copy(text.bytes.begin(), text.bytes.end(), bytes_.begin());
+    length_ = text.bytes.size();
+  } else {
+    units_ = text.units;
+    AppendConverted(units_);
+  }
+}
+
+void TermText::UpdateCopy(RawText& copy) const {
+  if (is_utf8_) {
+    copy.bytes.resize(shared_length_);
+    copy.bytes.append(text().substr(shared_length_));
+  } else {
+    copy.units.resize(shared_length_);
+    copy.units.append(units_, shared_length_);
+  }
+}
+
+}  // namespace vantrel::elastic::format

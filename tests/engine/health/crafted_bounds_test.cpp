@@ -1,0 +1,169 @@
+// Files that are small on disk and announce more than any machine has: every action must end soon and in little memory.
+
+#include <gmock/gmock.h>
+#include <gtest/gtest.h>
+#include <sys/wait.h>
+#include <zlib.h>
+
+#include <csignal>
+#include <cstdint>
+#include <filesystem>
+#include <string>
+#include <vector>
+
+#include "damage/limited_run.h"
+#include "support/byte_writer.h"
+#include "support/files.h"
+#include "support/sanitized.h"
+#include "support/small_index.h"
+#include "support/sparse_file.h"
+#include "support/temporary_folder.h"
+#include "vantrel/elastic/index_health.h"
+
+namespace quorelastic::testing {
+namespace {
+
+using ::testing::ElementsAre;
+using ::testing::Field;
+using ::testing::HasSubstr;
+using vantrel::elastic::CheckIndexHealth;
+using vantrel::elastic::HealthFinding;
+
+constexpr int64_t kMebibyte = int64_t{1} << 20;
+constexpr int64_t kMostOfCheck = 64 * kMebibyte;
+constexpr int64_t kMostOfOthers = 128 * kMebibyte;
+
+class CraftedBoundsTest : public ::testing::Test {
+ protected:
+  const std::string& path() const { return folder_.path(); }
+
+  // Adds field names, all different and with a hole in each, to the field that is there.
+  void AddFieldNames(const std::string& file, int names, int64_t longest) const {
+    std::string bytes = ReadFile(folder_ / file);
+    ASSERT_EQ(bytes.substr(5, 6),
+              "\x01\x04"
+              "body");
+    SparseFile out(folder_ / file);
+    out.Bytes(ByteWriter().VInt(-2).VInt(names + 1).Raw(bytes.substr(6)).bytes());
+    for (int number = 1; number <= names; ++number) {
+      const std::string start = std::to_string(number);
+      const auto rest = static_cast<uint64_t>(longest) - start.size();
+      out.Bytes(ByteWriter().VInt(longest).Raw(start).bytes()).Hole(rest + 1);  // with the flags
+    }
+    out.Close();
+  }
+
+  // The only segment, so many times.
+  void Multiply(int segments) const {
+    ByteWriter commit;
+    constexpr int kNextNumber = 100'000;  // names are counted in base 36
+    commit.Int(-4).Long(1).Int(kNextNumber).Int(segments);
+    for (int number = 0; number < segments; ++number) {
+      const std::string name = "_" + std::to_string(number);
+      commit.String(name).Int(3);
+      commit.Long(-1).Int(-1).Byte(1).Int(-1).Byte(-1);  // nothing deleted, nothing shared, no compound file
+    }
+    for (const std::string& name : ListFolder(path())) {
+      if (name.starts_with("segments") || name.ends_with(".del")) {
+        std::filesystem::remove(folder_ / name);
+        continue;
+      }
+      if (!name.starts_with("_0.")) continue;
+      for (int number = 1; number < segments; ++number) {
+        std::filesystem::create_hard_link(folder_ / name,
+                                          folder_ / ("_" + std::to_string(number) + name.substr(2)));
+      }
+    }
+    WriteFile(folder_ / "segments_1", commit.bytes());
+  }
+
+  // 8 MiB of compressed values in the first document, which become 8 GiB.
+  void WriteInflatingValues() const {
+    constexpr size_t kValueSize = 16 * kMebibyte;
+    constexpr int kValues = 512;
+    const std::string text(kValueSize, 'x');
+    std::string value(compressBound(kValueSize), '\0');
+    uLongf length = value.size();
+    ASSERT_EQ(compress2(reinterpret_cast<Bytef*>(value.data()), &length,
+                        reinterpret_cast<const Bytef*>(text.data()), text.size(), 9),
+              Z_OK);
+    value.resize(length);
+    ByteWriter records;
+    records.Int(1).VInt(kValues);
+    for (int left = kValues; left > 0; --left) records.VInt(0).Byte(4).String(value);
+    const auto second = static_cast<int64_t>(records.size());
+    records.VInt(0).VInt(0);
+    WriteFile(folder_ / "_0.fdt", records.bytes());
+    WriteFile(folder_ / "_0.fdx", ByteWriter().Int(1).Long(4).Long(second).Long(second + 1).bytes());
+  }
+
+  // The check and every lookup; `verdict` is what the check prints.
+  void ExpectLittleMemory(const std::string& verdict) const {
+    const LimitedRun check = Run("check", kMostOfCheck);
+    EXPECT_EQ(check.errors, verdict + "\n");
+    for (const char* action : {"allterm", "term", "position", "doc_term", "term_suggest"})
+      Run(action, kMostOfOthers);
+  }
+
+  LimitedRun Run(const std::string& action, int64_t most) const {
+    const LimitedRun run =
+        RunToolLimited({"-a", action, "-d", path(), "-f", "body", "-t", "beta", "-n", "0"});
+    // An error that an action does not catch ends it in SIGABRT, after it has said which.
+    EXPECT_TRUE(WIFEXITED(run.status) ||
+                (WTERMSIG(run.status) == SIGABRT && run.errors.find("what():") != std::string::npos))
+        << action << " ends in signal " << WTERMSIG(run.status) << ": " << run.errors;
+    EXPECT_THAT(run.output + run.errors, ::testing::Not(HasSubstr("bad_alloc"))) << action;
+    if (!kIsSanitized) {
+      EXPECT_LT(run.peak_bytes, most) << action;
+    }
+    return run;
+  }
+
+  void ExpectFinding(const std::string& file, const std::string& found) const {
+    EXPECT_THAT(CheckIndexHealth(path()).findings,
+                ElementsAre(::testing::AllOf(Field(&HealthFinding::file, HasSubstr(file)),
+                                             Field(&HealthFinding::found, HasSubstr(found)))));
+  }
+
+  TemporaryFolder folder_;
+};
+
+TEST_F(CraftedBoundsTest, FieldNamesOfGigabytesTakeLittle) {
+  WriteSmallIndex(path(), false);
+  AddFieldNames("_0.fnm", 8192, kMebibyte);
+  ExpectLittleMemory("NOT clean");
+  ExpectFinding("_0.fnm", "bytes is too long");
+}
+
+TEST_F(CraftedBoundsTest, SubFileNamesOfGigabytesTakeLittle) {
+  WriteSmallIndex(path(), true);
+  constexpr int kNames = 8192;
+  constexpr int64_t kBegin = kNames * kMebibyte;
+  SparseFile out(folder_ / "_0.cfs");
+  out.Bytes(ByteWriter().VInt(kNames).bytes());
+  for (int number = 1; number <= kNames; ++number) {
+    // The offset, and what the length and the name take.
+    out.Bytes(ByteWriter().Long(kBegin + 32 * kNames).VInt(kMebibyte - number).bytes());
+    out.Hole(static_cast<uint64_t>(kMebibyte - number));
+  }
+  out.Hole(64 * kMebibyte).Close();
+  ExpectLittleMemory("NOT clean");
+  ExpectFinding("_0.cfs", "bytes is too long");
+}
+
+TEST_F(CraftedBoundsTest, FieldNamesOfManySegmentsTakeLittle) {
+  WriteSmallIndex(path(), false);
+  AddFieldNames("_0.fnm", 500, 4096);
+  Multiply(60);
+  ExpectLittleMemory("clean");
+}
+
+TEST_F(CraftedBoundsTest, StoredValuesThatInflateToGigabytesTakeLittle) {
+  WriteSmallIndex(path(), false);
+  ASSERT_NO_FATAL_FAILURE(WriteInflatingValues());
+  ExpectLittleMemory("NOT clean");
+  ExpectFinding("_0.fdt", "inflate to more than 32 times their size");
+}
+
+}  // namespace
+}  // namespace quorelastic::testing
