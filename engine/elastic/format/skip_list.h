@@ -45,7 +45,10 @@ class SkipListReader {
     uint64_t end = 0;    // of the entry without `child`, from the beginning of its level
   };
 
-  SkipListReader(std::shared_ptr<const ByteSource> source, int32_t skip_interval, int32_t most_levels);
+  static constexpr size_t kSkipBufferSize = 4096;
+
+  SkipListReader(std::shared_ptr<const ByteSource> source, int32_t skip_interval, int32_t most_levels,
+                 size_t buffer_size = kSkipBufferSize);
 
   // Moves before the first entry of each level of a term. Throws IndexDamagedError, IndexIoError, as does Next().
   void Seek(uint64_t pointer, int32_t document_frequency, bool has_payloads);
@@ -103,6 +106,7 @@ class SkipListReader {
   std::shared_ptr<const ByteSource> source_;
   int32_t skip_interval_;
   int32_t most_levels_;
+  size_t buffer_size_;  // of each level
   bool has_payloads_ = false;
   int32_t document_frequency_ = 0;
   int level_count_ = 0;

@@ -9,7 +9,8 @@
 namespace vantrel::elastic::health {
 namespace {
 
-constexpr size_t kBufferSize = size_t{128} << 10;
+constexpr size_t kPostingsBufferSize = size_t{128} << 10;
+constexpr size_t kSkipsBufferSize = size_t{16} << 10;
 
 // The usual size of a skip entry with its share of higher levels. Longer skip data are read by themselves.
 constexpr size_t kUsualSkipEntry = 8;
@@ -19,11 +20,11 @@ constexpr size_t kUsualSkipEntry = 8;
 PostingsCheck::PostingsCheck(const std::shared_ptr<const format::ByteSource>& postings,
                              std::shared_ptr<const format::ByteSource> positions, int32_t document_count,
                              const format::TermCursor& dictionary)
-    : postings_(postings, document_count, kBufferSize),
-      skips_(postings, dictionary.skip_interval(), dictionary.most_skip_levels()),
+    : postings_(postings, document_count, kPostingsBufferSize),
+      skips_(postings, dictionary.skip_interval(), dictionary.most_skip_levels(), kSkipsBufferSize),
       skip_interval_(dictionary.skip_interval()),
       reads_skips_(dictionary.format() <= format::kFormatWithSkipLists) {
-  if (positions != nullptr) positions_.emplace(std::move(positions), kBufferSize);
+  if (positions != nullptr) positions_.emplace(std::move(positions), kPostingsBufferSize);
 }
 
 void PostingsCheck::Check(const format::TermCursor& dictionary, const format::FieldInfo& field) {
@@ -47,7 +48,7 @@ void PostingsCheck::SeekSkips(const format::TermInfo& term, bool has_payloads) {
   const uint64_t pointer = term.postings_pointer + term.skip_offset;
   const auto entries = static_cast<uint64_t>(term.document_frequency / skip_interval_);
   const uint64_t length = term.skip_offset + entries * kUsualSkipEntry + format::kScanStep;
-  if (length > kBufferSize) return skips_.Seek(pointer, term.document_frequency, has_payloads);
+  if (length > kPostingsBufferSize) return skips_.Seek(pointer, term.document_frequency, has_payloads);
   postings_.ReadAhead(length);
   // Noted first: what throws leaves readers that have borrowed.
   borrowed_fill_ = postings_.reader().fills();
