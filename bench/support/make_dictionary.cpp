@@ -104,8 +104,8 @@ void Write(const std::string& folder, const std::string& dictionary, uint64_t wa
     if (entry.offset > texts.size()) throw std::runtime_error(dictionary + ": an entry lies past the texts");
   }
   const auto writer = newLucene<Lucene::IndexWriter>(
-      Lucene::FSDirectory::open(StringUtils::toUnicode(folder)), newLucene<Lucene::WhitespaceAnalyzer>(), true,
-      Lucene::IndexWriter::MaxFieldLengthUNLIMITED);
+      Lucene::FSDirectory::open(StringUtils::toUnicode(folder)), newLucene<Lucene::WhitespaceAnalyzer>(),
+      true, Lucene::IndexWriter::MaxFieldLengthUNLIMITED);
   writer->setMergeScheduler(newLucene<Lucene::SerialMergeScheduler>());
   writer->setUseCompoundFile(false);
   writer->setRAMBufferSizeMB(128);

@@ -96,7 +96,8 @@ constexpr int32_t kDocuments = 1 << 30;
 
 // Checks all terms, the ones behind a damaged one too. Returns what is said of each, where it is not empty.
 std::vector<std::string> CheckAll(const TermFiles& files, const std::string& postings) {
-  format::TermCursor cursor(SourceOf(files.dictionary()), format::TermCursor::File::kDictionary, 1, kDocuments);
+  format::TermCursor cursor(SourceOf(files.dictionary()), format::TermCursor::File::kDictionary, 1,
+                            kDocuments);
   PostingsCheck check(SourceOf(postings), SourceOf(files.positions()), kDocuments, cursor);
   format::FieldInfo field;
   field.indexed = true;
@@ -142,7 +143,8 @@ TEST(PostingsCheckTest, FindsWrongSkipDataOfEachTerm) {
     // The length of the highest level, and a number of an entry.
     for (const size_t place : {size_t{0}, size_t{2}}) {
       std::string postings = files.postings();
-      postings[files.skip_data(term) + place] = static_cast<char>(postings[files.skip_data(term) + place] ^ 1);
+      postings[files.skip_data(term) + place] =
+          static_cast<char>(postings[files.skip_data(term) + place] ^ 1);
       const std::vector<std::string> problems = CheckAll(files, postings);
       ASSERT_EQ(problems.size(), 4U);
       for (size_t i = 0; i < 4; ++i) EXPECT_EQ(problems[i] == "", i != term) << i << ": " << problems[i];
