@@ -1,10 +1,10 @@
-#include "elastic/format/commit.h"
+#include "elastic/format/commit/commit.h"
 
 #include <cstdint>
 #include <set>
 #include <string>
 
-#include "elastic/format/file_names.h"
+#include "elastic/format/commit/file_names.h"
 #include "fuzz_input.h"
 
 using namespace vantrel::elastic::format;

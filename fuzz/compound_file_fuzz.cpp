@@ -1,4 +1,4 @@
-#include "elastic/format/compound_file.h"
+#include "elastic/format/segment/compound_file.h"
 
 #include <vector>
 

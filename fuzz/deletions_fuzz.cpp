@@ -1,4 +1,4 @@
-#include "elastic/format/deletions.h"
+#include "elastic/format/segment/deletions.h"
 
 #include "fuzz_input.h"
 

@@ -1,10 +1,11 @@
-#include "elastic/format/field_infos.h"
+#include "elastic/format/segment/field_infos.h"
 
-#include "elastic/format/text.h"
+#include "elastic/common/text.h"
 #include "fuzz_input.h"
 
 using namespace vantrel::elastic::format;
 using quorelastic::fuzz::Require;
+using vantrel::elastic::IsValidUtf8;
 
 // The file as it is.
 extern "C" int LLVMFuzzerTestOneInput(const uint8_t* data, size_t size) {

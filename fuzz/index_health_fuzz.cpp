@@ -1,4 +1,4 @@
-#include "elastic/health/index_check.h"
+#include "elastic/check/index_check.h"
 #include "fuzz_input.h"
 
 using quorelastic::fuzz::Require;
@@ -10,7 +10,7 @@ extern "C" int LLVMFuzzerTestOneInput(const uint8_t* data, size_t size) {
   quorelastic::fuzz::FuzzInput input(data, size);
   quorelastic::testing::MemoryFolder folder;
   input.TakeFiles(folder);
-  const HealthReport report = vantrel::elastic::health::CheckFolder(folder, {.threads = 1});
+  const HealthReport report = vantrel::elastic::check::CheckFolder(folder, {.threads = 1});
   for (const HealthFinding& finding : report.findings) {
     Require(finding.file.starts_with("memory"), "a finding names a file of the folder");
     Require(!finding.expected.empty() && !finding.found.empty(), "a finding tells what is wrong");

@@ -1,16 +1,16 @@
-#include "elastic/format/file_names.h"
-#include "elastic/reading/opening_check.h"
-#include "elastic/reading/positions_lookup.h"
-#include "elastic/reading/vector_lookup.h"
+#include "elastic/format/commit/file_names.h"
+#include "elastic/lookup/opening_check.h"
+#include "elastic/lookup/positions_lookup.h"
+#include "elastic/lookup/vector_lookup.h"
 #include "fuzz_input.h"
 
 using quorelastic::fuzz::FuzzInput;
 using quorelastic::testing::MemoryFolder;
-using vantrel::elastic::reading::CheckPositionsLookup;
-using vantrel::elastic::reading::CheckVectorLookup;
-using vantrel::elastic::reading::OpenedSegment;
-using vantrel::elastic::reading::OpeningCheck;
-using vantrel::elastic::reading::WantedTerm;
+using vantrel::elastic::lookup::CheckPositionsLookup;
+using vantrel::elastic::lookup::CheckVectorLookup;
+using vantrel::elastic::lookup::OpenedSegment;
+using vantrel::elastic::lookup::OpeningCheck;
+using vantrel::elastic::lookup::WantedTerm;
 
 namespace {
 

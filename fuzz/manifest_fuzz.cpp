@@ -1,8 +1,8 @@
-#include "elastic/format/manifest.h"
+#include "elastic/manifest/manifest.h"
 
 #include <span>
 
-#include "elastic/format/block_digest.h"
+#include "elastic/manifest/block_digest.h"
 #include "fuzz_input.h"
 
 using namespace vantrel::elastic::format;

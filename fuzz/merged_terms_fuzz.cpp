@@ -3,7 +3,7 @@
 #include <memory>
 #include <vector>
 
-#include "elastic/format/segment_files.h"
+#include "elastic/segment/segment_files.h"
 #include "fuzz_input.h"
 
 using quorelastic::fuzz::FuzzInput;

@@ -1,6 +1,6 @@
-#include "elastic/format/positions.h"
+#include "elastic/format/segment/positions.h"
 
-#include "elastic/format/postings.h"
+#include "elastic/format/segment/postings.h"
 #include "fuzz_input.h"
 
 using namespace vantrel::elastic::format;

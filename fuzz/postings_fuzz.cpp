@@ -1,4 +1,4 @@
-#include "elastic/format/postings.h"
+#include "elastic/format/segment/postings.h"
 
 #include <algorithm>
 #include <utility>

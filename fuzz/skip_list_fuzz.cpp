@@ -1,4 +1,4 @@
-#include "elastic/format/skip_list.h"
+#include "elastic/format/segment/skip_list.h"
 
 #include "fuzz_input.h"
 

@@ -1,4 +1,4 @@
-#include "elastic/format/stored_fields.h"
+#include "elastic/format/segment/stored_fields.h"
 
 #include "fuzz_input.h"
 

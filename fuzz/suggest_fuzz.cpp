@@ -1,6 +1,6 @@
 #include <algorithm>
 
-#include "elastic/format/text.h"
+#include "elastic/common/text.h"
 #include "elastic/suggest/suggest_terms_in.h"
 #include "fuzz_input.h"
 
@@ -35,7 +35,7 @@ extern "C" int LLVMFuzzerTestOneInput(const uint8_t* data, size_t size) {
     Require(suggested.size() <= request.limit, "no more terms are suggested than were asked for");
     for (const SuggestedTerm& term : suggested) {
       Require(term.term.starts_with(prefix), "a suggested term begins with the prefix");
-      Require(vantrel::elastic::format::IsValidUtf8(term.term), "a suggested term is valid UTF-8");
+      Require(vantrel::elastic::IsValidUtf8(term.term), "a suggested term is valid UTF-8");
       Require(term.document_frequency > 0, "a suggested term is in a document");
     }
     const auto unordered = std::adjacent_find(

@@ -1,10 +1,11 @@
-#include "elastic/format/term_cursor.h"
+#include "elastic/format/segment/term_cursor.h"
 
-#include "elastic/format/text.h"
+#include "elastic/common/text.h"
 #include "fuzz_input.h"
 
 using namespace vantrel::elastic::format;
 using quorelastic::fuzz::Require;
+using vantrel::elastic::kLongestText;
 
 namespace {
 

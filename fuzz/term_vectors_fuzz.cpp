@@ -1,4 +1,4 @@
-#include "elastic/format/term_vectors.h"
+#include "elastic/format/segment/term_vectors.h"
 
 #include "fuzz_input.h"
 

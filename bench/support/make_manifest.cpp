@@ -5,9 +5,10 @@
 #include <iostream>
 #include <string>
 
-#include "elastic/format/commit.h"
-#include "elastic/format/folder.h"
-#include "elastic/format/manifest.h"
+#include "elastic/common/path.h"
+#include "elastic/format/commit/commit.h"
+#include "elastic/format/io/folder.h"
+#include "elastic/manifest/manifest.h"
 
 namespace {
 
@@ -18,7 +19,7 @@ void MakeManifest(const std::string& path) {
   format::Manifest manifest;
   format::UseNewestCommit(
       folder, [&](const format::Commit& commit) { manifest = format::MakeManifest(folder, commit); });
-  std::ofstream file(format::JoinPath(path, format::kManifestName), std::ios::binary);
+  std::ofstream file(JoinPath(path, format::kManifestName), std::ios::binary);
   file << format::WriteManifest(manifest);
   if (!file.flush()) throw std::runtime_error("cannot write the manifest");
 }

@@ -106,7 +106,7 @@ JsonOutline OutlineOf(std::string_view text) {
 }
 
 Json::Value ParseJson(const std::string& text, const std::string& what) {
-  if (const size_t at = FindInvalidUtf8(text); at != std::string::npos) {
+  if (const size_t at = WellFormedLength(text); at != text.size()) {
     RefuseText(what + " is no valid UTF-8: byte " + std::to_string(at) + " (counted from 0)");
   }
   if (text.starts_with(kByteOrderMark)) {

@@ -22,7 +22,7 @@ Json::Value FindRequestId(const Json::Value& request) {
   const Json::Value id = request.get("request_id", Json::Value());
   if (id.isNumeric()) return id;
   const bool is_fit = id.isString() && static_cast<int64_t>(id.asString().size()) <= kLongestRequestId &&
-                      FindInvalidUtf8(id.asString()) == std::string::npos;
+                      IsValidUtf8(id.asString());
   return is_fit ? id : Json::Value();
 }
 

@@ -80,7 +80,7 @@ void CheckString(const Shape& shape, const Json::Value& value, const std::string
   if (text.empty() && !shape.may_be_empty)
     RefuseValue(path, "expected " + Expected(shape) + ", found an empty one");
   if (static_cast<int64_t>(text.size()) > shape.most) throw LimitExceeded(path, shape.most, "bytes");
-  if (FindInvalidUtf8(text) != std::string::npos) RefuseValue(path, "is no valid Unicode text");
+  if (!IsValidUtf8(text)) RefuseValue(path, "is no valid Unicode text");
   if (shape.choices.empty()) return;
   if (std::find(shape.choices.begin(), shape.choices.end(), text) != shape.choices.end()) return;
   RefuseValue(path, "expected " + Expected(shape) + ", found " + Quoted(text));

@@ -11,13 +11,15 @@
 #include <stdexcept>
 #include <system_error>
 
-#include "base/file_descriptor.h"
 #include "data_root/index_name.h"
+#include "elastic/common/durable_file.h"
 
 namespace quorelasticd {
 namespace {
 
 namespace fs = std::filesystem;
+using vantrel::elastic::FileLock;
+using vantrel::elastic::SyncFolder;
 
 constexpr mode_t kFolderMode = 0750;
 constexpr std::string_view kNewPrefix = ".new-";
@@ -34,11 +36,6 @@ void MakeFolder(const std::string& path) {
   if (!S_ISDIR(status.st_mode)) Fail(path, ENOTDIR);
 }
 
-void SyncFolder(const std::string& path) {
-  const FileDescriptor folder(open(path.c_str(), O_RDONLY | O_DIRECTORY | O_CLOEXEC));
-  if (!folder.is_open() || fsync(folder.get()) != 0) Fail(path, errno);
-}
-
 bool IsFolder(const std::string& path) {
   struct stat status {};
   return lstat(path.c_str(), &status) == 0 && S_ISDIR(status.st_mode);
@@ -52,7 +49,7 @@ void Rename(const std::string& from, const std::string& to) {
 
 DataRoot::DataRoot(const std::string& path) : path_(path), import_path_(path + "/import") {
   MakeFolder(path_);
-  lock_ = FileLock::TryLock(path_ + "/daemon.lock");
+  lock_ = FileLock::TryLock(path_ + "/daemon.lock", 0640);
   if (!lock_.has_value()) throw std::runtime_error(path_ + ": another daemon runs on this data folder");
   MakeFolder(import_path_);
   Sweep();

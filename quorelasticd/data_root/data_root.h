@@ -5,7 +5,7 @@
 #include <string_view>
 #include <vector>
 
-#include "data_root/file_lock.h"
+#include "elastic/common/file_lock.h"
 
 namespace quorelasticd {
 
@@ -20,7 +20,7 @@ namespace quorelasticd {
 // An index comes and goes by a rename, so that it is there wholly or not at all, whenever the machine stops; what
 // is half made or half removed is swept away when the next daemon starts.
 //
-// Operations throw std::system_error, with the path, where the file system refuses. They are for any number of
+// Operations throw std::system_error or IndexIoError, with the path, where the file system refuses. They are for any number of
 // threads, but at most one at a time for one index name.
 class DataRoot {
  public:
@@ -52,7 +52,7 @@ class DataRoot {
 
   std::string path_;
   std::string import_path_;
-  std::optional<FileLock> lock_;
+  std::optional<vantrel::elastic::FileLock> lock_;
 };
 
 }  // namespace quorelasticd

@@ -15,6 +15,8 @@
 namespace quorelasticd {
 namespace {
 
+using vantrel::elastic::FileDescriptor;
+
 constexpr size_t kImportPiece = size_t{256} << 10;
 
 [[noreturn]] void RefuseFile(const std::string& name, const std::string& problem) {

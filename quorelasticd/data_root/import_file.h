@@ -7,7 +7,7 @@
 #include <string>
 #include <string_view>
 
-#include "base/file_descriptor.h"
+#include "elastic/common/file_descriptor.h"
 
 namespace quorelasticd {
 
@@ -39,7 +39,7 @@ class ImportFile {
   bool Fill();
 
   std::string path_;  // for messages
-  FileDescriptor file_;
+  vantrel::elastic::FileDescriptor file_;
   std::string buffer_;
   size_t begin_ = 0;  // of what is not handed out yet
   uint64_t bytes_read_ = 0;

@@ -104,8 +104,8 @@ RequestError ToError(const Json::Value& error) {
 RepairWorker::RepairWorker(const std::string& index_path, bool is_dry_run) {
   std::array<int, 2> ends{};
   if (pipe2(ends.data(), O_CLOEXEC) != 0) Fail(errno, "cannot create a pipe for the repair");
-  output_ = FileDescriptor(ends[0]);
-  const FileDescriptor input(ends[1]);
+  output_ = vantrel::elastic::FileDescriptor(ends[0]);
+  const vantrel::elastic::FileDescriptor input(ends[1]);
   const SpawnSettings settings(input.get());
   process_ =
       settings.Spawn({"quorelasticd", std::string(kWorkerWord), is_dry_run ? kDryRun : kRealRun, index_path});

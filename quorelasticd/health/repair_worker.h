@@ -7,7 +7,7 @@
 #include <optional>
 #include <string>
 
-#include "base/file_descriptor.h"
+#include "elastic/common/file_descriptor.h"
 
 namespace quorelasticd {
 
@@ -34,7 +34,7 @@ class RepairWorker {
   bool ReadSome(std::chrono::milliseconds most);
   int WaitForExit();
 
-  FileDescriptor output_;
+  vantrel::elastic::FileDescriptor output_;
   std::string text_;
   pid_t process_ = -1;
 };

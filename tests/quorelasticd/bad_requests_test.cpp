@@ -12,11 +12,11 @@
 #include <thread>
 #include <vector>
 
-#include "data_root/file_lock.h"
 #include "quordaemon/wire.h"
 #include "served_index.h"
 #include "support/files.h"
 #include "support/sanitized.h"
+#include "vantrel/elastic/write_lock.h"
 
 namespace quorelastic::testing {
 namespace {
@@ -93,8 +93,7 @@ TEST_F(BadRequestsTest, TheLongestMessageIsRead) {
 
 TEST_F(BadRequestsTest, AnIndexThatAnotherProcessWritesToIsLocked) {
   DaemonClient client = Connect();
-  const auto lock = quorelasticd::FileLock::TryLock(daemon_.data() + "/books/quorelastic.lock");
-  ASSERT_TRUE(lock.has_value());
+  const vantrel::elastic::WriteLock lock(daemon_.data() + "/books");
   EXPECT_EQ(
       client.AskForError(R"({"command":"document_bulk","data":{"id":"books","documents":[{"id":"1"}]}})"),
       "locked");

@@ -18,13 +18,13 @@
 
 #include "daemon_client.h"
 #include "daemon_process.h"
-#include "data_root/file_lock.h"
 #include "errors/error_code.h"
 #include "protocol_document.h"
 #include "quordaemon/wire.h"
 #include "support/files.h"
 #include "support/sanitized.h"
 #include "support/temporary_folder.h"
+#include "vantrel/elastic/write_lock.h"
 
 namespace quorelastic::testing {
 namespace {
@@ -136,8 +136,7 @@ class ProtocolTranscripts : public ::testing::Test {
         {"another process writes to the index books",
          [this] {
            Start();
-           other_process_ = quorelasticd::FileLock::TryLock(Path("quorelastic.lock"));
-           ASSERT_TRUE(other_process_.has_value());
+           other_process_.emplace(Path(""));
          }},
         {"the other process is done", [this] { other_process_.reset(); }},
         {"the commit of the index books is overwritten",
@@ -226,7 +225,7 @@ class ProtocolTranscripts : public ::testing::Test {
   TemporaryFolder folder_;
   std::unique_ptr<DaemonProcess> daemon_;
   std::unique_ptr<DaemonClient> client_;
-  std::optional<quorelasticd::FileLock> other_process_;
+  std::optional<vantrel::elastic::WriteLock> other_process_;
   std::string whole_file_;  // before it was damaged
   bool is_ending_next_ = false;
   bool is_answered_ = true;

@@ -12,8 +12,8 @@
 #include <utility>
 #include <vector>
 
-#include "elastic/format/byte_source.h"
-#include "elastic/format/folder.h"
+#include "elastic/format/io/byte_source.h"
+#include "elastic/format/io/folder.h"
 #include "vantrel/elastic/index_error.h"
 
 namespace quorelastic::testing {

@@ -1,5 +1,6 @@
 #pragma once
 
+#include <fcntl.h>
 #include <sys/resource.h>
 #include <sys/types.h>
 #include <unistd.h>
@@ -8,6 +9,7 @@
 #include <filesystem>
 #include <iterator>
 #include <string>
+#include <vector>
 
 namespace quorelastic::testing {
 
@@ -18,12 +20,16 @@ inline size_t CountOpenFiles(pid_t process = getpid()) {
   return process == getpid() ? count - 1 : count;
 }
 
-// Lowers the limit on open files while it lives.
+// Leaves this process room for `more` open files while it lives. The limit is about their numbers, the lowest free one is
+// taken first, and a program may be started with high ones open: so the numbers are tried out.
 class FewOpenFiles {
  public:
-  explicit FewOpenFiles(rlim_t most) {
+  explicit FewOpenFiles(size_t more) {
+    std::vector<int> next;
+    while (next.size() <= more) next.push_back(open("/dev/null", O_RDONLY | O_CLOEXEC));
+    for (const int descriptor : next) close(descriptor);
     getrlimit(RLIMIT_NOFILE, &before_);
-    const rlimit lower = {most, before_.rlim_max};
+    const rlimit lower = {static_cast<rlim_t>(next.back()), before_.rlim_max};
     setrlimit(RLIMIT_NOFILE, &lower);
   }
   FewOpenFiles(const FewOpenFiles&) = delete;

@@ -10,19 +10,19 @@
 #include <cstddef>
 #include <string>
 
-#include "elastic/format/file_descriptor.h"
+#include "elastic/common/file_descriptor.h"
 
 namespace vantrel::elastic {
 namespace {
 
 constexpr uint64_t kPiece = uint64_t{4} << 20;
 
-format::FileDescriptor OpenForReading(const std::string& path) {
+FileDescriptor OpenForReading(const std::string& path) {
   // Not waiting, in case a FIFO stands there.
-  return format::FileDescriptor(open(path.c_str(), O_RDONLY | O_CLOEXEC | O_NONBLOCK | O_NOCTTY));
+  return FileDescriptor(open(path.c_str(), O_RDONLY | O_CLOEXEC | O_NONBLOCK | O_NOCTTY));
 }
 
-bool IsRegularFile(const format::FileDescriptor& file) {
+bool IsRegularFile(const FileDescriptor& file) {
   struct stat status {};
   return file.get() >= 0 && fstat(file.get(), &status) == 0 && S_ISREG(status.st_mode);
 }
@@ -32,7 +32,7 @@ bool IsRegularFile(const format::FileDescriptor& file) {
 class PageReader {
  public:
   // How many bytes were read: fewer than `length` where the file ends or cannot be read.
-  uint64_t Read(const format::FileDescriptor& file, uint64_t offset, uint64_t length) {
+  uint64_t Read(const FileDescriptor& file, uint64_t offset, uint64_t length) {
     uint64_t done = 0;
     while (done < length) {
       const ssize_t got =
@@ -55,7 +55,7 @@ class PageReader {
     return pread(file, buffer_.data(), length, offset);
   }
 
-  format::FileDescriptor null_{open("/dev/null", O_WRONLY | O_CLOEXEC)};
+  FileDescriptor null_{open("/dev/null", O_WRONLY | O_CLOEXEC)};
   bool can_hand_over_ = true;
   std::vector<char> buffer_;
 };
@@ -66,7 +66,7 @@ PageCacheWarmUp BringIn(const std::vector<Extent>& extents, uint64_t most_bytes)
   PageReader reader;
   PageCacheWarmUp result{.bytes = 0, .is_whole = true};
   for (const Extent& extent : extents) {
-    const format::FileDescriptor file = OpenForReading(extent.path);
+    const FileDescriptor file = OpenForReading(extent.path);
     if (!IsRegularFile(file)) continue;
     const uint64_t room = most_bytes - result.bytes;
     result.is_whole = extent.length <= room;

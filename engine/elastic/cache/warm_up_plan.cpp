@@ -9,9 +9,10 @@
 #include <system_error>
 #include <utility>
 
-#include "elastic/format/compound_file.h"
-#include "elastic/format/file_names.h"
-#include "elastic/format/folder.h"
+#include "elastic/common/path.h"
+#include "elastic/format/commit/file_names.h"
+#include "elastic/format/io/folder.h"
+#include "elastic/format/segment/compound_file.h"
 #include "vantrel/elastic/index_error.h"
 
 namespace vantrel::elastic {
@@ -46,7 +47,7 @@ bool PlanParts(const format::DiskFolder& folder, const std::string& name, Ranked
 
 void PlanFile(const format::DiskFolder& folder, const std::string& name, Ranked& plan) {
   if (name.ends_with(".cfs") && PlanParts(folder, name, plan)) return;
-  const std::string path = format::JoinPath(folder.path(), name);
+  const std::string path = JoinPath(folder.path(), name);
   std::error_code error;
   const uint64_t size = std::filesystem::file_size(path, error);
   if (!error) plan[RankOf(name)].push_back({path, 0, size});

@@ -12,12 +12,13 @@
 #include <span>
 #include <utility>
 
-#include "elastic/format/commit.h"
-#include "elastic/format/file_descriptor.h"
-#include "elastic/format/file_names.h"
-#include "elastic/format/folder.h"
-#include "elastic/format/opening_error.h"
-#include "elastic/index/durable_file.h"
+#include "elastic/common/durable_file.h"
+#include "elastic/common/file_descriptor.h"
+#include "elastic/common/path.h"
+#include "elastic/format/commit/commit.h"
+#include "elastic/format/commit/file_names.h"
+#include "elastic/format/io/folder.h"
+#include "elastic/format/io/opening_error.h"
 
 namespace vantrel::elastic {
 namespace {
@@ -29,7 +30,7 @@ class DiskOutput : public Lucene::BufferedIndexOutput {
  public:
   DiskOutput(boost::shared_ptr<DiskDirectory> directory, std::string path)
       : directory_(std::move(directory)), path_(std::move(path)) {
-    file_ = format::FileDescriptor(::open(path_.c_str(), O_WRONLY | O_CREAT | O_EXCL | O_CLOEXEC, 0666));
+    file_ = FileDescriptor(::open(path_.c_str(), O_WRONLY | O_CREAT | O_EXCL | O_CLOEXEC, 0666));
     if (!file_.is_open()) directory_->Fail(IndexIoError(path_, "cannot create file", errno));
   }
 
@@ -56,7 +57,7 @@ class DiskOutput : public Lucene::BufferedIndexOutput {
  private:
   boost::shared_ptr<DiskDirectory> directory_;
   std::string path_;
-  format::FileDescriptor file_;
+  FileDescriptor file_;
 };
 
 // Clones share the file and outlive the original's close().
@@ -102,7 +103,7 @@ class DiskInput : public Lucene::BufferedIndexInput {
 };
 
 void SyncFile(const std::string& path) {
-  const format::FileDescriptor file(::open(path.c_str(), O_RDONLY | O_CLOEXEC));
+  const FileDescriptor file(::open(path.c_str(), O_RDONLY | O_CLOEXEC));
   if (!file.is_open() || fsync(file.get()) != 0) throw IndexIoError(path, "cannot make file durable", errno);
 }
 
@@ -119,7 +120,7 @@ DiskDirectory::~DiskDirectory() = default;
 
 void DiskDirectory::Fail(const IndexIoError& error) {
   // segments.gen is but a hint, written when the commit is already durable: whoever reads it can do without.
-  const bool harmless = error.path() == format::JoinPath(path_, std::string(format::kSegmentsGen));
+  const bool harmless = error.path() == JoinPath(path_, std::string(format::kSegmentsGen));
   if (!failure_.has_value() && !harmless) failure_ = error;
   boost::throw_exception(Lucene::IOException(StringUtils::toUnicode(error.what())));
 }
@@ -137,7 +138,7 @@ void DiskDirectory::ThrowFailure(const char* purpose, std::string reason) const 
 void DiskDirectory::NoteFailedReading(const IndexError& error) {
   NoteReadProblem(error);
   // The library does well without segments.gen, and without a commit that is not whole.
-  const bool harmless = error.path().starts_with(format::JoinPath(path_, std::string(format::kSegments)));
+  const bool harmless = error.path().starts_with(JoinPath(path_, std::string(format::kSegments)));
   if (!harmless) NoteFailedReading();
 }
 
@@ -152,7 +153,7 @@ void DiskDirectory::NoteReadProblem(const IndexError& error) {
   read_problem_ = AsToldByLibrary(error);
   const auto* const problem = dynamic_cast<const IndexIoError*>(&error);
   if (problem == nullptr || format::IsAbsenceError(*problem)) return;
-  if (problem->path() != format::JoinPath(path_, std::string(format::kSegmentsGen))) {
+  if (problem->path() != JoinPath(path_, std::string(format::kSegmentsGen))) {
     if (!refusal_.has_value()) refusal_ = *problem;
     has_failed_reading_ = true;
   }
@@ -177,7 +178,7 @@ Lucene::IndexOutputPtr DiskDirectory::createOutput(const Lucene::String& name) {
   ensureOpen();
   if (failure_.has_value()) Fail(*failure_);
   const std::string own_name = StringUtils::toUTF8(name);
-  const std::string path = format::JoinPath(path_, own_name);
+  const std::string path = JoinPath(path_, own_name);
   // Never written over: readers may hold the old file open.
   if (unlink(path.c_str()) != 0 && errno != ENOENT) Fail(IndexIoError(path, "cannot replace file", errno));
   uncommitted_.insert(own_name);
@@ -207,7 +208,7 @@ void DiskDirectory::sync(const Lucene::String& name) {
   if (failure_.has_value()) Fail(*failure_);
   const std::string own_name = StringUtils::toUTF8(name);
   try {
-    SyncFile(format::JoinPath(path_, own_name));
+    SyncFile(JoinPath(path_, own_name));
     if (!format::CommitGeneration(own_name).has_value()) return;
     SyncFolder(path_);
   } catch (const IndexIoError& error) {
@@ -220,7 +221,7 @@ void DiskDirectory::deleteFile(const Lucene::String& name) {
   ensureOpen();
   const std::string own_name = StringUtils::toUTF8(name);
   if (failure_.has_value() && !uncommitted_.contains(own_name)) Fail(*failure_);
-  const std::string path = format::JoinPath(path_, own_name);
+  const std::string path = JoinPath(path_, own_name);
   if (unlink(path.c_str()) != 0) {
     // No harm to the index: the library tries again, and every writer removes what no commit refers to.
     const IndexIoError error(path, "cannot delete file", errno);

@@ -8,7 +8,7 @@
 #include <set>
 #include <string>
 
-#include "elastic/format/byte_source.h"
+#include "elastic/format/io/byte_source.h"
 #include "elastic/index/byte_path_directory.h"
 #include "elastic/index/library_guard.h"
 #include "vantrel/elastic/index_error.h"

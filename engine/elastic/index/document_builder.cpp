@@ -2,7 +2,7 @@
 
 #include <utility>
 
-#include "elastic/format/quoted.h"
+#include "elastic/common/quoted.h"
 #include "elastic/index/field_analyzer.h"
 #include "elastic/index/index_text.h"
 #include "elastic/index/text_analyzer.h"
@@ -94,7 +94,7 @@ Lucene::TermPtr DocumentBuilder::BuildTerm(std::string_view field, std::string_v
 
 const DocumentBuilder::Field& DocumentBuilder::Find(std::string_view name) const {
   const auto found = fields_.find(name);
-  if (found == fields_.end()) throw IndexValueError(folder_, "there is no field " + format::Quoted(name));
+  if (found == fields_.end()) throw IndexValueError(folder_, "there is no field " + Quoted(name));
   return found->second;
 }
 
@@ -127,7 +127,7 @@ void DocumentBuilder::CheckSize(const std::string& what, size_t size) const {
 }
 
 void DocumentBuilder::Refuse(std::string_view field, const std::string& problem) const {
-  throw IndexValueError(folder_, "field " + format::Quoted(field) + ": " + problem);
+  throw IndexValueError(folder_, "field " + Quoted(field) + ": " + problem);
 }
 
 }  // namespace vantrel::elastic

@@ -11,7 +11,7 @@
 #include <string>
 #include <utility>
 
-#include "elastic/format/text.h"
+#include "elastic/common/text.h"
 #include "elastic/index/text_analyzer.h"
 #include "elastic/preproc/pre_proc_chain.h"
 
@@ -103,7 +103,7 @@ class ChainedTokens : public Lucene::TokenStream {
   void ShowToken() {
     clearAttributes();
     text_.clear();
-    format::AppendCodePoints(token_.text, text_);
+    AppendCodePoints(token_.text, text_);
     term_->setTermBuffer(text_);
     // A word may be shorter than what it stands for in the value: an acronym loses its dots.
     const int32_t end = whole_offsets_->endOffset();

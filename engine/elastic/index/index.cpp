@@ -1,4 +1,5 @@
 #include "vantrel/elastic/index.h"
+#include "elastic/common/path.h"
 
 #include <sys/stat.h>
 #include <unistd.h>
@@ -9,12 +10,12 @@
 #include <optional>
 #include <utility>
 
-#include "elastic/format/commit.h"
-#include "elastic/format/file_names.h"
-#include "elastic/format/folder.h"
-#include "elastic/format/quoted.h"
+#include "elastic/common/durable_file.h"
+#include "elastic/common/quoted.h"
+#include "elastic/format/commit/commit.h"
+#include "elastic/format/commit/file_names.h"
+#include "elastic/format/io/folder.h"
 #include "elastic/index/document_builder.h"
-#include "elastic/index/durable_file.h"
 #include "elastic/index/index_statistics.h"
 #include "elastic/index/index_text.h"
 #include "elastic/index/library_guard.h"
@@ -43,7 +44,7 @@ void CheckPath(const std::string& path) {
 }
 
 void MakeFolder(const std::string& path) {
-  if (mkdir(path.c_str(), 0777) == 0) return SyncFolder(format::JoinPath(path, ".."));
+  if (mkdir(path.c_str(), 0777) == 0) return SyncFolder(JoinPath(path, ".."));
   if (errno != EEXIST) throw IndexIoError(path, "cannot create index folder", errno);
 }
 
@@ -72,7 +73,7 @@ bool HoldsIndexFiles(const std::string& path) {
 // Makes way for the first commit, where HoldsIndexFiles has found nothing but what may go.
 void RemoveCutShortCommit(const std::string& path) {
   for (const std::string& name : {format::CommitFileName(1), std::string(format::kSegmentsGen)}) {
-    const std::string file = format::JoinPath(path, name);
+    const std::string file = JoinPath(path, name);
     if (unlink(file.c_str()) != 0 && errno != ENOENT) throw IndexIoError(file, "cannot remove file", errno);
   }
 }
@@ -276,7 +277,7 @@ std::vector<AnalyzedToken> Index::Analyze(std::string_view field, std::string_vi
   const std::wstring checked = impl_->builder().CheckValue(field, value);
   constexpr uint64_t kMostShown = uint64_t{4} << 20;
   if (checked.size() * impl_->builder().MostGrowthOf(field) > kMostShown) {
-    throw IndexValueError(path(), "field " + format::Quoted(field) + ": the value may become more than " +
+    throw IndexValueError(path(), "field " + Quoted(field) + ": the value may become more than " +
                                       std::to_string(kMostShown) + " characters of terms, too many to show");
   }
   return AnalyzeValue(settings(), field, checked);

@@ -1,6 +1,7 @@
 #include "vantrel/elastic/index_container.h"
+#include "elastic/common/path.h"
 
-#include "elastic/format/folder.h"
+#include "elastic/format/io/folder.h"
 #include "vantrel/elastic/index.h"
 
 namespace vantrel::elastic {
@@ -16,7 +17,7 @@ std::shared_ptr<IndexContainer> IndexContainer::Instance() {
 }
 
 std::shared_ptr<Index> IndexContainer::IndexGet(const std::string& name) {
-  const std::string path = name.find('/') != std::string::npos ? name : format::JoinPath(IndexRoot(), name);
+  const std::string path = name.find('/') != std::string::npos ? name : JoinPath(IndexRoot(), name);
   const std::lock_guard guard(mutex_);
   std::erase_if(indexes_, [](const auto& entry) { return entry.second.expired(); });
   std::weak_ptr<Index>& known = indexes_[path];

@@ -4,9 +4,10 @@
 
 #include <utility>
 
-#include "elastic/format/commit.h"
-#include "elastic/format/deletions.h"
-#include "elastic/format/segment_files.h"
+#include "elastic/common/path.h"
+#include "elastic/format/commit/commit.h"
+#include "elastic/format/segment/deletions.h"
+#include "elastic/segment/segment_files.h"
 
 namespace vantrel::elastic {
 namespace {
@@ -16,7 +17,7 @@ uint64_t CountBytes(const format::DiskFolder& folder) {
   for (const std::string& name : folder.List()) {
     struct stat status {};
     // What is gone since it was listed takes no more space.
-    if (lstat(format::JoinPath(folder.path(), name).c_str(), &status) != 0) continue;
+    if (lstat(JoinPath(folder.path(), name).c_str(), &status) != 0) continue;
     if (S_ISREG(status.st_mode)) bytes += static_cast<uint64_t>(status.st_size);
   }
   return bytes;

@@ -1,6 +1,6 @@
 #pragma once
 
-#include "elastic/format/folder.h"
+#include "elastic/format/io/folder.h"
 #include "vantrel/elastic/index.h"
 
 namespace vantrel::elastic {

@@ -1,12 +1,12 @@
 #include "elastic/index/index_text.h"
 
-#include "elastic/format/text.h"
+#include "elastic/common/text.h"
 
 namespace vantrel::elastic {
 
 const char* ToIndexText(std::string_view text, std::wstring& out) {
   out.clear();
-  if (!format::AppendCodePoints(text, out)) return "is not valid UTF-8";
+  if (!AppendCodePoints(text, out)) return "is not valid UTF-8";
   for (const wchar_t character : out) {
     if (character == 0xfffe) return "holds U+FFFE, which an index cannot keep";
     if (character == 0xffff) return "holds U+FFFF, which an index cannot keep";

@@ -5,9 +5,12 @@
 #include <utility>
 #include <vector>
 
-#include "elastic/format/file_names.h"
-#include "elastic/format/opening_error.h"
-#include "elastic/health/index_check.h"
+#include "elastic/check/index_check.h"
+#include "elastic/common/path.h"
+#include "elastic/format/commit/file_names.h"
+#include "elastic/format/commit/shared_files.h"
+#include "elastic/format/io/opening_error.h"
+#include "elastic/segment/whole_segment.h"
 #include "vantrel/elastic/index_error.h"
 
 namespace vantrel::elastic {
@@ -102,7 +105,7 @@ void LibraryGuard::AdmitUnknownSegments(const format::Folder& folder, const form
   format::SharedFiles shared(folder);
   for (const format::SegmentInfo& segment : commit.segments) {
     // As they are before the check: who changes one meanwhile makes it unknown.
-    Identities of_segment = IdentifyAll(format::FilesOf(folder, segment, shared));
+    Identities of_segment = IdentifyAll(format::WholeSegment(folder, segment, shared).file_names());
     if (!Knows(of_segment)) unknown.segments.push_back(segment);
     files.merge(of_segment);
   }
@@ -121,7 +124,7 @@ void LibraryGuard::CheckSegments(const format::Folder& folder, const format::Com
   if (refusal != refusals_.end() && start < refusal->second.until)
     throw IndexDamagedError(refusal->second.error);
   try {
-    RequireSafe(health::CheckSegments(folder, commit));
+    RequireSafe(check::CheckSegments(folder, commit));
   } catch (const IndexDamagedError& error) {
     const auto end = Clock::now();
     const Clock::duration hold = std::max<Clock::duration>(kRefusalHolds, kRefusalHoldsTimes * (end - start));
@@ -149,7 +152,7 @@ std::shared_ptr<const format::ByteSource> LibraryGuard::Open(const std::string& 
 
 LibraryGuard::Identity LibraryGuard::Identify(const std::string& name) const {
   struct stat status {};
-  const std::string path = format::JoinPath(folder_, name);
+  const std::string path = JoinPath(folder_, name);
   if (stat(path.c_str(), &status) != 0) throw IndexIoError(path, "cannot examine file", errno);
   return {status.st_dev, status.st_ino, status.st_size, status.st_mtim};
 }

@@ -12,11 +12,11 @@
 #include <set>
 #include <string>
 
-#include "elastic/format/byte_source.h"
-#include "elastic/format/commit.h"
-#include "elastic/format/folder.h"
-#include "elastic/format/manifest.h"
+#include "elastic/format/commit/commit.h"
+#include "elastic/format/io/byte_source.h"
+#include "elastic/format/io/folder.h"
 #include "elastic/index/verified_file.h"
+#include "elastic/manifest/manifest.h"
 #include "vantrel/elastic/index_error.h"
 
 namespace vantrel::elastic {

@@ -3,9 +3,9 @@
 #include <exception>
 #include <utility>
 
-#include "elastic/format/commit.h"
-#include "elastic/format/folder.h"
-#include "elastic/index/durable_file.h"
+#include "elastic/common/durable_file.h"
+#include "elastic/format/commit/commit.h"
+#include "elastic/format/io/folder.h"
 #include "vantrel/elastic/index_error.h"
 
 namespace vantrel::elastic {

@@ -3,7 +3,7 @@
 #include <optional>
 #include <string>
 
-#include "elastic/format/manifest.h"
+#include "elastic/manifest/manifest.h"
 
 namespace vantrel::elastic {
 

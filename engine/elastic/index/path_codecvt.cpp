@@ -5,7 +5,7 @@
 #include <string>
 #include <string_view>
 
-#include "elastic/format/text.h"
+#include "elastic/common/text.h"
 
 namespace vantrel::elastic {
 namespace {
@@ -26,7 +26,7 @@ PathCodecvt::result PathCodecvt::do_in(state_type&, const char* from, const char
   std::string_view rest(from, static_cast<size_t>(from_end - from));
   while (!rest.empty() && to != to_end) {
     char32_t code_point = 0;
-    if (!format::TakeCodePoint(rest, code_point)) {
+    if (!TakeCodePoint(rest, code_point)) {
       code_point = kOddByte + static_cast<unsigned char>(rest.front());
       rest.remove_prefix(1);
     }
@@ -48,7 +48,7 @@ PathCodecvt::result PathCodecvt::do_out(state_type&, const wchar_t* from, const 
     if (StandsForByte(value)) {
       bytes.push_back(static_cast<char>(value - kOddByte));
     } else if (IsCodePoint(value)) {
-      format::AppendUtf8(value, bytes);
+      AppendUtf8(value, bytes);
     } else {
       outcome = error;
       break;

@@ -9,9 +9,10 @@
 #include <utility>
 #include <vector>
 
-#include "elastic/format/folder.h"
-#include "elastic/format/quoted.h"
-#include "elastic/index/durable_file.h"
+#include "elastic/common/durable_file.h"
+#include "elastic/common/path.h"
+#include "elastic/common/quoted.h"
+#include "elastic/format/io/folder.h"
 #include "elastic/index/index_text.h"
 #include "elastic/preproc/pre_proc_chain.h"
 #include "vantrel/elastic/index_error.h"
@@ -35,20 +36,20 @@ class SettingsObject {
   bool Has(const char* name) const { return object_.isMember(name); }
 
   const Json::Value& Take(const char* name) {
-    if (!object_.isMember(name)) Refuse("lacks the member " + format::Quoted(name));
+    if (!object_.isMember(name)) Refuse("lacks the member " + Quoted(name));
     taken_.insert(name);
     return object_[name];
   }
 
   bool TakeBool(const char* name) {
     const Json::Value& value = Take(name);
-    if (!value.isBool()) Refuse(std::string("member ") + format::Quoted(name) + " is neither true nor false");
+    if (!value.isBool()) Refuse(std::string("member ") + Quoted(name) + " is neither true nor false");
     return value.asBool();
   }
 
   std::string TakeString(const char* name) {
     const Json::Value& value = Take(name);
-    if (!value.isString()) Refuse(std::string("member ") + format::Quoted(name) + " is no string");
+    if (!value.isString()) Refuse(std::string("member ") + Quoted(name) + " is no string");
     return value.asString();
   }
 
@@ -58,12 +59,12 @@ class SettingsObject {
     for (const auto& entry : table) {
       if (entry.word == word) return entry.value;
     }
-    Refuse(std::string("member ") + format::Quoted(name) + " has the unknown value " + format::Quoted(word));
+    Refuse(std::string("member ") + Quoted(name) + " has the unknown value " + Quoted(word));
   }
 
   void RefuseOthers() const {
     for (const std::string& name : object_.getMemberNames()) {
-      if (!taken_.contains(name)) Refuse("has the unknown member " + format::Quoted(name));
+      if (!taken_.contains(name)) Refuse("has the unknown member " + Quoted(name));
     }
   }
 
@@ -120,22 +121,21 @@ using Problem = std::optional<std::string>;
 Problem FindIdFieldProblem(const IndexSettings& settings) {
   for (const FieldSettings& field : settings.fields) {
     if (field.name != settings.id_field) continue;
-    if (!field.pre_processors.empty())
-      return "the id field " + format::Quoted(field.name) + " has pre-processors";
+    if (!field.pre_processors.empty()) return "the id field " + Quoted(field.name) + " has pre-processors";
     if (field.type == FieldType::kKeyword && field.stored) return std::nullopt;
-    return "the id field " + format::Quoted(field.name) + " is no stored keyword";
+    return "the id field " + Quoted(field.name) + " is no stored keyword";
   }
-  return "the settings lack the id field " + format::Quoted(settings.id_field);
+  return "the settings lack the id field " + Quoted(settings.id_field);
 }
 
 Problem FindPreProcessorProblem(const FieldSettings& field) {
   try {
     BuildPreProcChain(field.pre_processors);
   } catch (const std::invalid_argument& error) {
-    return "field " + format::Quoted(field.name) + ": " + error.what();
+    return "field " + Quoted(field.name) + ": " + error.what();
   }
   if (field.frequencies || !MakesPhrases(field.pre_processors)) return std::nullopt;
-  return "field " + format::Quoted(field.name) +
+  return "field " + Quoted(field.name) +
          ": \"ngram\" needs frequencies: a word is found as a phrase of its grams";
 }
 
@@ -146,9 +146,9 @@ Problem FindProblem(const IndexSettings& settings) {
     if (field.name.empty()) return "the settings have a field without a name";
     std::wstring wide;
     if (const char* problem = ToIndexText(field.name, wide))
-      return "the field name " + format::Quoted(field.name) + " " + problem;
+      return "the field name " + Quoted(field.name) + " " + problem;
     if (!names.insert(field.name).second)
-      return "the settings have two fields of the name " + format::Quoted(field.name);
+      return "the settings have two fields of the name " + Quoted(field.name);
     if (Problem problem = FindPreProcessorProblem(field)) return problem;
   }
   return FindIdFieldProblem(settings);
@@ -184,7 +184,7 @@ void WriteSettings(const std::string& folder, const IndexSettings& settings) {
 }
 
 IndexSettings ReadSettings(const std::string& folder) {
-  const std::string path = format::JoinPath(folder, kSettingsFileName);
+  const std::string path = JoinPath(folder, kSettingsFileName);
   JsonValue root;
   if (!root.fromString(ReadWholeFile(folder))) throw IndexError(path, "the settings are no JSON document");
   SettingsObject object(path, root, "settings file");

@@ -3,7 +3,7 @@
 #include <algorithm>
 #include <utility>
 
-#include "elastic/format/block_digest.h"
+#include "elastic/manifest/block_digest.h"
 #include "vantrel/elastic/index_error.h"
 
 namespace vantrel::elastic {

@@ -7,8 +7,8 @@
 #include <span>
 #include <string>
 
-#include "elastic/format/byte_source.h"
-#include "elastic/format/manifest.h"
+#include "elastic/format/io/byte_source.h"
+#include "elastic/manifest/manifest.h"
 
 namespace vantrel::elastic {
 

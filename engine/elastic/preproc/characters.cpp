@@ -1,13 +1,13 @@
 #include "elastic/preproc/characters.h"
 
-#include "elastic/format/text.h"
+#include "elastic/common/text.h"
 
 namespace vantrel::elastic {
 
 size_t FirstCharacterLength(std::string_view text) {
   std::string_view rest = text;
   char32_t code_point = 0;
-  return format::TakeCodePoint(rest, code_point) ? text.size() - rest.size() : 1;
+  return TakeCodePoint(rest, code_point) ? text.size() - rest.size() : 1;
 }
 
 uint64_t CountCharacters(std::string_view text) {

@@ -2,7 +2,7 @@
 
 #include <unicode/uchar.h>
 
-#include "elastic/format/text.h"
+#include "elastic/common/text.h"
 
 namespace vantrel::elastic {
 namespace {
@@ -25,8 +25,8 @@ std::string LowerCase(std::string_view text) {
   lower.reserve(text.size());
   while (!text.empty()) {
     char32_t code_point = 0;
-    if (static_cast<unsigned char>(text.front()) >= kAsciiEnd && format::TakeCodePoint(text, code_point)) {
-      format::AppendUtf8(LowerCase(code_point), lower);
+    if (static_cast<unsigned char>(text.front()) >= kAsciiEnd && TakeCodePoint(text, code_point)) {
+      AppendUtf8(LowerCase(code_point), lower);
     } else {
       lower.push_back(LowerCaseAscii(text.front()));
       text.remove_prefix(1);

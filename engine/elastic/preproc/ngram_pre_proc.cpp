@@ -4,7 +4,7 @@
 #include <stdexcept>
 #include <string_view>
 
-#include "elastic/format/quoted.h"
+#include "elastic/common/quoted.h"
 #include "elastic/preproc/characters.h"
 
 namespace vantrel::elastic {
@@ -80,7 +80,7 @@ class Grams : public FieldTokens {
 [[noreturn]] void Refuse(const std::string& argument) {
   throw std::invalid_argument(
       "\"ngram\" takes lengths from 1 to 255, at most 8 and ascending, such as \"2\" or \"2,3\", but got " +
-      format::Quoted(argument));
+      Quoted(argument));
 }
 
 }  // namespace

@@ -7,7 +7,7 @@
 #include <string>
 #include <utility>
 
-#include "elastic/format/quoted.h"
+#include "elastic/common/quoted.h"
 #include "vantrel/elastic/ngram_pre_proc.h"
 #include "vantrel/elastic/to_lower_pre_proc.h"
 
@@ -45,7 +45,7 @@ std::shared_ptr<const FieldPreProc> BuildPreProcChain(const std::vector<PreProcS
     const auto factory = std::find_if(kFactories.begin(), kFactories.end(),
                                       [&](const NamedFactory& known) { return step.name == known.name; });
     if (factory == kFactories.end()) {
-      throw std::invalid_argument("there is no pre-processor " + format::Quoted(step.name));
+      throw std::invalid_argument("there is no pre-processor " + Quoted(step.name));
     }
     chain = factory->make(std::move(chain), step.argument);
   }

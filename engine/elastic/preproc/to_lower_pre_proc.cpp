@@ -2,7 +2,7 @@
 
 #include <stdexcept>
 
-#include "elastic/format/quoted.h"
+#include "elastic/common/quoted.h"
 #include "elastic/preproc/lower_case.h"
 
 namespace vantrel::elastic {
@@ -30,7 +30,7 @@ std::unique_ptr<FieldTokens> ToLowerPreProc::Process(const std::string& text) co
 
 void ToLowerPreProc::CheckArgument(const std::string& argument) {
   if (!argument.empty()) {
-    throw std::invalid_argument("\"tolower\" takes no argument, but got " + format::Quoted(argument));
+    throw std::invalid_argument("\"tolower\" takes no argument, but got " + Quoted(argument));
   }
 }
 

@@ -4,7 +4,7 @@
 #include <string_view>
 #include <utility>
 
-#include "elastic/format/file_names.h"
+#include "elastic/format/commit/file_names.h"
 
 namespace vantrel::elastic {
 namespace {

@@ -1,4 +1,5 @@
 #include "vantrel/elastic/index_repair.h"
+#include "elastic/common/path.h"
 
 #include <lucene++/LuceneHeaders.h>
 
@@ -18,8 +19,8 @@
 #include <utility>
 #include <vector>
 
-#include "elastic/format/commit.h"
-#include "elastic/format/folder.h"
+#include "elastic/format/commit/commit.h"
+#include "elastic/format/io/folder.h"
 #include "elastic/index/manifest_keeper.h"
 #include "elastic/index/run_reading.h"
 #include "elastic/repair/blame.h"
@@ -45,7 +46,7 @@ format::Commit ReadNewestCommit(const std::string& path) {
 // Nothing where there is no file to lock, or this user may not; who may not will not get further than the check.
 std::optional<WriteLock> TakeLockThatIsThere(const std::string& path) {
   struct stat status {};
-  if (stat(format::JoinPath(path, WriteLock::kFileName).c_str(), &status) != 0) return std::nullopt;
+  if (stat(JoinPath(path, WriteLock::kFileName).c_str(), &status) != 0) return std::nullopt;
   try {
     return WriteLock(path);
   } catch (const IndexIoError&) {

@@ -11,13 +11,12 @@
 #include <system_error>
 #include <utility>
 
-#include "elastic/format/folder.h"
+#include "elastic/common/path.h"
+#include "elastic/format/io/folder.h"
 #include "vantrel/elastic/search_error.h"
 
 namespace vantrel::elastic {
 namespace {
-
-using format::FileDescriptor;
 
 [[noreturn]] void FailBySystem(const std::string& path, const std::string& problem, int error_number) {
   throw PluginLoadError(path, problem + ": " + std::generic_category().message(error_number));
@@ -110,7 +109,7 @@ std::vector<std::string> PluginFolder::List() const {
 }
 
 std::shared_ptr<const SearchPlugin> PluginFolder::Load(const std::string& name) const {
-  const std::string path = format::JoinPath(path_, name);
+  const std::string path = JoinPath(path_, name);
   auto loaded = std::make_unique<LoadedFile>();
   loaded->file =
       FileDescriptor(openat(folder_.get(), name.c_str(), O_RDONLY | O_NOFOLLOW | O_NONBLOCK | O_CLOEXEC));

@@ -4,7 +4,7 @@
 #include <string>
 #include <vector>
 
-#include "elastic/format/file_descriptor.h"
+#include "elastic/common/file_descriptor.h"
 #include "vantrel/elastic/search_plugin.h"
 
 namespace vantrel::elastic {
@@ -22,7 +22,7 @@ class PluginFolder {
 
  private:
   std::string path_;
-  format::FileDescriptor folder_;
+  FileDescriptor folder_;
 };
 
 }  // namespace vantrel::elastic

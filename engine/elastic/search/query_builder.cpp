@@ -9,8 +9,8 @@
 #include <map>
 #include <utility>
 
-#include "elastic/format/quoted.h"
-#include "elastic/format/text.h"
+#include "elastic/common/quoted.h"
+#include "elastic/common/text.h"
 #include "elastic/index/field_analyzer.h"
 #include "elastic/index/index_text.h"
 #include "elastic/preproc/lower_case.h"
@@ -64,7 +64,7 @@ class FieldwiseParser : public Lucene::QueryParser {
       if (const auto phrase = boost::dynamic_pointer_cast<Lucene::PhraseQuery>(query)) phrase->setSlop(slop);
       if (const auto phrase = boost::dynamic_pointer_cast<Lucene::MultiPhraseQuery>(query))
         phrase->setSlop(slop);
-      if (!query) Warn("nothing of " + format::Quoted(StringUtils::toUTF8(text)) + " is left to search for");
+      if (!query) Warn("nothing of " + Quoted(StringUtils::toUTF8(text)) + " is left to search for");
       return Counted(WithPositions(target, query));
     });
   }
@@ -124,7 +124,7 @@ class FieldwiseParser : public Lucene::QueryParser {
   }
 
   QueryPtr UnknownField(const String& name) {
-    Warn("there is no field " + format::Quoted(StringUtils::toUTF8(name)));
+    Warn("there is no field " + Quoted(StringUtils::toUTF8(name)));
     return newBooleanQuery(true);  // without a clause, it finds nothing
   }
 
@@ -134,7 +134,7 @@ class FieldwiseParser : public Lucene::QueryParser {
                            boost::dynamic_pointer_cast<Lucene::MultiPhraseQuery>(query);
     const FieldSettings& settings = *fields_.at(target);
     if (!is_phrase || settings.frequencies) return query;
-    Warn("field " + format::Quoted(settings.name) + " keeps no positions: phrases are not found in it");
+    Warn("field " + Quoted(settings.name) + " keeps no positions: phrases are not found in it");
     return newBooleanQuery(true);
   }
 
@@ -154,9 +154,9 @@ class FieldwiseParser : public Lucene::QueryParser {
   void CheckGrowth(const String& text, const FieldSettings& settings) const {
     constexpr uint64_t kMostCharacters = uint64_t{4} << 20;
     if (text.size() * MostGrowth(settings.pre_processors) <= kMostCharacters) return;
-    throw LimitExceededError("query_clauses", limits_.query_clauses,
-                             "the pre-processors of field " + format::Quoted(settings.name) +
-                                 " may make too many terms of the query");
+    throw LimitExceededError(
+        "query_clauses", limits_.query_clauses,
+        "the pre-processors of field " + Quoted(settings.name) + " may make too many terms of the query");
   }
 
   void CheckNearWords(const QueryPtr& query) const {
@@ -221,7 +221,7 @@ std::wstring CheckedText(const std::string& query, const SearchLimits& limits) {
                              "the query is of " + std::to_string(query.size()) + " bytes");
   }
   std::wstring wide;
-  if (!format::IsValidUtf8(query)) throw QuerySyntaxError(0, "the query is not valid UTF-8");
+  if (!IsValidUtf8(query)) throw QuerySyntaxError(0, "the query is not valid UTF-8");
   if (const char* problem = ToIndexText(query, wide)) {
     const size_t position = wide.find_first_of(L"\ufffe\uffff\U0001ffff");
     throw QuerySyntaxError(position, std::string("the query ") + problem);

@@ -17,7 +17,7 @@
 #include <utility>
 #include <vector>
 
-#include "elastic/format/quoted.h"
+#include "elastic/common/quoted.h"
 #include "vantrel/elastic/search_error.h"
 
 namespace vantrel::elastic {
@@ -279,9 +279,8 @@ class Scan {
 
   [[noreturn]] void RefuseToken(const char* expected) const {
     const Token& token = tokens_.current();
-    const std::string found = token.kind == Constants::_EOF
-                                  ? "the query ends"
-                                  : format::Quoted(Lucene::StringUtils::toUTF8(token.image));
+    const std::string found =
+        token.kind == Constants::_EOF ? "the query ends" : Quoted(Lucene::StringUtils::toUTF8(token.image));
     throw QuerySyntaxError(token.begin, found + " where " + expected + " is expected");
   }
 

@@ -6,8 +6,8 @@
 #include <set>
 #include <utility>
 
-#include "elastic/deadline_after.h"
-#include "elastic/format/quoted.h"
+#include "elastic/common/deadline_after.h"
+#include "elastic/common/quoted.h"
 #include "elastic/index/run_reading.h"
 #include "elastic/search/common_searcher.h"
 #include "elastic/search/field_filter.h"
@@ -152,7 +152,7 @@ class SearchRun {
         return std::any_of(index.settings.fields.begin(), index.settings.fields.end(),
                            [&](const FieldSettings& field) { return field.stored && field.name == name; });
       });
-      if (!is_stored) warn("there is no stored field " + format::Quoted(name) + " to load");
+      if (!is_stored) warn("there is no stored field " + Quoted(name) + " to load");
     }
   }
 

@@ -1,6 +1,6 @@
 #include "vantrel/elastic/search_error.h"
 
-#include "elastic/format/quoted.h"
+#include "elastic/common/quoted.h"
 
 namespace vantrel::elastic {
 
@@ -14,10 +14,10 @@ LimitExceededError::LimitExceededError(const std::string& limit, uint64_t most, 
       most_(most) {}
 
 UnknownPluginError::UnknownPluginError(const std::string& plugin)
-    : SearchError("there is no search plugin " + format::Quoted(plugin)), plugin_(plugin) {}
+    : SearchError("there is no search plugin " + Quoted(plugin)), plugin_(plugin) {}
 
 PluginDataError::PluginDataError(const std::string& plugin, const std::string& problem)
-    : SearchError("search plugin " + format::Quoted(plugin) + ": " + problem), plugin_(plugin) {}
+    : SearchError("search plugin " + Quoted(plugin) + ": " + problem), plugin_(plugin) {}
 
 SearchTimeoutError::SearchTimeoutError() : SearchError("the search took longer than its time limit") {}
 

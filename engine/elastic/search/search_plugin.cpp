@@ -2,7 +2,7 @@
 
 #include <utility>
 
-#include "elastic/format/quoted.h"
+#include "elastic/common/quoted.h"
 #include "elastic/search/built_in_plugins.h"
 #include "elastic/search/plugin_folder.h"
 #include "vantrel/elastic/search_error.h"
@@ -26,7 +26,7 @@ void SearchPluginRegistry::Add(const std::shared_ptr<const SearchPlugin>& plugin
   const std::string name = plugin->name();
   if (name.empty()) throw PluginLoadError("search plugin \"\"", "a plugin needs a name");
   if (!plugins_.try_emplace(name, plugin).second) {
-    throw PluginLoadError("search plugin " + format::Quoted(name), "there is one of that name already");
+    throw PluginLoadError("search plugin " + Quoted(name), "there is one of that name already");
   }
 }
 

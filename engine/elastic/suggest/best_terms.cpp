@@ -4,7 +4,7 @@
 #include <string>
 #include <utility>
 
-#include "elastic/format/term_order.h"
+#include "elastic/format/segment/term_order.h"
 
 namespace vantrel::elastic {
 namespace {

@@ -4,8 +4,8 @@
 #include <cstdint>
 #include <optional>
 
-#include "elastic/deadline_after.h"
-#include "elastic/format/watched_folder.h"
+#include "elastic/common/deadline_after.h"
+#include "elastic/format/io/watched_folder.h"
 #include "vantrel/elastic/search_error.h"
 
 namespace vantrel::elastic {

@@ -6,8 +6,8 @@
 #include <memory>
 #include <utility>
 
-#include "elastic/format/segment_files.h"
-#include "elastic/format/watched_folder.h"
+#include "elastic/format/io/watched_folder.h"
+#include "elastic/segment/segment_files.h"
 #include "elastic/suggest/best_terms.h"
 #include "elastic/suggest/deadline.h"
 #include "elastic/terms/merged_terms.h"

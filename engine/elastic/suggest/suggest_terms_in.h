@@ -2,7 +2,7 @@
 
 #include <vector>
 
-#include "elastic/format/folder.h"
+#include "elastic/format/io/folder.h"
 #include "vantrel/elastic/suggest_terms.h"
 
 namespace vantrel::elastic {

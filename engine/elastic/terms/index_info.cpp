@@ -4,8 +4,8 @@
 #include <stdexcept>
 #include <utility>
 
-#include "elastic/format/segment_files.h"
-#include "elastic/format/term_cursor.h"
+#include "elastic/format/segment/term_cursor.h"
+#include "elastic/segment/segment_files.h"
 #include "elastic/terms/term_walk.h"
 #include "vantrel/elastic/index_error.h"
 

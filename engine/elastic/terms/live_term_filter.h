@@ -1,9 +1,9 @@
 #pragma once
 
-#include "elastic/format/deletions.h"
-#include "elastic/format/postings.h"
-#include "elastic/format/segment_files.h"
-#include "elastic/format/term_cursor.h"
+#include "elastic/format/segment/deletions.h"
+#include "elastic/format/segment/postings.h"
+#include "elastic/format/segment/term_cursor.h"
+#include "elastic/segment/segment_files.h"
 
 namespace vantrel::elastic {
 

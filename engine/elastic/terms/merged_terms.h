@@ -7,7 +7,7 @@
 #include <string_view>
 #include <vector>
 
-#include "elastic/format/term_order.h"
+#include "elastic/format/segment/term_order.h"
 #include "elastic/terms/selected_terms.h"
 
 namespace vantrel::elastic {

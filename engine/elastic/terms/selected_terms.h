@@ -4,9 +4,9 @@
 #include <optional>
 #include <vector>
 
-#include "elastic/format/dictionary_walk.h"
-#include "elastic/format/field_infos.h"
-#include "elastic/format/segment_files.h"
+#include "elastic/format/segment/field_infos.h"
+#include "elastic/segment/dictionary_walk.h"
+#include "elastic/segment/segment_files.h"
 #include "elastic/terms/live_term_filter.h"
 
 namespace vantrel::elastic {

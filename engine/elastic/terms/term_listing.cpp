@@ -3,8 +3,8 @@
 #include <utility>
 #include <vector>
 
-#include "elastic/format/folder.h"
-#include "elastic/format/segment_files.h"
+#include "elastic/format/io/folder.h"
+#include "elastic/segment/segment_files.h"
 #include "elastic/terms/merged_terms.h"
 #include "elastic/terms/selected_terms.h"
 #include "vantrel/elastic/index_error.h"

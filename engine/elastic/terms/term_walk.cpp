@@ -6,7 +6,7 @@
 #include <exception>
 #include <utility>
 
-#include "elastic/format/text.h"
+#include "elastic/common/text.h"
 
 namespace vantrel::elastic {
 
@@ -56,7 +56,7 @@ const Lucene::String& TermWalk::WideFieldName(int32_t field) {
   if (field != wide_field_number_) {
     wide_field_number_ = field;
     wide_field_.clear();
-    format::AppendCodePoints(fields_[static_cast<size_t>(field)].name, wide_field_);
+    AppendCodePoints(fields_[static_cast<size_t>(field)].name, wide_field_);
   }
   return wide_field_;
 }
@@ -67,7 +67,7 @@ Lucene::TermPtr TermWalk::Term() {
   if (!term_ || !term_.unique()) term_ = Lucene::newLucene<Lucene::Term>(Lucene::String());
   term_->_field = WideFieldName(cursor_.field());
   term_->_text.clear();
-  if (!format::AppendCodePoints(cursor_.text(), term_->_text)) cursor_.Damaged("term is not valid UTF-8");
+  if (!AppendCodePoints(cursor_.text(), term_->_text)) cursor_.Damaged("term is not valid UTF-8");
   return term_;
 }
 

@@ -5,9 +5,9 @@
 #include <string_view>
 #include <vector>
 
-#include "elastic/format/field_infos.h"
-#include "elastic/format/segment_files.h"
-#include "elastic/format/term_cursor.h"
+#include "elastic/format/segment/field_infos.h"
+#include "elastic/format/segment/term_cursor.h"
+#include "elastic/segment/segment_files.h"
 #include "elastic/terms/live_term_filter.h"
 #include "vantrel/elastic/library_types.h"
 

@@ -5,7 +5,7 @@
 #include <array>
 #include <vector>
 
-#include "elastic/format/block_digest.h"
+#include "elastic/manifest/block_digest.h"
 #include "support/expect_damage.h"
 #include "support/memory_folder.h"
 

@@ -6,7 +6,7 @@
 #include <map>
 #include <memory>
 
-#include "elastic/format/folder.h"
+#include "elastic/format/io/folder.h"
 #include "support/library_index.h"
 #include "support/temporary_folder.h"
 

@@ -2,10 +2,10 @@
 
 #include <limits>
 
-#include "elastic/format/commit.h"
-#include "elastic/format/field_infos.h"
-#include "elastic/format/segment_files.h"
-#include "elastic/format/term_cursor.h"
+#include "elastic/format/commit/commit.h"
+#include "elastic/format/segment/field_infos.h"
+#include "elastic/format/segment/term_cursor.h"
+#include "elastic/segment/segment_files.h"
 #include "support/random_index.h"
 #include "support/temporary_folder.h"
 

@@ -7,9 +7,7 @@
 
 namespace vantrel::elastic {
 
-namespace format {
-class FileDescriptor;
-}
+class FileLock;
 
 // The right to change the index in a folder: at most one WriteLock stands on it at a time, over all processes
 // and within each. It is a lock on the open file description of a file of its own in the folder. Unlike a
@@ -33,7 +31,7 @@ class VANTREL_ELASTIC_EXPORT WriteLock {
   ~WriteLock();
 
  private:
-  std::unique_ptr<format::FileDescriptor> file_;
+  std::unique_ptr<FileLock> lock_;
 };
 
 }  // namespace vantrel::elastic
