@@ -54,13 +54,17 @@ Outcome PassInBlocks(const Term& term, int32_t block, size_t buffer) {
     postings.Seek(term.info, term.omits_frequencies);
     for (int32_t left = term.info.document_frequency; left > 0; left -= block) {
       postings.PassBlock(std::min(block, left));
+      const uint64_t expected = postings.block_occurrences();
+      const uint32_t bound = postings.block_bound();
+      const uint64_t end = postings.offset();
       uint64_t occurrences = 0;
-      for (const uint32_t frequency : postings.block_frequencies()) {
-        Require(frequency <= postings.block_bound(), "no frequency is above the bound");
+      for (const uint32_t frequency : postings.BlockFrequencies()) {
+        Require(frequency <= bound, "no frequency is above the bound");
         occurrences += frequency;
         frequencies.push_back(frequency);
       }
-      Require(occurrences == postings.block_occurrences(), "the occurrences are those of all documents");
+      Require(occurrences == expected, "the occurrences are those of all documents");
+      Require(postings.offset() == end, "reading the block once more leads to the same place");
     }
   } catch (const vantrel::elastic::IndexError&) {
     return {.failed = true};

@@ -265,7 +265,7 @@ std::vector<HealthFinding> CheckSegments(const format::Folder& folder, const for
 namespace vantrel::elastic {
 
 HealthReport CheckIndexHealth(const std::string& path, const HealthOptions& options) {
-  return check::CheckFolder(format::DiskFolder(path), options);
+  return check::CheckFolder(format::DiskFolder(path, format::DiskFolder::Access::kInOrder), options);
 }
 
 bool IsIndexCorrupted(const std::string& path) { return !CheckIndexHealth(path).clean(); }

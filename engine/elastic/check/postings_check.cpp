@@ -4,22 +4,27 @@
 #include <utility>
 
 #include "elastic/check/mismatch.h"
+#include "elastic/format/io/wide_scan.h"
 
 namespace vantrel::elastic::check {
 namespace {
 
-constexpr size_t kBufferSize = size_t{128} << 10;
+constexpr size_t kPostingsBufferSize = size_t{128} << 10;
+constexpr size_t kSkipsBufferSize = size_t{16} << 10;
+
+// The usual size of a skip entry with its share of higher levels. Longer skip data are read by themselves.
+constexpr size_t kUsualSkipEntry = 8;
 
 }  // namespace
 
 PostingsCheck::PostingsCheck(const std::shared_ptr<const format::ByteSource>& postings,
                              std::shared_ptr<const format::ByteSource> positions, int32_t document_count,
                              const format::TermCursor& dictionary)
-    : postings_(postings, document_count, kBufferSize),
-      skips_(postings, dictionary.skip_interval(), dictionary.most_skip_levels()),
+    : postings_(postings, document_count, kPostingsBufferSize),
+      skips_(postings, dictionary.skip_interval(), dictionary.most_skip_levels(), kSkipsBufferSize),
       skip_interval_(dictionary.skip_interval()),
       reads_skips_(dictionary.format() <= format::kFormatWithSkipLists) {
-  if (positions != nullptr) positions_.emplace(std::move(positions), kBufferSize);
+  if (positions != nullptr) positions_.emplace(std::move(positions), kPostingsBufferSize);
 }
 
 void PostingsCheck::Check(const format::TermCursor& dictionary, const format::FieldInfo& field) {
@@ -27,16 +32,32 @@ void PostingsCheck::Check(const format::TermCursor& dictionary, const format::Fi
   has_positions_ = !field.omits_frequencies && positions_.has_value();
   has_skips_ = reads_skips_ && term.document_frequency >= skip_interval_;
   must_state_length_ = false;
+  GiveSkipsBack();
   postings_.Seek(term, field.omits_frequencies);
   if (has_positions_) positions_->Seek(term.positions_pointer, field.has_payloads);
-  if (has_skips_) {
-    skips_.Seek(term.postings_pointer + term.skip_offset, term.document_frequency, field.has_payloads);
-  }
+  if (has_skips_) SeekSkips(term, field.has_payloads);
   PassDocuments(term);
   postings_end_ = postings_.offset();
   positions_end_ = has_positions_ ? positions_->offset() : term.positions_pointer;
   is_end_exact_ = reads_skips_ || term.skip_offset == 0;
   if (has_skips_) CheckSkipEnds(dictionary);
+}
+
+// Most terms fit the buffer of the postings together with their skip data, which are then read from there.
+void PostingsCheck::SeekSkips(const format::TermInfo& term, bool has_payloads) {
+  const uint64_t pointer = term.postings_pointer + term.skip_offset;
+  const auto entries = static_cast<uint64_t>(term.document_frequency / skip_interval_);
+  const uint64_t length = term.skip_offset + entries * kUsualSkipEntry + format::kScanStep;
+  if (length > kPostingsBufferSize) return skips_.Seek(pointer, term.document_frequency, has_payloads);
+  postings_.ReadAhead(length);
+  // Noted first: what throws leaves readers that have borrowed.
+  borrowed_fill_ = postings_.reader().fills();
+  skips_.SeekBorrowing(postings_.reader(), pointer, term.document_frequency, has_payloads);
+}
+
+void PostingsCheck::GiveSkipsBack() {
+  if (borrowed_fill_.has_value()) skips_.GiveBack();
+  borrowed_fill_.reset();
 }
 
 void PostingsCheck::PassDocuments(const format::TermInfo& term) {
@@ -47,6 +68,7 @@ void PostingsCheck::PassDocuments(const format::TermInfo& term) {
                                    format::PostingsReader::kLongestBlock);
     postings_.PassBlock(block);
     if (has_positions_) PassPositions();
+    if (borrowed_fill_ != postings_.reader().fills()) GiveSkipsBack();
     passed += block;
     if (passed != next_skip || passed == term.document_frequency) continue;
     CompareSkips(term, passed + 1);
@@ -58,7 +80,7 @@ void PostingsCheck::PassPositions() {
   if (!must_state_length_) return positions_->PassBlock(postings_);
   must_state_length_ = false;
   bool at_first = true;
-  for (const uint32_t frequency : postings_.block_frequencies()) {
+  for (const uint32_t frequency : postings_.BlockFrequencies()) {
     positions_->PassDocument(frequency);
     if (at_first && !positions_->states_length()) {
       Refuse(Grade::kUnsafe, positions_->name(), positions_->offset(),

@@ -35,6 +35,8 @@ class PostingsCheck {
   const format::PostingsReader& postings() const { return postings_; }
 
  private:
+  void SeekSkips(const format::TermInfo& term, bool has_payloads);
+  void GiveSkipsBack();
   void PassDocuments(const format::TermInfo& term);
   void PassPositions();
   void CompareSkips(const format::TermInfo& term, int32_t number);
@@ -51,6 +53,8 @@ class PostingsCheck {
   bool has_positions_ = false;
   bool has_skips_ = false;
   bool must_state_length_ = false;
+  std::optional<uint64_t>
+      borrowed_fill_;  // fills() of the postings' reader while the skip data borrow its buffer
 
   uint64_t postings_end_ = 0;
   uint64_t positions_end_ = 0;

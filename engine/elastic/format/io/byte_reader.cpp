@@ -6,6 +6,7 @@
 #include <utility>
 
 #include "elastic/common/text.h"
+#include "elastic/format/io/wide_scan.h"
 
 namespace vantrel::elastic::format {
 
@@ -29,7 +30,9 @@ void ByteReader::Refill(uint64_t wanted) {
   const uint64_t start = offset();
   if (wanted > size() - start) RefuseEnd(start, wanted);
   const auto length = static_cast<size_t>(std::min<uint64_t>(buffer_size_, size() - start));
+  ++fills_;
   if (buffer_.size() < length) buffer_.resize(length);
+  data_ = buffer_.data();
   // Empty while the read runs: should it throw, the next attempt starts at the same offset.
   buffer_start_ = start;
   position_ = filled_ = 0;
@@ -37,16 +40,12 @@ void ByteReader::Refill(uint64_t wanted) {
   filled_ = length;
 }
 
-void ByteReader::Seek(uint64_t offset) {
+void ByteReader::SeekOutside(uint64_t offset) {
   if (offset > size()) {
     Damaged(offset, "offset lies past the end of the file at " + std::to_string(size()));
   }
-  if (offset >= buffer_start_ && offset - buffer_start_ <= filled_) {
-    position_ = static_cast<size_t>(offset - buffer_start_);
-  } else {
-    buffer_start_ = offset;
-    position_ = filled_ = 0;
-  }
+  buffer_start_ = offset;
+  position_ = filled_ = 0;
 }
 
 void ByteReader::Skip(uint64_t count) {
@@ -75,8 +74,8 @@ int64_t ByteReader::ReadLong() {
 
 uint32_t ByteReader::ReadLongVInt() {
   // Two bytes, both in the buffer: most of those that take more than one.
-  if (filled_ - position_ >= 2 && buffer_[position_ + 1] < 0x80) {
-    const uint32_t value = (buffer_[position_] & 0x7fU) | uint32_t{buffer_[position_ + 1]} << 7;
+  if (filled_ - position_ >= 2 && data_[position_ + 1] < 0x80) {
+    const uint32_t value = (data_[position_] & 0x7fU) | uint32_t{data_[position_ + 1]} << 7;
     position_ += 2;
     return value;
   }
@@ -106,7 +105,7 @@ uint64_t ByteReader::ReadLongVLong() {
 void ByteReader::ReadBytes(std::span<uint8_t> out) {
   if (out.size() > remaining()) RefuseEnd(offset(), out.size());
   const size_t buffered = std::min(out.size(), filled_ - position_);
-  std::copy_n(buffer_.begin() + static_cast<ptrdiff_t>(position_), buffered, out.begin());
+  std::copy_n(data_ + position_, buffered, out.begin());
   position_ += buffered;
   out = out.subspan(buffered);
   if (out.empty()) return;
@@ -117,59 +116,69 @@ void ByteReader::ReadBytes(std::span<uint8_t> out) {
     return;
   }
   Refill(out.size());
-  std::copy_n(buffer_.begin(), out.size(), out.begin());
+  std::copy_n(data_, out.size(), out.begin());
   position_ = out.size();
 }
 
 std::span<const uint8_t> ByteReader::Take(uint64_t most) {
   if (position_ == filled_) Refill(1);
   const auto length = static_cast<size_t>(std::min<uint64_t>(most, filled_ - position_));
-  const std::span<const uint8_t> taken(buffer_.data() + position_, length);
+  const std::span<const uint8_t> taken(data_ + position_, length);
   position_ += length;
   return taken;
 }
 
-// Eight bytes at a time, beside those before them: a run of three bytes that announce another one is told by its last.
+// Few of them, in the next eight bytes, are the most frequent case.
 bool ByteReader::PassShortVInts(uint64_t count) {
-  constexpr size_t kLoaded = 8;
   constexpr uint64_t kHighBits = 0x8080808080808080;
   static_assert(std::endian::native == std::endian::little, "the first byte is the lowest of the eight");
-  uint64_t before = 0;  // the high bits of the last eight bytes
+  uint64_t bytes = 0;
+  if (count - 1 >= sizeof bytes || filled_ - position_ < sizeof bytes) return PassManyShortVInts(count);
+  std::memcpy(&bytes, data_ + position_, sizeof bytes);
+  const uint64_t more = bytes & kHighBits;
+  uint64_t ends = more ^ kHighBits;
+  const uint64_t ended = (ends >> 7) * 0x0101010101010101 >> 56;  // how many bits are set
+  if (ended < count || (more & more << 8 & more << 16) != 0) return PassManyShortVInts(count);
+  while (--count > 0) ends &= ends - 1;
+  position_ += static_cast<size_t>(std::countr_zero(ends) / 8 + 1);
+  return true;
+}
+
+bool ByteReader::PassManyShortVInts(uint64_t count) {
   while (count > 0) {
-    if (Window(kLoaded).size() < kLoaded) {
-      return PassShortVIntsAtEnd(count, std::countl_one(before | ~kHighBits) / 8);
-    }
-    const uint8_t* next = buffer_.data() + position_;
-    const uint8_t* const last = buffer_.data() + filled_ - kLoaded;
-    for (; next <= last; next += kLoaded) {
-      uint64_t bytes = 0;
-      std::memcpy(&bytes, next, sizeof bytes);
-      const uint64_t more = bytes & kHighBits;
-      if ((more & (more << 8 | before >> 56) & (more << 16 | before >> 48)) != 0) return false;
-      before = more;
-      uint64_t ends = more ^ kHighBits;
-      const uint64_t ended = (ends >> 7) * 0x0101010101010101 >> 56;  // how many bits are set
-      if (ended >= count) {
-        while (--count > 0) ends &= ends - 1;
-        position_ = static_cast<size_t>(next - buffer_.data() + std::countr_zero(ends) / 8 + 1);
-        return true;
-      }
-      count -= ended;
-    }
-    position_ = static_cast<size_t>(next - buffer_.data());
+    const auto window = Window(kScanStep);
+    if (window.size() < kScanStep) return PassShortVIntsAtEnd(count);
+    const uint8_t* next = window.data();
+    if (!format::PassShortVInts(BestScanInstructions(), next, window.data() + window.size(), count))
+      return false;
+    Advance(static_cast<size_t>(next - window.data()));
   }
   return true;
 }
 
-// `passed` bytes of the first one lie behind.
-bool ByteReader::PassShortVIntsAtEnd(uint64_t count, int passed) {
-  for (int length = passed + 1; count > 0; ++length) {
+// For what is left of the source when it is shorter than a step, and for buffers that are.
+bool ByteReader::PassShortVIntsAtEnd(uint64_t count) {
+  for (int length = 1; count > 0; ++length) {
     if (remaining() == 0 || length > 3) return false;
     if (ReadByte() >= 0x80) continue;
     --count;
     length = 0;
   }
   return true;
+}
+
+void ByteReader::Borrow(const ByteReader& lender) {
+  data_ = lender.data_;
+  buffer_start_ = lender.buffer_start_;
+  position_ = 0;
+  filled_ = lender.filled_;
+}
+
+void ByteReader::GiveBack() {
+  if (data_ == buffer_.data()) return;
+  data_ = buffer_.data();
+  buffer_start_ = offset();
+  position_ = filled_ = 0;
 }
 
 std::string ByteReader::ReadString() {

@@ -36,6 +36,11 @@ class ByteReader {
 
   // The buffer is allocated by the first read, and never larger than the source.
   explicit ByteReader(std::shared_ptr<const ByteSource> source, size_t buffer_size = kDefaultBufferSize);
+  ByteReader(const ByteReader&) = delete;
+  ByteReader& operator=(const ByteReader&) = delete;
+  ByteReader(ByteReader&&) = default;
+  ByteReader& operator=(ByteReader&&) = default;
+  ~ByteReader() = default;
 
   const std::string& name() const { return *name_; }
   uint64_t size() const { return size_; }
@@ -43,22 +48,25 @@ class ByteReader {
   uint64_t remaining() const { return size() - offset(); }
 
   // Moves to `offset`, which may be the end but not past it.
-  void Seek(uint64_t offset);
+  void Seek(uint64_t offset) {
+    if (offset < buffer_start_ || offset - buffer_start_ > filled_) return SeekOutside(offset);
+    position_ = static_cast<size_t>(offset - buffer_start_);
+  }
   void Skip(uint64_t count);
 
   uint8_t ReadByte() {
     if (position_ == filled_) Refill(1);
-    return buffer_[position_++];
+    return data_[position_++];
   }
   int32_t ReadInt();
   int64_t ReadLong();
 
   uint32_t ReadVInt() {
-    if (position_ < filled_ && buffer_[position_] < 0x80) return buffer_[position_++];
+    if (position_ < filled_ && data_[position_] < 0x80) return data_[position_++];
     return ReadLongVInt();
   }
   uint64_t ReadVLong() {
-    if (position_ < filled_ && buffer_[position_] < 0x80) return buffer_[position_++];
+    if (position_ < filled_ && data_[position_] < 0x80) return data_[position_++];
     return ReadLongVLong();
   }
 
@@ -72,13 +80,23 @@ class ByteReader {
   // them, without moving; valid until the next call. Then Advance(), by no more than was handed out.
   std::span<const uint8_t> Window(size_t wanted) {
     if (filled_ - position_ < wanted && remaining() > filled_ - position_) Refill(1);
-    return {buffer_.data() + position_, filled_ - position_};
+    return {data_ + position_, filled_ - position_};
   }
   void Advance(size_t count) { position_ += count; }
 
-  // Moves past `count` VInts, if each of them takes three bytes at most; false, and somewhere behind, where one is
-  // longer, or may be, or the source ends.
+  // Moves past `count` VInts, if each of them takes three bytes at most. False, and at an unspecified offset, where one
+  // is longer, or may be, or the source ends.
   bool PassShortVInts(uint64_t count);
+
+  // Reads from the buffer of `lender`, which reads the same source, as long as the offset lies in that buffer. So bytes
+  // that are already in memory are not read again. Seek() must follow. The buffer must stay as it is until GiveBack():
+  // each change of it changes the lender's fills().
+  void Borrow(const ByteReader& lender);
+  // Stays at the offset and forgets the lender's buffer, if it still uses it.
+  void GiveBack();
+  // How many times the buffer was filled.
+  uint64_t fills() const { return fills_; }
+  size_t buffer_size() const { return buffer_size_; }
 
   // Throws where what watches the source (WatchedFolder) cancels. Reads do the same; this is for work out of proportion
   // to the bytes read.
@@ -94,17 +112,21 @@ class ByteReader {
   uint32_t ReadLongVInt();
   uint64_t ReadLongVLong();
   void Refill(uint64_t wanted);
+  void SeekOutside(uint64_t offset);
   [[noreturn]] void RefuseEnd(uint64_t offset, uint64_t wanted) const;
-  bool PassShortVIntsAtEnd(uint64_t count, int passed);
+  bool PassManyShortVInts(uint64_t count);
+  bool PassShortVIntsAtEnd(uint64_t count);
 
   std::shared_ptr<const ByteSource> source_;
   const std::string* name_;  // the source's
   uint64_t size_;
   size_t buffer_size_;
   std::vector<uint8_t> buffer_;
-  uint64_t buffer_start_ = 0;  // offset in the source of buffer_[0]
-  size_t position_ = 0;        // next byte in buffer_
-  size_t filled_ = 0;          // valid bytes in buffer_
+  const uint8_t* data_ = nullptr;  // the contents of buffer_, or of the lender's
+  uint64_t buffer_start_ = 0;      // offset in the source of data_[0]
+  size_t position_ = 0;            // next byte in data_
+  size_t filled_ = 0;              // valid bytes in data_
+  uint64_t fills_ = 0;
 };
 
 }  // namespace vantrel::elastic::format

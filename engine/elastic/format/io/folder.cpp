@@ -38,11 +38,14 @@ int OpenRegularFile(const std::string& path) {
 
 class FileSource : public ByteSource {
  public:
-  explicit FileSource(std::string path) : path_(std::move(path)), file_(OpenRegularFile(path_)) {
+  FileSource(std::string path, DiskFolder::Access access)
+      : path_(std::move(path)), file_(OpenRegularFile(path_)) {
     struct stat status {};
     if (fstat(file_.get(), &status) != 0) throw IndexIoError(path_, "cannot examine file", errno);
     RequireRegularFile(path_, status);
     size_ = static_cast<uint64_t>(status.st_size);
+    // Only a hint: a file system may not take it.
+    if (access == DiskFolder::Access::kInOrder) posix_fadvise(file_.get(), 0, 0, POSIX_FADV_SEQUENTIAL);
   }
 
   const std::string& name() const override { return path_; }
@@ -74,7 +77,7 @@ bool IsFolder(const std::string& folder, const dirent& entry) {
 
 }  // namespace
 
-DiskFolder::DiskFolder(std::string path) : path_(std::move(path)) {
+DiskFolder::DiskFolder(std::string path, Access access) : path_(std::move(path)), access_(access) {
   // The system would take the part before a zero byte for the path.
   const size_t zero = path_.find('\0');
   if (zero != std::string::npos) {
@@ -107,7 +110,7 @@ bool DiskFolder::Exists(const std::string& name) const {
 }
 
 std::shared_ptr<const ByteSource> DiskFolder::Open(const std::string& name) const {
-  return std::make_shared<FileSource>(JoinPath(path_, name));
+  return std::make_shared<FileSource>(JoinPath(path_, name), access_);
 }
 
 }  // namespace vantrel::elastic::format

@@ -50,8 +50,11 @@ class ForwardingFolder : public Folder {
 // buffers, never by mapping: a bad sector or a file that shrinks is an error then, not a signal.
 class DiskFolder : public Folder {
  public:
+  // How the files are going to be read. The system reads further ahead where that is from begin to end.
+  enum class Access { kAnywhere, kInOrder };
+
   // `path` is used byte for byte. Throws IndexIoError when there is no such folder.
-  explicit DiskFolder(std::string path);
+  explicit DiskFolder(std::string path, Access access = Access::kAnywhere);
 
   const std::string& path() const override { return path_; }
   std::vector<std::string> List() const override;
@@ -60,6 +63,7 @@ class DiskFolder : public Folder {
 
  private:
   std::string path_;
+  Access access_;
 };
 
 }  // namespace vantrel::elastic::format

@@ -23,7 +23,7 @@ int32_t PositionsReader::Advanced(int32_t position, int32_t least, uint32_t dist
   return next;
 }
 
-void PositionsReader::PassBlock(const PostingsReader& postings) {
+void PositionsReader::PassBlock(PostingsReader& postings) {
   // Distances of three bytes are below 2^21: so few of them neither wrap nor descend.
   constexpr uint32_t kFew = 1 << 10;
   if (!has_payloads_ && postings.block_bound() < kFew) {
@@ -31,7 +31,7 @@ void PositionsReader::PassBlock(const PostingsReader& postings) {
     if (reader_.PassShortVInts(postings.block_occurrences())) return;
     reader_.Seek(start);
   }
-  for (const uint32_t frequency : postings.block_frequencies()) PassDocument(frequency);
+  for (const uint32_t frequency : postings.BlockFrequencies()) PassDocument(frequency);
 }
 
 void PositionsReader::PassPlain(uint32_t frequency) {

@@ -32,7 +32,7 @@ class PositionsReader {
   void PassDocument(uint32_t frequency) { has_payloads_ ? PassPayloads(frequency) : PassPlain(frequency); }
 
   // Moves past the positions of the documents of a block.
-  void PassBlock(const PostingsReader& postings);
+  void PassBlock(PostingsReader& postings);
 
   // The length of the last payload; nothing before the term's first one.
   std::optional<uint32_t> payload_length() const { return payload_length_; }

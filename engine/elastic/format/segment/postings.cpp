@@ -3,6 +3,8 @@
 #include <string>
 #include <utility>
 
+#include "elastic/format/io/wide_scan.h"
+
 namespace vantrel::elastic::format {
 
 PostingsReader::PostingsReader(std::shared_ptr<const ByteSource> source, int32_t document_count,
@@ -28,6 +30,7 @@ void PostingsReader::Resume(uint64_t pointer, int32_t document, int32_t left, bo
 namespace {
 
 constexpr size_t kLongestPosting = 10;  // bytes
+constexpr int32_t kFewDocuments = 3;    // are passed sooner one by one than at once
 
 // Goes on with a VInt whose first two bytes announce more; `is_long` where it takes five bytes or more.
 inline const uint8_t* FinishVInt(const uint8_t* next, uint32_t& value, bool& is_long) {
@@ -58,7 +61,7 @@ bool PostingsReader::PassQuickly(int32_t count) {
   const auto window = reader_.Window(static_cast<size_t>(count) * kLongestPosting);
   if (window.size() < static_cast<size_t>(count) * kLongestPosting) return false;
   const uint8_t* next = window.data();
-  uint32_t* const frequencies = block_.data() + block_count_;
+  uint32_t* const frequencies = frequencies_.data() + block_count_;
   uint64_t document = static_cast<uint32_t>(document_);
   uint64_t occurrences = 0;
   uint32_t bound = 0;
@@ -91,17 +94,67 @@ bool PostingsReader::PassQuickly(int32_t count) {
   return true;
 }
 
+// Adds up postings without decoding each number. Returns how many of `count` documents it has passed. It leaves what is
+// rare or damaged to the other ways.
+int32_t PostingsReader::PassWide(int32_t count) {
+  const auto window = reader_.Window(kScanStep);
+  const uint8_t* next = window.data();
+  const PostingsRun run = PassPostings(BestScanInstructions(), next, window.data() + window.size(), count);
+  const uint64_t document = static_cast<uint32_t>(document_) + run.distance;
+  if (run.documents == 0 || document >= document_count_) return 0;
+  reader_.Advance(static_cast<size_t>(next - window.data()));
+  document_ = static_cast<int32_t>(document);
+  left_ -= run.documents;
+  at_first_ = false;
+  block_count_ = run.documents;
+  block_occurrences_ = run.occurrences;
+  block_bound_ = kMostScannedFrequency;
+  knows_frequencies_ = false;
+  return run.documents;
+}
+
 void PostingsReader::PassBlock(int32_t count) {
+  block_start_ = {reader_.offset(), left_, at_first_, document_};
   block_count_ = 0;
   block_occurrences_ = 0;
   block_bound_ = 0;
+  knows_frequencies_ = true;
+  if (count <= kFewDocuments) return PassOneByOne(count);
+  if (!omits_frequencies_) {
+    const int32_t passed = PassWide(count);
+    if (passed == count) return;
+    count -= passed;
+  }
   // The first one may be document 0, at no distance.
-  if (at_first_ && count > 0 && Next()) {
-    AddToBlock(frequency_);
+  if (at_first_) {
+    PassOneByOne(1);
     --count;
   }
   if (omits_frequencies_ ? PassQuickly<true>(count) : PassQuickly<false>(count)) return;
-  for (; count > 0 && Next(); --count) AddToBlock(frequency_);
+  PassOneByOne(count);
+}
+
+void PostingsReader::PassOneByOne(int32_t count) {
+  for (; count > 0 && Next(); --count) {
+    frequencies_[static_cast<size_t>(block_count_++)] = frequency_;
+    block_occurrences_ += frequency_;
+    block_bound_ |= frequency_;
+  }
+}
+
+std::span<const uint32_t> PostingsReader::BlockFrequencies() {
+  if (!knows_frequencies_) {
+    const int32_t count = std::exchange(block_count_, 0);
+    reader_.Seek(block_start_.offset);
+    left_ = block_start_.left;
+    at_first_ = block_start_.at_first;
+    document_ = block_start_.document;
+    block_occurrences_ = 0;
+    block_bound_ = 0;
+    PassOneByOne(count);
+    knows_frequencies_ = true;
+  }
+  return std::span(frequencies_).first(static_cast<size_t>(block_count_));
 }
 
 void PostingsReader::Refuse(uint32_t distance) const {

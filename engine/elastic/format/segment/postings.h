@@ -1,5 +1,6 @@
 #pragma once
 
+#include <algorithm>
 #include <array>
 #include <cstdint>
 #include <memory>
@@ -51,19 +52,23 @@ class PostingsReader {
   }
 
   // Moves past that many documents at once, as Next() would, of those that are left; at most kLongestBlock. Then
-  // frequency() tells nothing.
+  // frequency() says nothing.
   void PassBlock(int32_t count);
   static constexpr int32_t kLongestBlock = 128;
 
-  // Of the documents of the block: how often each holds the term, all of them together, and a bound for each.
-  std::span<const uint32_t> block_frequencies() const {
-    return std::span(block_).first(static_cast<size_t>(block_count_));
-  }
+  // The sum of the frequencies in the block, and a number that none of them exceeds.
   uint64_t block_occurrences() const { return block_occurrences_; }
   uint32_t block_bound() const { return block_bound_; }
+  // The frequencies in the block. May read the block again. Throws like Next().
+  std::span<const uint32_t> BlockFrequencies();
 
   int32_t document() const { return document_; }
   uint32_t frequency() const { return frequency_; }
+
+  // Fills the buffer with the next bytes, as many of these as fit it.
+  void ReadAhead(size_t bytes) { reader_.Window(std::min(bytes, reader_.buffer_size())); }
+  // For a reader of the same source to borrow from.
+  const ByteReader& reader() const { return reader_; }
 
   // Where the next document begins, or what follows the last one.
   uint64_t offset() const { return reader_.offset(); }
@@ -72,13 +77,10 @@ class PostingsReader {
 
  private:
   [[noreturn]] void Refuse(uint32_t distance) const;
+  int32_t PassWide(int32_t count);
   template <bool kOmitsFrequencies>
   bool PassQuickly(int32_t count);
-  void AddToBlock(uint32_t frequency) {
-    block_[static_cast<size_t>(block_count_++)] = frequency;
-    block_occurrences_ += frequency;
-    block_bound_ |= frequency;
-  }
+  void PassOneByOne(int32_t count);
 
   ByteReader reader_;
   uint32_t document_count_;
@@ -89,7 +91,16 @@ class PostingsReader {
   uint32_t frequency_ = 0;
   uint64_t start_ = 0;
 
-  std::array<uint32_t, kLongestBlock> block_{};
+  // Of the block.
+  struct Place {
+    uint64_t offset = 0;
+    int32_t left = 0;
+    bool at_first = true;
+    int32_t document = 0;
+  };
+  Place block_start_;
+  bool knows_frequencies_ = false;
+  std::array<uint32_t, kLongestBlock> frequencies_{};
   int32_t block_count_ = 0;
   uint64_t block_occurrences_ = 0;
   uint32_t block_bound_ = 0;

@@ -6,16 +6,17 @@
 namespace vantrel::elastic::format {
 namespace {
 
-constexpr size_t kSkipBufferSize = 4096;
-
 // Five numbers of up to 5, 5, 5, 5 and 9 bytes.
 constexpr uint64_t kLongestEntry = 29;
 
 }  // namespace
 
 SkipListReader::SkipListReader(std::shared_ptr<const ByteSource> source, int32_t skip_interval,
-                               int32_t most_levels)
-    : source_(std::move(source)), skip_interval_(skip_interval), most_levels_(most_levels) {}
+                               int32_t most_levels, size_t buffer_size)
+    : source_(std::move(source)),
+      skip_interval_(skip_interval),
+      most_levels_(most_levels),
+      buffer_size_(buffer_size) {}
 
 int SkipListReader::LevelsOf(int32_t document_frequency) const {
   int levels = 0;
@@ -25,11 +26,30 @@ int SkipListReader::LevelsOf(int32_t document_frequency) const {
   return levels;
 }
 
-void SkipListReader::Seek(uint64_t pointer, int32_t document_frequency, bool has_payloads) {
+void SkipListReader::Prepare(int32_t document_frequency, bool has_payloads) {
   has_payloads_ = has_payloads;
   document_frequency_ = document_frequency;
   level_count_ = LevelsOf(document_frequency);
-  while (levels_.size() < static_cast<size_t>(level_count_)) levels_.emplace_back(source_, kSkipBufferSize);
+  while (levels_.size() < static_cast<size_t>(level_count_)) levels_.emplace_back(source_, buffer_size_);
+}
+
+void SkipListReader::Seek(uint64_t pointer, int32_t document_frequency, bool has_payloads) {
+  Prepare(document_frequency, has_payloads);
+  SeekLevels(pointer);
+}
+
+void SkipListReader::SeekBorrowing(const ByteReader& lender, uint64_t pointer, int32_t document_frequency,
+                                   bool has_payloads) {
+  Prepare(document_frequency, has_payloads);
+  for (Level& level : levels_) level.reader.Borrow(lender);
+  SeekLevels(pointer);
+}
+
+void SkipListReader::GiveBack() {
+  for (Level& level : levels_) level.reader.GiveBack();
+}
+
+void SkipListReader::SeekLevels(uint64_t pointer) {
   for (int number = level_count_ - 1; number >= 0; --number) {
     Level& level = levels_[static_cast<size_t>(number)];
     level.entry = Entry();

@@ -45,10 +45,19 @@ class SkipListReader {
     uint64_t end = 0;    // of the entry without `child`, from the beginning of its level
   };
 
-  SkipListReader(std::shared_ptr<const ByteSource> source, int32_t skip_interval, int32_t most_levels);
+  static constexpr size_t kSkipBufferSize = 4096;
+
+  SkipListReader(std::shared_ptr<const ByteSource> source, int32_t skip_interval, int32_t most_levels,
+                 size_t buffer_size = kSkipBufferSize);
 
   // Moves before the first entry of each level of a term. Throws IndexDamagedError, IndexIoError, as does Next().
   void Seek(uint64_t pointer, int32_t document_frequency, bool has_payloads);
+
+  // Seek() that takes from the buffer of `lender`, which reads the same source, what it holds of the skip data. GiveBack()
+  // must come before the next Seek() and before Next() once that buffer has changed (ByteReader::Borrow).
+  void SeekBorrowing(const ByteReader& lender, uint64_t pointer, int32_t document_frequency,
+                     bool has_payloads);
+  void GiveBack();
 
   // Where a reader jumps to that looks for a document: behind the last place that lies before it.
   struct Landing {
@@ -86,6 +95,8 @@ class SkipListReader {
     int64_t passed = 0;  // documents before the next entry's place, by SkipTo()
   };
 
+  void Prepare(int32_t document_frequency, bool has_payloads);
+  void SeekLevels(uint64_t pointer);
   void RequireLength(const ByteReader& reader, uint64_t pointer, int number, uint64_t length) const;
   void ReadEntry(int number);
   bool LoadNext(int number, int64_t interval, uint32_t document_count);
@@ -95,6 +106,7 @@ class SkipListReader {
   std::shared_ptr<const ByteSource> source_;
   int32_t skip_interval_;
   int32_t most_levels_;
+  size_t buffer_size_;  // of each level
   bool has_payloads_ = false;
   int32_t document_frequency_ = 0;
   int level_count_ = 0;

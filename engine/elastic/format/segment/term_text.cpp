@@ -1,6 +1,8 @@
 #include "elastic/format/segment/term_text.h"
 
 #include <algorithm>
+#include <bit>
+#include <cstring>
 #include <span>
 
 #include "elastic/common/text.h"
@@ -42,7 +44,26 @@ void TermText::Read(ByteReader& reader, uint64_t start) {
   is_utf8_ ? ReadUtf8(reader, start) : ReadUnits(reader, start);
 }
 
+// Takes the next text where it lies in the buffer, and both its lengths take one byte. False, with nothing changed, where
+// it does not, or is damaged.
+bool TermText::ReadFromWindow(ByteReader& reader) {
+  constexpr size_t kTwoLengths = 2;
+  constexpr size_t kShort = 0x7f;
+  static_assert(2 * kShort <= kLongestTerm);
+  const std::span<const uint8_t> window = reader.Window(kTwoLengths + kShort + kSlack);
+  if (window.size() < kTwoLengths + kSlack) return false;
+  const uint32_t prefix = window[0];
+  const uint32_t suffix = window[1];
+  if ((prefix | suffix) > kShort || prefix > length_ || window.size() < kTwoLengths + kSlack + suffix) {
+    return false;
+  }
+  TakeNext(prefix, window.data() + kTwoLengths, suffix);
+  reader.Advance(kTwoLengths + suffix);
+  return true;
+}
+
 void TermText::ReadUtf8(ByteReader& reader, uint64_t start) {
+  if (ReadFromWindow(reader)) return;
   const uint32_t prefix = reader.ReadVInt();
   const uint32_t suffix = reader.ReadVInt();
   if (prefix > length_) {
@@ -115,14 +136,35 @@ void TermText::AppendConverted(std::u16string_view units) {
   length_ += converted_.size();
 }
 
-bool TermText::IsValid() {
-  if (valid_length_ < length_) valid_length_ += WellFormedLength(text().substr(valid_length_));
+// Whether what follows is ASCII, if it is no longer than the room behind the text.
+bool TermText::IsShortAsciiFrom(size_t offset) const {
+  static_assert(std::endian::native == std::endian::little, "the first byte of a word is its lowest");
+  constexpr uint64_t kHighBits = 0x8080808080808080;
+  const size_t length = length_ - offset;
+  if (length == 0 || length > kSlack) return false;
+  uint64_t words[2];
+  static_assert(sizeof words == kSlack);
+  std::memcpy(words, bytes_.data() + offset, sizeof words);
+  // What lies behind the text is shifted out.
+  if (length <= 8) return (words[0] & kHighBits) << (8 * (8 - length)) == 0;
+  return (words[0] & kHighBits) == 0 && (words[1] & kHighBits) << (8 * (kSlack - length)) == 0;
+}
+
+bool TermText::ValidateOn() {
+  if (IsShortAsciiFrom(valid_length_)) {
+    valid_length_ = length_;
+    return true;
+  }
+  valid_length_ += WellFormedLength(text().substr(valid_length_));
   return valid_length_ == length_;
 }
 
-bool TermText::IsKept() {
-  if (!IsValid()) return false;
-  if (kept_length_ < length_) kept_length_ += KeptLength(text().substr(kept_length_));
+bool TermText::KeepOn() {
+  if (IsShortAsciiFrom(kept_length_)) {
+    kept_length_ = length_;
+    return true;
+  }
+  kept_length_ += KeptLength(text().substr(kept_length_));
   return kept_length_ == length_;
 }
 

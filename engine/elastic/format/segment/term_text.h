@@ -63,8 +63,8 @@ class TermText {
   TermOrders ascends_by() const { return ascends_by_; }
 
   // Whether it is well-formed UTF-8, and whether the index library can keep it (IsKeptText).
-  bool IsValid();
-  bool IsKept();
+  bool IsValid() { return valid_length_ == length_ || ValidateOn(); }
+  bool IsKept() { return IsValid() && (kept_length_ == length_ || KeepOn()); }
 
   // The empty text, as before the first term.
   void Clear();
@@ -76,12 +76,16 @@ class TermText {
  private:
   static constexpr size_t kSlack = 16;
 
+  bool ReadFromWindow(ByteReader& reader);
   void ReadUtf8(ByteReader& reader, uint64_t start);
   void ReadUnits(ByteReader& reader, uint64_t start);
   void TakeUnits(size_t prefix);
   void Compare(uint32_t prefix, const uint8_t* suffix, uint32_t length);
   void CompareOn(size_t same, const uint8_t* suffix, uint32_t length);
   size_t CharacterStart(size_t offset) const;
+  bool IsShortAsciiFrom(size_t offset) const;
+  bool ValidateOn();
+  bool KeepOn();
   void ForgetFrom(size_t offset);
   void Reserve(size_t length) {
     if (length + kSlack > bytes_.size()) Grow(length);

@@ -3,8 +3,10 @@
 #include <gtest/gtest.h>
 
 #include <limits>
+#include <memory>
 #include <random>
 #include <string>
+#include <utility>
 
 #include "support/byte_writer.h"
 #include "support/expect_damage.h"
@@ -16,6 +18,8 @@ namespace {
 using ::quorelastic::testing::ByteWriter;
 using ::quorelastic::testing::ExpectDamage;
 using ::quorelastic::testing::ExpectIndexError;
+using ::quorelastic::testing::MemoryFile;
+using ::quorelastic::testing::MemorySource;
 using ::quorelastic::testing::SourceOf;
 
 TEST(ByteReaderTest, ReadsNumbersOfFixedLengthBigEndianAndSigned) {
@@ -82,6 +86,102 @@ TEST(ByteReaderTest, PassesNoShortNumbersPastTheEnd) {
   EXPECT_FALSE(reader.PassShortVInts(11));
   ByteReader torn(SourceOf("1234567\x80"), 8);
   EXPECT_FALSE(torn.PassShortVInts(8));
+}
+
+// Counts how often it is read.
+std::shared_ptr<const ByteSource> CountingSource(const std::string& bytes, int& reads) {
+  return std::make_shared<MemorySource>("memory",
+                                        MemoryFile{.bytes = bytes, .before_read = [&reads] { ++reads; }});
+}
+
+TEST(ByteReaderTest, ReadsWhatAnotherReaderHoldsFromItsBuffer) {
+  int reads = 0;
+  const auto source = CountingSource("0123456789abcdef", reads);
+  ByteReader lender(source, 8);
+  lender.Seek(4);
+  lender.ReadByte();
+  EXPECT_EQ(reads, 1);
+  ByteReader borrower(source, 8);
+  borrower.Borrow(lender);
+  borrower.Seek(6);
+  EXPECT_EQ(borrower.ReadByte(), '6');
+  EXPECT_EQ(borrower.Take(5).size(), 5U);
+  EXPECT_EQ(borrower.offset(), 12U);
+  EXPECT_EQ(reads, 1);
+  // Behind the buffer, and before it.
+  EXPECT_EQ(borrower.ReadByte(), 'c');
+  borrower.Borrow(lender);
+  borrower.Seek(3);
+  EXPECT_EQ(borrower.ReadByte(), '3');
+  EXPECT_EQ(reads, 3);
+  EXPECT_EQ(lender.offset(), 5U);
+  EXPECT_EQ(lender.ReadByte(), '5');
+}
+
+TEST(ByteReaderTest, GoesOnByItselfOnceItHasGivenBack) {
+  const auto source = SourceOf("0123456789abcdef");
+  ByteReader lender(source, 4);
+  ByteReader borrower(source, 4);
+  EXPECT_EQ(lender.ReadByte(), '0');
+  const uint64_t fills = lender.fills();
+  borrower.Borrow(lender);
+  borrower.Seek(1);
+  EXPECT_EQ(borrower.ReadByte(), '1');
+  lender.Seek(8);
+  EXPECT_EQ(lender.ReadByte(), '8');
+  EXPECT_NE(lender.fills(), fills);
+  borrower.GiveBack();
+  EXPECT_EQ(borrower.offset(), 2U);
+  EXPECT_EQ(borrower.ReadByte(), '2');
+  // It has left the lender's buffer already: there is nothing to give back.
+  borrower.GiveBack();
+  EXPECT_EQ(borrower.ReadByte(), '3');
+}
+
+TEST(ByteReaderTest, BorrowsFromAReaderThatHasReadNothing) {
+  const auto source = SourceOf("0123");
+  const ByteReader lender(source);
+  ByteReader borrower(source);
+  borrower.Borrow(lender);
+  borrower.Seek(2);
+  EXPECT_EQ(borrower.ReadByte(), '2');
+  borrower.GiveBack();
+  EXPECT_EQ(borrower.ReadByte(), '3');
+  EXPECT_EQ(borrower.remaining(), 0U);
+}
+
+TEST(ByteReaderTest, ReadsOnFromABorrowedBufferWhereverThatEnds) {
+  ByteWriter bytes;
+  for (int i = 0; i < 60; ++i) bytes.VInt(int64_t{1} << (i % 30));
+  const auto source = SourceOf(bytes.bytes());
+  for (size_t buffer = 1; buffer < bytes.size(); ++buffer) {
+    ByteReader lender(source, buffer);
+    lender.ReadByte();
+    for (int given_back_after = 0; given_back_after < 60; ++given_back_after) {
+      ByteReader borrower(source, 16);
+      borrower.Borrow(lender);
+      borrower.Seek(0);
+      for (int i = 0; i < 60; ++i) {
+        if (i == given_back_after) borrower.GiveBack();
+        ASSERT_EQ(borrower.ReadVInt(), 1U << (i % 30)) << "number " << i << ", buffer of " << buffer;
+      }
+    }
+  }
+}
+
+TEST(ByteReaderTest, KeepsItsPlaceWhenItIsMoved) {
+  const auto source = SourceOf("0123456789");
+  ByteReader lender(source, 4);
+  EXPECT_EQ(lender.ReadByte(), '0');
+  ByteReader borrower(source, 4);
+  borrower.Borrow(lender);
+  borrower.Seek(1);
+  ByteReader moved_lender(std::move(lender));
+  ByteReader moved(std::move(borrower));
+  EXPECT_EQ(moved_lender.ReadByte(), '1');
+  EXPECT_EQ(moved.ReadByte(), '1');
+  moved.GiveBack();
+  EXPECT_EQ(moved.ReadByte(), '2');
 }
 
 TEST(ByteReaderTest, RefusesAVIntOfMoreThan32BitsWhereItBegins) {

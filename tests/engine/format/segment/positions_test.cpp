@@ -102,6 +102,42 @@ TEST(PositionsTest, PassesBlocksAsItPassesDocuments) {
   }
 }
 
+// What the error says of documents with one position each, passed in one block or one by one.
+std::string PositionsDamage(const std::string& positions, int32_t documents, bool in_a_block) {
+  const std::string postings = "\1" + std::string(static_cast<size_t>(documents) + 200, '\3');
+  PostingsReader reader(SourceOf(postings), documents);
+  reader.Seek({.document_frequency = documents}, false);
+  PositionsReader places(SourceOf(positions));
+  places.Seek(0, false);
+  try {
+    reader.PassBlock(documents);
+    if (in_a_block) {
+      places.PassBlock(reader);
+    } else {
+      for (int32_t i = 0; i < documents; ++i) places.PassDocument(1);
+    }
+  } catch (const IndexDamagedError& error) {
+    return error.what();
+  }
+  return "";
+}
+
+TEST(PositionsTest, RefusesInABlockWhatItRefusesOneByOneAtTheSamePlace) {
+  const ByteWriter damaged[] = {ByteWriter().VInt(-2), ByteWriter().Raw("\xff\xff\xff\xff\xff\xff"),
+                                ByteWriter().Raw("\x80\x80\x80\x80\x10")};
+  for (const ByteWriter& position : damaged) {
+    for (size_t place = 0; place < 100; ++place) {
+      for (const size_t behind : {size_t{0}, size_t{10}, size_t{2000}}) {
+        const std::string bytes = std::string(place, '\3') + position.bytes() + std::string(behind, '\3');
+        const auto documents = static_cast<int32_t>(place + 1 + std::min<size_t>(behind, 20));
+        const std::string expected = PositionsDamage(bytes, documents, false);
+        EXPECT_NE(expected, "");
+        EXPECT_EQ(PositionsDamage(bytes, documents, true), expected);
+      }
+    }
+  }
+}
+
 TEST(PositionsTest, RefusesInABlockWhatItRefusesInADocument) {
   const std::string postings = ByteWriter().VInt(0).VInt(2).VInt(3).bytes();
   PostingsReader reader(SourceOf(postings), 9);

@@ -3,6 +3,7 @@
 #include <gmock/gmock.h>
 #include <gtest/gtest.h>
 
+#include <algorithm>
 #include <limits>
 #include <random>
 #include <string>
@@ -136,9 +137,12 @@ void ExpectSameInABlock(const std::vector<Posting>& postings, bool omits_frequen
   at_once.PassBlock(count);
   EXPECT_EQ(at_once.offset(), bytes.size());
   EXPECT_EQ(at_once.document(), one_by_one.document());
-  EXPECT_THAT(at_once.block_frequencies(), ElementsAreArray(frequencies));
   EXPECT_EQ(at_once.block_occurrences(), occurrences);
-  EXPECT_EQ(at_once.block_bound(), bits);
+  EXPECT_EQ(at_once.block_bound() | bits, at_once.block_bound());
+  EXPECT_LE(at_once.block_bound(), std::max(bits, 127U));
+  EXPECT_THAT(at_once.BlockFrequencies(), ElementsAreArray(frequencies));
+  EXPECT_EQ(at_once.offset(), bytes.size());
+  EXPECT_EQ(at_once.document(), one_by_one.document());
   EXPECT_FALSE(at_once.Next());
 }
 
@@ -182,6 +186,38 @@ TEST_P(PostingsBlockTest, ANumberOfFiveBytesIsPassedWhereverItStands) {
     ExpectSameInABlock(postings, true, GetParam());
     postings[place] = {1, 0xffffffff};
     ExpectSameInABlock(postings, false, GetParam());
+  }
+}
+
+// What the error says of the documents, passed in one block or one by one.
+std::string PostingsDamage(const std::string& bytes, int32_t count, bool in_a_block) {
+  PostingsReader reader(SourceOf(bytes), 5000);
+  reader.Seek(Term(count, 0), false);
+  try {
+    if (in_a_block) {
+      reader.PassBlock(count);
+    } else {
+      while (reader.Next()) continue;
+    }
+  } catch (const IndexDamagedError& error) {
+    return error.what();
+  }
+  return "";
+}
+
+TEST(PostingsTest, RefusesInABlockWhatItRefusesOneByOneAtTheSamePlace) {
+  const ByteWriter damaged[] = {ByteWriter().VInt(1), ByteWriter().VInt(2).VInt(0), ByteWriter().VInt(10001),
+                                ByteWriter().VInt(-1), ByteWriter().Byte(0x81).Byte(0)};
+  for (const ByteWriter& posting : damaged) {
+    for (size_t place = 1; place < 100; ++place) {
+      for (const size_t behind : {size_t{0}, size_t{10}, size_t{2000}}) {
+        const std::string bytes = std::string(place, '\3') + posting.bytes() + std::string(behind, '\3');
+        const auto count = static_cast<int32_t>(place + 1 + std::min<size_t>(behind, 20));
+        const std::string expected = PostingsDamage(bytes, count, false);
+        EXPECT_NE(expected, "");
+        EXPECT_EQ(PostingsDamage(bytes, count, true), expected);
+      }
+    }
   }
 }
 

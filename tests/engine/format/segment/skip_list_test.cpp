@@ -114,6 +114,30 @@ ByteWriter TwoLevels() {
   return ByteWriter().VLong(upper.size()).Raw(upper.bytes()).Raw(lower.bytes());
 }
 
+TEST(SkipListTest, YieldsTheSameEntriesFromABorrowedBufferWhereverThatEnds) {
+  const std::string before(5, 'x');
+  const std::string bytes = before + TwoLevels().bytes();
+  const auto source = SourceOf(bytes);
+  for (size_t buffer = 1; buffer <= bytes.size(); ++buffer) {
+    for (int given_back_after = 0; given_back_after <= 4; ++given_back_after) {
+      ByteReader lender(source, buffer);
+      lender.ReadByte();
+      SkipListReader reader(source, 4, kMostLevels);
+      reader.SeekBorrowing(lender, before.size(), 16, false);
+      for (int entry = 0; entry < 4; ++entry) {
+        if (entry == given_back_after) {
+          lender.Seek(bytes.size() - 1);
+          lender.ReadByte();
+          reader.GiveBack();
+        }
+        ASSERT_EQ(reader.Next(0).document, static_cast<uint32_t>(30 + 40 * entry)) << buffer;
+      }
+      ASSERT_EQ(reader.Next(1).document, 150U) << buffer;
+      EXPECT_EQ(reader.offset(0), bytes.size());
+    }
+  }
+}
+
 TEST(SkipListTest, JumpsBehindTheLastEntryThatLiesBefore) {
   const auto landing = [](int32_t target) { return ReaderOf(TwoLevels(), 17, false).SkipTo(target, 1000); };
   EXPECT_EQ(landing(-5).passed, 0);
