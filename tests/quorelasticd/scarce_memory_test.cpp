@@ -139,7 +139,8 @@ Outcome WithServer(const std::function<Outcome(const RunningServer&)>& action) {
   }
   int status = 0;
   waitpid(child, &status, 0);
-  const bool is_outcome = WIFEXITED(status) && WEXITSTATUS(status) >= kFine && WEXITSTATUS(status) <= kNotReached;
+  const bool is_outcome =
+      WIFEXITED(status) && WEXITSTATUS(status) >= kFine && WEXITSTATUS(status) <= kNotReached;
   return is_outcome ? Outcome(WEXITSTATUS(status)) : kFine;
 }
 

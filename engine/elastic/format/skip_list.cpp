@@ -70,7 +70,8 @@ void SkipListReader::RequireShortTop() const {
   if (level_count_ < 2) return;
   const Level& top = levels_[static_cast<size_t>(level_count_ - 1)];
   if (top.end - top.start <= kMost) return;
-  top.reader.Damaged(top.start, "the highest level of skip data takes " + std::to_string(top.end - top.start) +
+  top.reader.Damaged(top.start, "the highest level of skip data takes " +
+                                    std::to_string(top.end - top.start) +
                                     " bytes, which the index library would take into memory");
 }
 
@@ -144,8 +145,8 @@ void SkipListReader::Descend(int number, const Entry& from, int64_t passed) {
 
 SkipListReader::Landing SkipListReader::SkipTo(int32_t target, int32_t document_count) {
   Landing landing;
+  RequireShortTop();  // the library takes it into memory whatever the target is
   if (target <= 0) return landing;
-  RequireShortTop();
   int64_t interval = skip_interval_;
   for (int number = 1; number < level_count_; ++number) {
     interval *= skip_interval_;

@@ -168,7 +168,8 @@ bool NeedsMuchMemory(const format::Folder& folder, const format::SegmentInfo& in
     const auto fields = static_cast<uint32_t>(format::ReadFieldInfos(files.Open(".fnm")).size());
     const bool has_much_deleted =
         files.HasDeletions() && static_cast<uint64_t>(info.document_count) / 8 > kMuchMemory;
-    return has_much_deleted || HasLongTexts(files, fields) || MostMemoryOfVectors(files, fields) > kMuchMemory;
+    return has_much_deleted || HasLongTexts(files, fields) ||
+           MostMemoryOfVectors(files, fields) > kMuchMemory;
   } catch (const IndexDamagedError&) {
   } catch (const format::FileMissingError&) {
   }
@@ -187,13 +188,19 @@ UnsafeSegments FindUnsafeSegments(const std::string& path, const format::Commit&
   const format::DiskFolder folder(path);
   format::SharedFiles shared(folder);
   for (const format::SegmentInfo& segment : commit.segments) {
-    if (!unsafe.contains(segment.name) && NeedsMuchMemory(folder, segment, shared)) large.push_back(segment.name);
+    if (!unsafe.contains(segment.name) && NeedsMuchMemory(folder, segment, shared))
+      large.push_back(segment.name);
   }
   UnsafeSegments segments;
   if (unsafe.empty() && large.empty()) return segments;
   segments.index_bytes = SizeOf(report);
   UnsafeTrials trials(path, segments);
   trials.TryAll(large);
+  // Nothing was found wrong with them that they could be dropped for.
+  if (!segments.condemned.empty()) {
+    throw IndexError(path, "the index library would take too much memory or time to check segment " +
+                               *segments.condemned.begin() + "; nothing was changed");
+  }
   trials.TryAll(std::vector<std::string>(unsafe.begin(), unsafe.end()));
   return segments;
 }

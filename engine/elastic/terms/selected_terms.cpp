@@ -12,8 +12,7 @@ SelectedTerms::SelectedTerms(format::SegmentFiles files, const format::TermSelec
                              size_t buffer_size)
     : files_(std::move(files)),
       fields_(format::ReadFieldInfos(files_.field_infos)),
-      walk_(files_.terms, files_.terms_index, fields_, files_.info.document_count, selection,
-            buffer_size) {
+      walk_(files_.terms, files_.terms_index, fields_, files_.info.document_count, selection, buffer_size) {
   // Others want descriptors, too.
   files_.field_infos.reset();
   files_.terms_index.reset();

@@ -49,7 +49,7 @@ class SelectedTerms {
 };
 
 // What the texts of all segments that are read together may take, in bytes as DictionaryWalk counts them.
-inline constexpr size_t kMostTextRoom = size_t{16} << 20;
+inline constexpr size_t kMostTextRoom = size_t{12} << 20;
 
 // Appends the terms of a selection in some segments. Throws IndexDamagedError where the texts take more than
 // kMostTextRoom.

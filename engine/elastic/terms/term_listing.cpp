@@ -18,8 +18,8 @@ std::vector<std::unique_ptr<SelectedTerms>> OpenSegments(const std::string& path
   const format::DiskFolder folder(path);
   std::vector<std::unique_ptr<SelectedTerms>> segments;
   AddSelectedTerms(
-      format::OpenNewestSegments(folder, request.live_only ? format::Need::kAll : format::Need::kTerms), selection,
-      segments);
+      format::OpenNewestSegments(folder, request.live_only ? format::Need::kAll : format::Need::kTerms),
+      selection, segments);
   return segments;
 }
 

@@ -226,6 +226,14 @@ TEST_F(CraftedBoundsTest, LongTextsThatEntriesOfTheIndexShareTakeLittle) {
   ExpectLittleMemory("clean");
 }
 
+TEST_F(CraftedBoundsTest, ARepairLeavesAloneWhatIsCleanButNeedsMuchMemory) {
+  SharedPrefixIndex{.terms = 20'000, .interval = 1}.Write(path());
+  const LimitedRun run = RunToolLimited({"-a", "repair", "-d", path()});
+  EXPECT_THAT(run.errors, HasSubstr("too much memory or time to check segment _0; nothing was changed"));
+  EXPECT_TRUE(std::filesystem::exists(folder_ / "segments_1"));
+  EXPECT_TRUE(CheckIndexHealth(path()).clean());
+}
+
 TEST_F(CraftedBoundsTest, LongTextsThatTermsOfAVectorShareTakeLittle) {
   SharedPrefixIndex{.terms = 3000, .has_vectors = true}.Write(path());
   field_ = "f";

@@ -130,7 +130,8 @@ TEST(HandMadeIndexTest, ACommitOfTooManySegmentsIsAnErrorThatSaysSoLeavesNothing
   WriteCommit(folder, 1, {"_0"});
   const FewOpenFiles limit(64);
   for (int run = 0; run < 2; ++run) {
-    ExpectIndexError("cannot open file: Too many open files", [&] { newClassInit<IndexInfo>(folder.path()); });
+    ExpectIndexError("cannot open file: Too many open files",
+                     [&] { newClassInit<IndexInfo>(folder.path()); });
   }
   std::filesystem::remove(folder / "segments_2");
   EXPECT_EQ(newClassInit<IndexInfo>(folder.path())->GetSegmentNum(), 1);
