@@ -55,7 +55,7 @@ struct Commit {
 
 // Room for any commit: its bytes, its segments, and of all its segments together the generations of norms, and the
 // strings of diagnostics and user data with their bytes. They bound the time and memory of whoever reads a commit; the
-// index library takes a hundred times the bytes of a short string.
+// index library takes some two hundred bytes for a short string.
 inline constexpr uint64_t kLargestCommit = uint64_t{8} << 20;
 inline constexpr int32_t kMostSegments = int32_t{1} << 12;
 inline constexpr int64_t kMostNormGenerations = int64_t{1} << 19;

@@ -10,7 +10,7 @@
 namespace vantrel::elastic::format {
 namespace {
 
-// Of all segments together, in the files: twenty times as much in memory where they are very short.
+// Of all segments together, in the files: seventeen times as much in memory where they are very short.
 constexpr uint64_t kMostNames = uint64_t{4} << 20;
 
 bool IsCompound(const Folder& folder, const SegmentInfo& info, const std::string& compound_name) {

@@ -32,6 +32,7 @@ void ReadAlong(Check check) {
 
 // What the library, and what goes along, take in memory: a little more than measured.
 constexpr uint64_t kPerSegment = uint64_t{28} << 10;
+constexpr uint64_t kPerNormGeneration = 64;
 constexpr uint64_t kPerName = 640;  // of a field or a sub-file
 constexpr uint64_t kPerNameByte = 18;
 constexpr uint64_t kPerIndexCharacter = 4;  // of a text in the index over a dictionary
@@ -102,7 +103,10 @@ void OpeningCheck::CheckCommit(const Source& source, int64_t generation) {
   if (FirstInt(source) < format::kNewestCommitFormat) return;
   format::Commit commit = ReadCommit(source, generation, format::CommitChecksum::kPassOver);
   segments_.reserve(commit.segments.size());
-  CountMemory(source->name(), commit.segments.size() * kPerSegment);
+  for (const SegmentInfo& segment : commit.segments) {
+    const uint64_t norms = segment.norm_generations.has_value() ? segment.norm_generations->size() : 0;
+    CountMemory(source->name(), kPerSegment + kPerNormGeneration * norms);
+  }
   for (SegmentInfo& segment : commit.segments) segments_.push_back({.info = std::move(segment)});
 }
 
