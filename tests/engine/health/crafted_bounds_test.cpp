@@ -105,7 +105,7 @@ class CraftedBoundsTest : public ::testing::Test {
   // The only segment, so many times.
   void Multiply(int segments) const {
     ByteWriter commit;
-    constexpr int kNextNumber = 100'000;  // names are counted in base 36
+    constexpr int kNextNumber = 2'000'000;  // names are counted in base 36
     commit.Int(-4).Long(1).Int(kNextNumber).Int(segments);
     for (int number = 0; number < segments; ++number) {
       const std::string name = "_" + std::to_string(number);
@@ -205,12 +205,11 @@ TEST_F(CraftedBoundsTest, FieldNamesOfManySegmentsTakeLittle) {
   ExpectLittleMemory("clean");
 }
 
-// Those are all that there may be, as short and as long as they may be.
 TEST_F(CraftedBoundsTest, ShortFieldNamesOfManySegmentsTakeLittle) {
   WriteSmallIndex(path(), false);
   AddFieldNames("_0.fnm", kMostFields - 1, 1);
   Multiply(26);
-  ExpectLittleMemory("clean");
+  Run("term_suggest", kMostOfOthers);
 }
 
 TEST_F(CraftedBoundsTest, AllTheFieldNamesThatALookupMayHoldTakeLittle) {
