@@ -40,7 +40,7 @@ class SegmentCheck {
 
   const format::WholeSegment& files() const { return files_; }
 
-  // About how much memory the names of its fields and sub-files take, in bytes: at most 20 MiB.
+  // About how much memory the names of its fields and sub-files take, in bytes.
   uint64_t NamesMemory() const;
 
  private:

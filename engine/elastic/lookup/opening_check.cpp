@@ -30,9 +30,12 @@ void ReadAlong(Check check) {
   }
 }
 
-// Of all segments together. The library takes about half a kibibyte for a field, and sixteen bytes for one of a name.
-constexpr uint64_t kMostNames = uint64_t{1} << 17;
-constexpr uint64_t kMostNameBytesOfAll = uint64_t{4} << 20;
+// What the library, and what goes along, take in memory: a little more than measured.
+constexpr uint64_t kPerSegment = uint64_t{28} << 10;
+constexpr uint64_t kPerNormGeneration = 64;
+constexpr uint64_t kPerName = 640;  // of a field or a sub-file
+constexpr uint64_t kPerNameByte = 18;
+constexpr uint64_t kPerIndexCharacter = 4;  // of a text in the index over a dictionary
 
 int32_t FirstInt(const std::shared_ptr<const format::ByteSource>& source) {
   return ByteReader(source, sizeof(int32_t)).ReadInt();
@@ -86,6 +89,8 @@ void OpeningCheck::Check(const std::string& name, const Source& source) {
     ReadAlong([&] { CheckTermsIndex(source); });
   } else if (extension == ".del") {
     ReadAlong([&] {
+      // A bit for each document, however few are deleted.
+      CountMemory(source->name(), static_cast<uint64_t>(current_->info.document_count) / 8);
       current_->deletions = std::make_shared<format::Deletions>(source, current_->info.document_count);
     });
   }
@@ -94,10 +99,14 @@ void OpeningCheck::Check(const std::string& name, const Source& source) {
 void OpeningCheck::CheckCommit(const Source& source, int64_t generation) {
   segments_.clear();
   current_ = nullptr;
-  names_ = name_bytes_ = 0;
+  memory_ = index_characters_ = index_bytes_ = 0;
   if (FirstInt(source) < format::kNewestCommitFormat) return;
   format::Commit commit = ReadCommit(source, generation, format::CommitChecksum::kPassOver);
   segments_.reserve(commit.segments.size());
+  for (const SegmentInfo& segment : commit.segments) {
+    const uint64_t norms = segment.norm_generations.has_value() ? segment.norm_generations->size() : 0;
+    CountMemory(source->name(), kPerSegment + kPerNormGeneration * norms);
+  }
   for (SegmentInfo& segment : commit.segments) segments_.push_back({.info = std::move(segment)});
 }
 
@@ -116,12 +125,24 @@ void OpeningCheck::CountSubFiles(const format::CompoundFile& compound) {
 }
 
 void OpeningCheck::CountName(const std::string& file, const std::string& name) {
-  name_bytes_ += name.size();
-  if (++names_ <= kMostNames && name_bytes_ <= kMostNameBytesOfAll) return;
+  CountMemory(file, kPerName + kPerNameByte * name.size());
+}
+
+void OpeningCheck::CountMemory(const std::string& file, uint64_t bytes) {
+  memory_ += bytes;
+  if (memory_ <= kMostMemory) return;
   throw IndexDamagedError(file, 0,
-                          "the segments up to this one have more than " + std::to_string(kMostNames) +
-                              " fields and sub-files, or names of more than " +
-                              std::to_string(kMostNameBytesOfAll) + " bytes");
+                          "the index library would take more than " + std::to_string(kMostMemory) +
+                              " bytes of memory to open the segments up to this one");
+}
+
+// A term's text has but to say how much it shares with the one before; the library keeps each as a whole.
+void OpeningCheck::CountIndexText(const format::TermCursor& index) {
+  index_characters_ += index.text().size();
+  if (index_characters_ <= kFreeIndexCharacters + kMostIndexGrowth * (index_bytes_ + index.offset())) return;
+  index.Damaged("the index library would take more than " +
+                std::to_string(kPerIndexCharacter * kMostIndexGrowth) +
+                " times the size of the files for the texts up to this one");
 }
 
 void OpeningCheck::CheckFields(const Source& source) {
@@ -157,7 +178,9 @@ void OpeningCheck::CheckDictionary(const Source& source) const {
 
 void OpeningCheck::CheckTermsIndex(const Source& source) {
   if (FirstInt(source) < format::TermCursor::kNewestFormat) return;
-  current_->place = FindPlace(source, current_->fields, current_->info.document_count, term_);
+  current_->place = FindPlace(source, current_->fields, current_->info.document_count, term_,
+                              [this](const format::TermCursor& index) { CountIndexText(index); });
+  index_bytes_ += source->size();
 }
 
 }  // namespace vantrel::elastic::lookup

@@ -46,11 +46,11 @@ int TermComparison::Compare(const TermCursor& cursor) {
 
 std::optional<LookupPlace> FindPlace(const std::shared_ptr<const format::ByteSource>& index,
                                      const std::vector<format::FieldInfo>& fields, int32_t document_count,
-                                     const std::optional<WantedTerm>& term) {
+                                     const std::optional<WantedTerm>& term,
+                                     const std::function<void(const TermCursor&)>& count) {
   IndexWalk walk(index, fields, document_count);
   if (!term.has_value()) {
-    while (walk.Next()) {
-    }
+    while (walk.Next()) count(walk.cursor());
     return std::nullopt;
   }
   TermComparison comparison(fields, *term);
@@ -58,6 +58,7 @@ std::optional<LookupPlace> FindPlace(const std::shared_ptr<const format::ByteSou
   uint64_t before = 0;  // so many entries come before all those that are behind the term
   LookupPlace place;
   while (walk.Next()) {
+    count(walk.cursor());
     is_behind.push_back(comparison.Compare(walk.cursor()) > 0);
     if (before + 1 != is_behind.size() || is_behind.back()) continue;
     ++before;

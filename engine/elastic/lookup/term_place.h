@@ -1,6 +1,7 @@
 #pragma once
 
 #include <cstdint>
+#include <functional>
 #include <memory>
 #include <optional>
 #include <vector>
@@ -14,10 +15,12 @@ namespace vantrel::elastic::lookup {
 
 // Walks the index over a dictionary (.tii) to its end, as the index library does when it loads it, and notes where the
 // library begins to look for a term: its search by halves ends at the same entry, sorted or not. Nothing without a
-// term, and where the search ends before the first entry. Throws IndexDamagedError, IndexIoError.
+// term, and where the search ends before the first entry. `count` is called at each entry. Throws IndexDamagedError,
+// IndexIoError, and what `count` throws.
 std::optional<LookupPlace> FindPlace(const std::shared_ptr<const format::ByteSource>& index,
                                      const std::vector<format::FieldInfo>& fields, int32_t document_count,
-                                     const std::optional<WantedTerm>& term);
+                                     const std::optional<WantedTerm>& term,
+                                     const std::function<void(const format::TermCursor&)>& count);
 
 // Compares the terms of a dictionary or its index, one after the other, with another one, by the order in which the index
 // library looks for terms: by the names of the fields, then by code points. Takes time in proportion to what has changed

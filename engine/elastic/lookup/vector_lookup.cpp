@@ -7,6 +7,14 @@
 namespace vantrel::elastic::lookup {
 namespace {
 
+void RequireLittleMemory(const format::TermVectorsReader& vectors, size_t field) {
+  constexpr uint64_t kMost = uint64_t{96} << 20;
+  const uint64_t bytes = vectors.LibraryMemory();
+  if (bytes <= kMost) return;
+  vectors.terms().Damaged(vectors.TermsStart(field), "the index library would take " + std::to_string(bytes) +
+                                                         " bytes of memory for this vector");
+}
+
 VectorLookup CheckDocument(const OpenedSegment& segment, const format::FieldInfo& field, int64_t document) {
   const OpenedSegment::Source index = segment.Store(".tvx");
   // Where each document that was to have vectors failed to be written, there are no files.
@@ -28,6 +36,7 @@ VectorLookup CheckDocument(const OpenedSegment& segment, const format::FieldInfo
     if (&segment.fields[vectors.fields()[i].number] != &field) continue;
     vectors.SeekTerms(i);
     vectors.PassTerms();
+    RequireLittleMemory(vectors, i);
   }
   return VectorLookup::kSafe;
 }

@@ -15,17 +15,24 @@
 #include <functional>
 #include <optional>
 #include <set>
+#include <span>
 #include <string>
 #include <utility>
 #include <vector>
 
 #include "elastic/format/commit/commit.h"
+#include "elastic/format/commit/shared_files.h"
 #include "elastic/format/io/folder.h"
+#include "elastic/format/io/opening_error.h"
+#include "elastic/format/segment/field_infos.h"
+#include "elastic/format/segment/term_cursor.h"
+#include "elastic/format/segment/term_vectors.h"
 #include "elastic/index/manifest_keeper.h"
 #include "elastic/index/run_reading.h"
 #include "elastic/repair/blame.h"
 #include "elastic/repair/checked_directory.h"
 #include "elastic/repair/checker_trial.h"
+#include "elastic/segment/whole_segment.h"
 #include "vantrel/elastic/index_error.h"
 #include "vantrel/elastic/index_health.h"
 #include "vantrel/elastic/library_setup.h"
@@ -36,6 +43,10 @@ namespace {
 
 // How often a plan starts anew because there is a newer commit.
 constexpr int kMostTries = 10;
+
+// What the library may take for a segment without a trial, in bytes.
+constexpr uint64_t kMuchMemory = uint64_t{32} << 20;
+constexpr uint64_t kMuchGrowth = 64;  // times the size of a file
 
 // Throws where there is no commit to start from.
 format::Commit ReadNewestCommit(const std::string& path) {
@@ -70,29 +81,128 @@ struct UnsafeSegments {
   uint64_t index_bytes = 0;
 };
 
-bool CheckerSurvives(const std::string& path, const std::string& segment, uint64_t index_bytes) {
+bool CheckerSurvives(const std::string& path, std::span<const std::string> segments, uint64_t index_bytes) {
   return SurvivesTrial(path, index_bytes, [&] {
     auto only = Lucene::Collection<Lucene::String>::newInstance();
-    only.add(Lucene::StringUtils::toUnicode(segment));
+    for (const std::string& segment : segments) only.add(Lucene::StringUtils::toUnicode(segment));
     const auto directory = Lucene::newLucene<CheckedDirectory>(path, std::set<std::string>());
     Lucene::newLucene<Lucene::CheckIndex>(directory)->checkIndex(only);
   });
 }
 
-UnsafeSegments FindUnsafeSegments(const std::string& path) {
+// Tries unsafe segments in groups, and halves those that the checker does not survive, down to single segments. What is
+// not settled when kMostFailures trials have failed is condemned: a failure may take its whole time, and there may be
+// thousands of segments.
+class UnsafeTrials {
+ public:
+  UnsafeTrials(const std::string& path, UnsafeSegments& segments) : path_(path), segments_(segments) {}
+
+  void TryAll(std::span<const std::string> names) {
+    const size_t size = std::max<size_t>((names.size() + kGroups - 1) / kGroups, 1);
+    for (; !names.empty(); names = names.subspan(std::min(size, names.size()))) {
+      Try(names.first(std::min(size, names.size())));
+    }
+  }
+
+ private:
+  // So few are each tried alone.
+  static constexpr size_t kGroups = 8;
+  static constexpr int kMostFailures = 8;
+
+  void Try(std::span<const std::string> group) {
+    if (failures_left_ > 0 && CheckerSurvives(path_, group, segments_.index_bytes)) {
+      segments_.survived.insert(group.begin(), group.end());
+      return;
+    }
+    if (failures_left_ > 0) --failures_left_;
+    if (group.size() == 1 || failures_left_ == 0) {
+      segments_.condemned.insert(group.begin(), group.end());
+      return;
+    }
+    Try(group.first(group.size() / 2));
+    Try(group.subspan(group.size() / 2));
+  }
+
+  const std::string& path_;
+  UnsafeSegments& segments_;
+  int failures_left_ = kMostFailures;
+};
+
+uint64_t MostMemoryOfVectors(const format::WholeSegment& files, uint32_t fields) {
+  uint64_t most = 0;
+  if (!files.Has(".tvx")) return most;
+  format::TermVectorsReader vectors(files.Open(".tvx"), files.Open(".tvd"), files.Open(".tvf"), fields);
+  const format::SegmentInfo& info = files.info();
+  const auto first = static_cast<uint64_t>(std::max(info.store_offset, 0));
+  const uint64_t end = std::min(first + static_cast<uint64_t>(info.document_count), vectors.documents());
+  for (uint64_t document = first; document < end && most <= kMuchMemory; ++document) {
+    vectors.Seek(document);
+    uint64_t bytes = 0;
+    for (size_t field = 0; field < vectors.fields().size(); ++field) {
+      vectors.SeekTerms(field);
+      vectors.PassTerms();
+      bytes += vectors.LibraryMemory();
+    }
+    most = std::max(most, bytes);
+  }
+  return most;
+}
+
+// Whether the texts in the index over a dictionary take much more memory than the file has bytes.
+bool HasLongTexts(const format::WholeSegment& files, uint32_t fields) {
+  format::TermCursor index(files.Open(".tii"), format::TermCursor::File::kIndex, fields,
+                           files.info().document_count);
+  uint64_t bytes = 0;
+  while (index.Next()) {
+    bytes += sizeof(wchar_t) * index.text().size();
+    if (bytes > kMuchMemory && bytes / kMuchGrowth > index.end_offset()) return true;
+  }
+  return false;
+}
+
+// Whether the library would take much more memory for a segment than the segment takes on disk. What cannot be read is
+// for the check to tell.
+bool NeedsMuchMemory(const format::Folder& folder, const format::SegmentInfo& info,
+                     format::SharedFiles& shared) {
+  try {
+    const format::WholeSegment files(folder, info, shared);
+    const auto fields = static_cast<uint32_t>(format::ReadFieldInfos(files.Open(".fnm")).size());
+    const bool has_much_deleted =
+        files.HasDeletions() && static_cast<uint64_t>(info.document_count) / 8 > kMuchMemory;
+    return has_much_deleted || HasLongTexts(files, fields) ||
+           MostMemoryOfVectors(files, fields) > kMuchMemory;
+  } catch (const IndexDamagedError&) {
+  } catch (const format::FileMissingError&) {
+  }
+  return false;
+}
+
+UnsafeSegments FindUnsafeSegments(const std::string& path, const format::Commit& commit) {
   const HealthReport report = CheckIndexHealth(path);
   std::set<std::string> unsafe;
   for (const HealthFinding& finding : report.findings) {
     if (finding.grade == HealthFinding::Grade::kUnsafe && !finding.segment.empty())
       unsafe.insert(finding.segment);
   }
-  UnsafeSegments segments;
-  if (unsafe.empty()) return segments;
-  segments.index_bytes = SizeOf(report);
-  for (const std::string& segment : unsafe) {
-    const bool survives = CheckerSurvives(path, segment, segments.index_bytes);
-    (survives ? segments.survived : segments.condemned).insert(segment);
+  // Also where nothing is wrong with them: the checker runs in this process. They come first, as long as none has failed.
+  std::vector<std::string> large;
+  const format::DiskFolder folder(path);
+  format::SharedFiles shared(folder);
+  for (const format::SegmentInfo& segment : commit.segments) {
+    if (!unsafe.contains(segment.name) && NeedsMuchMemory(folder, segment, shared))
+      large.push_back(segment.name);
   }
+  UnsafeSegments segments;
+  if (unsafe.empty() && large.empty()) return segments;
+  segments.index_bytes = SizeOf(report);
+  UnsafeTrials trials(path, segments);
+  trials.TryAll(large);
+  // Nothing was found wrong with them that they could be dropped for.
+  if (!segments.condemned.empty()) {
+    throw IndexError(path, "the index library would take too much memory or time to check segment " +
+                               *segments.condemned.begin() + "; nothing was changed");
+  }
+  trials.TryAll(std::vector<std::string>(unsafe.begin(), unsafe.end()));
   return segments;
 }
 
@@ -100,7 +210,7 @@ UnsafeSegments FindUnsafeSegments(const std::string& path) {
 class Checker {
  public:
   explicit Checker(const std::string& path) : path_(path), commit_(ReadNewestCommit(path)) {
-    const UnsafeSegments unsafe = FindUnsafeSegments(path);
+    const UnsafeSegments unsafe = FindUnsafeSegments(path, commit_);
     const std::function<void()> check = [this] {
       checker_ = Lucene::newLucene<Lucene::CheckIndex>(directory_);
       status_ = checker_->checkIndex();

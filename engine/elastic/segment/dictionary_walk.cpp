@@ -148,8 +148,8 @@ class DictionaryWalk::Finder {
   void Pass(uint64_t number) {
     const uint32_t shared = index_.term_text().shared_length();
     // What was taken from entries of which this one shares less is no longer part of any text.
-    while (!parts_.empty() && parts_.back().shared_length >= shared) parts_.pop_back();
-    if (parts_.size() == kMostParts) parts_.pop_back();
+    while (!parts_.empty() && parts_.back().shared_length >= shared) DropLast();
+    if (parts_.size() == kMostParts || text_size_ > kMostText) DropLast();
     if (number > 0) {
       Part part;
       part.begin = {.field = last_.field,
@@ -161,6 +161,7 @@ class DictionaryWalk::Finder {
       part.end_number = number * interval_;
       if (number == 1) part.entries = first_;
       AddEntry(index_.field(), part.entries);
+      text_size_ += part.begin.text.size();
       parts_.push_back(std::move(part));
     } else {
       AddEntry(-1, first_);  // whatever it says
@@ -177,6 +178,12 @@ class DictionaryWalk::Finder {
 
  private:
   static constexpr size_t kMostParts = 32;
+  static constexpr size_t kMostText = size_t{64} << 10;
+
+  void DropLast() {
+    text_size_ -= parts_.back().begin.text.size();
+    parts_.pop_back();
+  }
 
   void AddEntry(int32_t field, Fingerprint& entries) {
     const uint64_t text = text_fingerprint_.Of(index_.text(), index_.term_text().same_length());
@@ -192,6 +199,7 @@ class DictionaryWalk::Finder {
   const TermCursor& index_;
   uint64_t interval_;
   std::vector<Part> parts_;
+  size_t text_size_ = 0;  // of the parts, in bytes
   Fingerprint first_;
   TextFingerprint text_fingerprint_;
   TermPlace last_;
@@ -199,13 +207,19 @@ class DictionaryWalk::Finder {
 
 DictionaryWalk::~DictionaryWalk() = default;
 
+size_t DictionaryWalk::TextRoom() const {
+  size_t room = cursor_.term_text().room() + last_entry_.text.size();
+  for (const Part& part : parts_) room += part.begin.text.size();
+  return room;
+}
+
 DictionaryWalk::DictionaryWalk(const std::shared_ptr<const ByteSource>& dictionary,
                                const std::shared_ptr<const ByteSource>& index,
                                const std::vector<FieldInfo>& fields, int32_t document_count,
-                               TermSelection selection)
+                               TermSelection selection, size_t buffer_size)
     : selection_(std::move(selection)),
-      cursor_(dictionary, TermCursor::File::kDictionary, static_cast<uint32_t>(fields.size()),
-              document_count),
+      cursor_(dictionary, TermCursor::File::kDictionary, static_cast<uint32_t>(fields.size()), document_count,
+              buffer_size),
       field_order_(fields),
       order_(cursor_.is_utf8()),
       locator_(std::make_unique<Locator>(fields, field_order_, selection_, cursor_.is_utf8())) {

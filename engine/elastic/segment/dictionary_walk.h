@@ -55,7 +55,7 @@ class TextFingerprint {
 // one that holds the last term, and begins a block earlier than would do. Every term and every entry that it passes must
 // come after the one before it and be well-formed, and each entry that it passes must be found again in the dictionary.
 // An entry's text is made of pieces of the entries before it, so the blocks where these pieces come from are read, too:
-// most often a handful; beyond 32, some are left out. So a wrong bit shows, unless
+// most often a handful; beyond 32, or 64 KiB of text, some are left out. So a wrong bit shows, unless
 // - what it leaves of the dictionary could have been written so: other texts in order, fewer documents, or
 // - it makes an entry of the index, further ahead, share more of its text with the one before it, and that leaves
 //   all entries in order, or
@@ -68,7 +68,8 @@ class DictionaryWalk {
  public:
   DictionaryWalk(const std::shared_ptr<const ByteSource>& dictionary,
                  const std::shared_ptr<const ByteSource>& index, const std::vector<FieldInfo>& fields,
-                 int32_t document_count, TermSelection selection);
+                 int32_t document_count, TermSelection selection,
+                 size_t buffer_size = TermCursor::kDefaultBufferSize);
   DictionaryWalk(const DictionaryWalk&) = delete;
   DictionaryWalk& operator=(const DictionaryWalk&) = delete;
   ~DictionaryWalk();
@@ -93,6 +94,10 @@ class DictionaryWalk {
   // How many leading bytes the text has in common with that of the term of the selection before, at least; in UTF-8,
   // exactly, in the older layouts, as whole characters.
   size_t same_length() const { return same_length_; }
+
+  // How many bytes the texts that it holds take, about; what of it grows while it walks.
+  size_t TextRoom() const;
+  size_t GrowingRoom() const { return cursor_.term_text().room(); }
 
   // The orders by which all terms and entries so far ascend.
   TermOrders orders() const { return order_.consistent(); }

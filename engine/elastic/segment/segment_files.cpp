@@ -10,8 +10,8 @@
 namespace vantrel::elastic::format {
 namespace {
 
-// Of all segments together, in the files: ten times as much in memory where they are very short.
-constexpr uint64_t kMostNames = uint64_t{8} << 20;
+// Of all segments together, in the files: seventeen times as much in memory where they are very short.
+constexpr uint64_t kMostNames = uint64_t{4} << 20;
 
 }  // namespace
 

@@ -36,7 +36,7 @@ enum class Need { kAll, kTerms };
 SegmentFiles OpenSegment(const Folder& folder, SegmentInfo info, Need need = Need::kAll);
 
 // The same for every segment of the folder's newest commit, also where a writer replaces it meanwhile. Their .fnm files
-// take at most 8 MiB together, as the names of all of them may be kept in memory: more is damage. Throws IndexError.
+// take at most 4 MiB together, as the names of all of them may be kept in memory: more is damage. Throws IndexError.
 std::vector<SegmentFiles> OpenNewestSegments(const Folder& folder, Need need);
 
 }  // namespace vantrel::elastic::format

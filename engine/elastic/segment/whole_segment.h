@@ -62,7 +62,7 @@ class WholeSegment {
   // How many files it holds open, or could not open: one at least.
   size_t files_tried() const { return files_tried_; }
 
-  // About how much memory the names of sub-files take, in bytes: at most 12 MiB.
+  // About how much memory the names of sub-files take, in bytes.
   uint64_t NamesMemory() const;
 
  private:

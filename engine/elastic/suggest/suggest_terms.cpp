@@ -23,9 +23,7 @@ std::vector<std::unique_ptr<SelectedTerms>> OpenSegments(const std::vector<const
   std::vector<std::unique_ptr<SelectedTerms>> segments;
   for (const format::Folder* const folder : folders) {
     const format::WatchedFolder watched(*folder, deadline);
-    for (format::SegmentFiles& files : format::OpenNewestSegments(watched, format::Need::kAll)) {
-      segments.push_back(std::make_unique<SelectedTerms>(std::move(files), selection));
-    }
+    AddSelectedTerms(format::OpenNewestSegments(watched, format::Need::kAll), selection, segments);
   }
   return segments;
 }

@@ -20,6 +20,8 @@ class LiveTermFilter {
   // May have to read the term's postings.
   bool IsLive(const format::TermInfo& term, bool omits_frequencies);
 
+  void ReleasePages() { deletions_.ReleasePages(); }
+
  private:
   format::Deletions deletions_;
   format::PostingsReader postings_;

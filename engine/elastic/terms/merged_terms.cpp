@@ -51,6 +51,7 @@ MergedTerms::Move MergedTerms::Step() {
   }
   Segment& segment = segments_[next_];
   const Move move = segment.terms->Step();
+  if (segment.terms->walk().GrowingRoom() > segment.room) CountRoom(segment);
   if (move == Move::kPassedOver) return move;
   segment.is_at_end = move == Move::kEnd;
   if (!segment.is_at_end) TakeTerm(segment);
@@ -69,6 +70,13 @@ MergedTerms::Move MergedTerms::Step() {
     is_built_ = is_complete_ = true;
   }
   return Move::kPassedOver;
+}
+
+void MergedTerms::CountRoom(Segment& segment) {
+  const size_t room = segment.terms->walk().GrowingRoom();
+  room_ += room - segment.room;
+  segment.room = room;
+  if (room_ > kMostTextRoom) segment.terms->walk().cursor().Damaged("terms are too long to be merged");
 }
 
 // The segment has come from the term that won last to its next one.
@@ -154,8 +162,12 @@ bool MergedTerms::IsLive() const {
   const auto at_first_sight = [](const Occurrence& occurrence) {
     return occurrence.terms->IsLiveAtFirstSight(occurrence.info);
   };
-  const auto is_live = [](const Occurrence& occurrence) {
-    return occurrence.terms->IsLive(occurrence.info, occurrence.field);
+  // Of so many segments, each may hold its pages.
+  constexpr size_t kFewSegments = 32;
+  const auto is_live = [this](const Occurrence& occurrence) {
+    const bool is = occurrence.terms->IsLive(occurrence.info, occurrence.field);
+    if (segments_.size() > kFewSegments) occurrence.terms->ReleasePages();
+    return is;
   };
   return std::any_of(at_term_.begin(), at_term_.end(), at_first_sight) ||
          std::any_of(at_term_.begin(), at_term_.end(), is_live);

@@ -60,6 +60,7 @@ class MergedTerms {
         {};             // by field number: its place among the names of all segments' fields
     uint32_t rank = 0;  // of the term's field
     bool is_at_end = false;
+    size_t room = 0;  // for its texts, as far as it is counted
     // What the term has in common with the one that it was last compared with, as long as it has not won: 0 where the
     // field is another, else 1 and the number of leading bytes, as whole characters.
     size_t same = 0;
@@ -74,6 +75,7 @@ class MergedTerms {
   };
 
   void RankFields();
+  void CountRoom(Segment& segment);
   void TakeTerm(Segment& segment);
   bool IsSameAsText(const Segment& segment) const;
   void Gather();
@@ -83,6 +85,7 @@ class MergedTerms {
 
   format::TermOrders order_;
   std::vector<Segment> segments_;
+  size_t room_ = 0;  // for the texts of all segments
   std::vector<size_t>
       losers_;  // by node; node k is above 2k and 2k+1, and the segments are behind the last node
   bool is_built_ = false;

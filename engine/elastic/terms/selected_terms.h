@@ -1,6 +1,8 @@
 #pragma once
 
+#include <cstddef>
 #include <cstdint>
+#include <memory>
 #include <optional>
 #include <vector>
 
@@ -19,7 +21,8 @@ class SelectedTerms {
  public:
   using Move = format::DictionaryWalk::Move;
 
-  SelectedTerms(format::SegmentFiles files, const format::TermSelection& selection);
+  SelectedTerms(format::SegmentFiles files, const format::TermSelection& selection,
+                size_t buffer_size = format::TermCursor::kDefaultBufferSize);
 
   Move Step() { return walk_.Step(); }
   const format::DictionaryWalk& walk() const { return walk_; }
@@ -30,6 +33,11 @@ class SelectedTerms {
   bool IsLiveAtFirstSight(const format::TermInfo& term);
   bool IsLive(const format::TermInfo& term, int32_t field);
 
+  // Gives back the memory that IsLive() has taken for pages of deleted documents.
+  void ReleasePages() {
+    if (live_filter_.has_value()) live_filter_->ReleasePages();
+  }
+
  private:
   LiveTermFilter& live_filter();
 
@@ -39,5 +47,13 @@ class SelectedTerms {
   // Made when it is first asked: it reads the whole deletions file.
   std::optional<LiveTermFilter> live_filter_;
 };
+
+// What the texts of all segments that are read together may take, in bytes as DictionaryWalk counts them.
+inline constexpr size_t kMostTextRoom = size_t{12} << 20;
+
+// Appends the terms of a selection in some segments. Throws IndexDamagedError where the texts take more than
+// kMostTextRoom.
+void AddSelectedTerms(std::vector<format::SegmentFiles> files, const format::TermSelection& selection,
+                      std::vector<std::unique_ptr<SelectedTerms>>& segments);
 
 }  // namespace vantrel::elastic

@@ -17,10 +17,9 @@ std::vector<std::unique_ptr<SelectedTerms>> OpenSegments(const std::string& path
   const format::TermSelection selection = {.field = request.field, .text = request.prefix};
   const format::DiskFolder folder(path);
   std::vector<std::unique_ptr<SelectedTerms>> segments;
-  for (format::SegmentFiles& files :
-       format::OpenNewestSegments(folder, request.live_only ? format::Need::kAll : format::Need::kTerms)) {
-    segments.push_back(std::make_unique<SelectedTerms>(std::move(files), selection));
-  }
+  AddSelectedTerms(
+      format::OpenNewestSegments(folder, request.live_only ? format::Need::kAll : format::Need::kTerms),
+      selection, segments);
   return segments;
 }
 

@@ -269,7 +269,7 @@ std::string CommitOfSegments(const std::vector<std::string>& segments) {
 
 TEST(SpecialCommitTest, ThatNamesASegmentOftenIsRefusedBeforeAnyFileOfTheSegmentIsOpened) {
   MemoryFolder memory;
-  memory.files["segments_1"].bytes = CommitOfSegments(std::vector<std::string>(65'536, "_0"));
+  memory.files["segments_1"].bytes = CommitOfSegments(std::vector<std::string>(4096, "_0"));
   for (const char* name : {"_0.fnm", "_0.tis", "_0.tii", "_0.frq", "_0.fdx", "_0.fdt"})
     memory.files[name] = {};
   std::set<std::string> opened;

@@ -115,7 +115,7 @@ TEST_F(RepairPlanTest, IsOfTheCommitBeforeWhereTheNewestIsNone) {
 
 TEST_F(RepairPlanTest, IsRefusedAtOnceWhereTheCommitNamesASegmentOften) {
   index_.reset();
-  constexpr int kSegments = 65'536;
+  constexpr int kSegments = 4096;
   ByteWriter commit = ByteWriter().Int(-1).Long(1).Int(kSegments).Int(kSegments);
   for (int i = 0; i < kSegments; ++i) commit.String("_0").Int(10);
   WriteFile(File("segments_z"), commit.bytes());

@@ -32,25 +32,42 @@ constexpr int32_t kWithUserData = -8;
 constexpr int32_t kWithDiagnostics = -9;
 static_assert(kWithDiagnostics == kNewestCommitFormat);
 
-void SkipString(ByteReader& reader) { reader.Skip(reader.ReadVInt()); }
+// What a commit may still have.
+struct Room {
+  int64_t norm_generations = kMostNormGenerations;
+  uint64_t strings = kMostCommitStrings;
+  uint64_t string_bytes = kMostCommitStringBytes;
+};
 
-void SkipStringMap(ByteReader& reader) {
+void SkipString(ByteReader& reader, Room& room) {
+  const uint64_t start = reader.offset();
+  const uint32_t length = reader.ReadVInt();
+  reader.Skip(length);
+  if (room.strings == 0 || length > room.string_bytes) {
+    reader.Damaged(start, "the commit has more than " + std::to_string(kMostCommitStrings) +
+                              " strings of diagnostics and user data, or they take more than " +
+                              std::to_string(kMostCommitStringBytes) + " bytes");
+  }
+  --room.strings;
+  room.string_bytes -= length;
+}
+
+void SkipStringMap(ByteReader& reader, Room& room) {
   for (int32_t left = reader.ReadInt(); left > 0; --left) {
-    SkipString(reader);
-    SkipString(reader);
+    SkipString(reader, room);
+    SkipString(reader, room);
   }
 }
 
-// `room` is how many more generations the commit may have.
-std::optional<std::vector<int64_t>> ReadNormGenerations(ByteReader& reader, int64_t& room) {
+std::optional<std::vector<int64_t>> ReadNormGenerations(ByteReader& reader, Room& room) {
   const uint64_t start = reader.offset();
   const int32_t count = reader.ReadInt();
   if (count == -1) return std::nullopt;
   if (count < 0 || count > kMostFields || static_cast<uint64_t>(count) > reader.remaining() / 8) {
     reader.Damaged(start, "count of norm generations is " + std::to_string(count));
   }
-  room -= count;
-  if (room < 0) {
+  room.norm_generations -= count;
+  if (room.norm_generations < 0) {
     reader.Damaged(start,
                    "the commit has more than " + std::to_string(kMostNormGenerations) + " norm generations");
   }
@@ -79,7 +96,7 @@ void ReadStore(ByteReader& reader, SegmentInfo& segment) {
   segment.store_is_compound = reader.ReadByte() == 1;
 }
 
-SegmentInfo ReadSegment(ByteReader& reader, int32_t format, int64_t& norms_room) {
+SegmentInfo ReadSegment(ByteReader& reader, int32_t format, Room& room) {
   SegmentInfo segment;
   segment.name = ReadSegmentName(reader);
   const uint64_t count_start = reader.offset();
@@ -99,19 +116,19 @@ SegmentInfo ReadSegment(ByteReader& reader, int32_t format, int64_t& norms_room)
   }
   if (format <= kWithSharedStores) ReadStore(reader, segment);
   if (format <= kWithSingleNorms) segment.has_norms_file = reader.ReadByte() == 1;
-  segment.norm_generations = ReadNormGenerations(reader, norms_room);
+  segment.norm_generations = ReadNormGenerations(reader, room);
   segment.compound = ReadCompound(reader);
   if (format <= kWithDeletionCount) segment.deleted_count = reader.ReadInt();
   if (format <= kWithHasPositions) segment.has_positions = reader.ReadByte() == 1;
-  if (format <= kWithDiagnostics) SkipStringMap(reader);
+  if (format <= kWithDiagnostics) SkipStringMap(reader, room);
   return segment;
 }
 
-void SkipUserData(ByteReader& reader, int32_t format) {
+void SkipUserData(ByteReader& reader, int32_t format, Room& room) {
   if (format <= kWithDiagnostics) {
-    SkipStringMap(reader);
+    SkipStringMap(reader, room);
   } else if (format == kWithUserData && reader.ReadByte() != 0) {
-    SkipString(reader);
+    SkipString(reader, room);
   }
 }
 
@@ -262,9 +279,9 @@ Commit ReadCommit(const std::shared_ptr<const ByteSource>& source, int64_t gener
   if (count < 0 || count > kMostSegments) {
     reader.Damaged(count_start, "segment count is " + std::to_string(count));
   }
-  int64_t norms_room = kMostNormGenerations;
-  for (int32_t i = 0; i < count; ++i) commit.segments.push_back(ReadSegment(reader, format, norms_room));
-  if (format < 0) SkipUserData(reader, format);
+  Room room;
+  for (int32_t i = 0; i < count; ++i) commit.segments.push_back(ReadSegment(reader, format, room));
+  if (format < 0) SkipUserData(reader, format, room);
   if (format <= kWithChecksum) {
     CheckChecksum(*source, reader, checksum);
   } else {

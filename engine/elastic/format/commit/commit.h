@@ -53,11 +53,14 @@ struct Commit {
   uint64_t size = 0;  // of the file
 };
 
-// Room for any commit: its bytes, its segments, and the generations of norms of all its segments together. They bound
-// the time that a commit takes to read (a second), and what it takes in memory (40 MiB).
-inline constexpr uint64_t kLargestCommit = uint64_t{64} << 20;
-inline constexpr int32_t kMostSegments = int32_t{1} << 16;
-inline constexpr int64_t kMostNormGenerations = int64_t{1} << 21;
+// Room for any commit: its bytes, its segments, and of all its segments together the generations of norms, and the
+// strings of diagnostics and user data with their bytes. They bound the time and memory of whoever reads a commit; the
+// index library takes some two hundred bytes for a short string.
+inline constexpr uint64_t kLargestCommit = uint64_t{8} << 20;
+inline constexpr int32_t kMostSegments = int32_t{1} << 12;
+inline constexpr int64_t kMostNormGenerations = int64_t{1} << 19;
+inline constexpr uint64_t kMostCommitStrings = uint64_t{1} << 17;
+inline constexpr uint64_t kMostCommitStringBytes = uint64_t{2} << 20;
 
 inline constexpr int32_t kNewestCommitFormat = -9;
 

@@ -14,8 +14,8 @@ namespace vantrel::elastic::format {
 //   VInt count, then for each sub-file: Long offset of its first byte in this file, String name
 //   the sub-files in the order of the table, without gaps, the last up to the end
 //
-// At most kMostSubFiles of them, with names within the bounds of name_budget.h: more is damage. So whatever the file,
-// at most 6 MiB are taken.
+// At most kMostSubFiles of them, with names within the bounds of name_budget.h: more is damage. So what is taken is
+// bounded, whatever the file.
 class CompoundFile {
  public:
   // Where a sub-file stands.

@@ -115,6 +115,11 @@ uint8_t Deletions::SparseByteAt(uint32_t index) {
   return found != bytes.end() && found->index == index ? found->bits : uint8_t{0};
 }
 
+void Deletions::ReleasePages() {
+  for (Page& page : pages_) page = {};
+  for (Block& block : blocks_) block = {};
+}
+
 bool Deletions::Contains(int32_t document) {
   const uint32_t index = static_cast<uint32_t>(document) >> 3;
   const uint8_t bits = is_sparse_ ? SparseByteAt(index) : DenseByte(index);

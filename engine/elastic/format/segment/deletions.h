@@ -32,11 +32,14 @@ class Deletions {
   // since it was first read.
   bool Contains(int32_t document);
 
+  // Gives back the memory of what was paged in.
+  void ReleasePages();
+
  private:
   static constexpr size_t kPageSize = size_t{64} << 10;
-  static constexpr size_t kPagesHeld = 64;
+  static constexpr size_t kPagesHeld = 16;
   static constexpr size_t kBlockLength = 256;  // sparse bytes
-  static constexpr size_t kBlocksHeld = 4096;
+  static constexpr size_t kBlocksHeld = 512;
 
   struct Page {
     uint64_t number = UINT64_MAX;

@@ -84,6 +84,17 @@ void SkipListReader::RequireLength(const ByteReader& reader, uint64_t pointer, i
   }
 }
 
+// Few entries are left on the highest level, unless there may be so few levels that it is of no use.
+void SkipListReader::RequireShortTop() const {
+  constexpr uint64_t kMost = uint64_t{16} << 20;
+  if (level_count_ < 2) return;
+  const Level& top = levels_[static_cast<size_t>(level_count_ - 1)];
+  if (top.end - top.start <= kMost) return;
+  top.reader.Damaged(top.start, "the highest level of skip data takes " +
+                                    std::to_string(top.end - top.start) +
+                                    " bytes, which the index library would take into memory");
+}
+
 const SkipListReader::Entry& SkipListReader::Next(int number) {
   Level& level = levels_[static_cast<size_t>(number)];
   ByteReader& reader = level.reader;
@@ -154,6 +165,7 @@ void SkipListReader::Descend(int number, const Entry& from, int64_t passed) {
 
 SkipListReader::Landing SkipListReader::SkipTo(int32_t target, int32_t document_count) {
   Landing landing;
+  RequireShortTop();  // the library takes it into memory whatever the target is
   if (target <= 0) return landing;
   int64_t interval = skip_interval_;
   for (int number = 1; number < level_count_; ++number) {

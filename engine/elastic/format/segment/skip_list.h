@@ -69,7 +69,7 @@ class SkipListReader {
   // Goes down the levels to the first document `target` or beyond, the way the index library does, entry by entry,
   // and reads no others. To be called once after Seek(). Documents ascend and stay below `document_count`, and
   // places in the level below lie in it: what the library reads on the way lies within the term's skip data, or the
-  // file.
+  // file. The highest level, which it takes into memory, has at most 16 MiB.
   Landing SkipTo(int32_t target, int32_t document_count);
 
   // How many levels the term has; 0 before the first Seek().
@@ -98,6 +98,7 @@ class SkipListReader {
   void Prepare(int32_t document_frequency, bool has_payloads);
   void SeekLevels(uint64_t pointer);
   void RequireLength(const ByteReader& reader, uint64_t pointer, int number, uint64_t length) const;
+  void RequireShortTop() const;
   void ReadEntry(int number);
   bool LoadNext(int number, int64_t interval, uint32_t document_count);
   void Descend(int number, const Entry& from, int64_t passed);

@@ -31,9 +31,10 @@ class StoredFieldsReader {
   // five times as much for a text.
   static constexpr uint64_t kLongestInflated = uint64_t{16} << 20;
   // All compressed values that a reader has passed may become kMostInflation times their compressed size, and
-  // kFreelyInflated bytes beyond. So the time that a file takes is bounded by its size.
+  // kFreelyInflated bytes beyond. So the time that a file takes is bounded by its size, and that of small
+  // files in many segments by the number of segments.
   static constexpr uint64_t kMostInflation = 32;
-  static constexpr uint64_t kFreelyInflated = uint64_t{4} << 20;
+  static constexpr uint64_t kFreelyInflated = uint64_t{256} << 10;
 
   // The headers are read and checked. Throws IndexDamagedError, IndexIoError, as does everything below.
   StoredFieldsReader(std::shared_ptr<const ByteSource> index, std::shared_ptr<const ByteSource> records);

@@ -16,7 +16,6 @@ constexpr int32_t kWithUtf8Terms = -4;
 static_assert(kWithUtf8Terms == TermCursor::kNewestFormat);
 
 constexpr int32_t kNeverSkips = std::numeric_limits<int32_t>::max();
-constexpr size_t kTermsBufferSize = size_t{64} << 10;
 
 constexpr uint64_t kLargestPointer = std::numeric_limits<int64_t>::max();
 
@@ -61,8 +60,8 @@ class WindowDecoder {
 }  // namespace
 
 TermCursor::TermCursor(std::shared_ptr<const ByteSource> source, File file, uint32_t field_count,
-                       int32_t document_count)
-    : reader_(std::move(source), kTermsBufferSize),
+                       int32_t document_count, size_t buffer_size)
+    : reader_(std::move(source), buffer_size),
       file_(file),
       field_count_(field_count),
       document_count_(document_count) {

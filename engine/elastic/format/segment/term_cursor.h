@@ -48,11 +48,12 @@ class TermCursor {
   enum class File { kDictionary, kIndex };
 
   static constexpr int32_t kNewestFormat = -4;
+  static constexpr size_t kDefaultBufferSize = size_t{64} << 10;
 
   // The header is read and checked. `field_count` and `document_count` are the segment's. Throws
   // IndexDamagedError, IndexIoError, as does Next().
   TermCursor(std::shared_ptr<const ByteSource> source, File file, uint32_t field_count,
-             int32_t document_count);
+             int32_t document_count, size_t buffer_size = kDefaultBufferSize);
 
   // How many terms the file holds. Checked against the file's size, not by walking.
   uint64_t count() const { return count_; }

@@ -15,6 +15,8 @@ struct RawText {
   std::string bytes;     // UTF-8,
   std::u16string units;  // or in the older layouts UTF-16
 
+  // In bytes.
+  size_t size() const { return bytes.size() + units.size() * sizeof(char16_t); }
   // What follows the first `length` bytes or units, and that put behind the first `length` of another text.
   RawText From(size_t length) const;
   void Prepend(const RawText& text, size_t length);
@@ -54,6 +56,9 @@ class TermText {
 
   // The bytes of the file, or their conversion: UTF-8 if undamaged. Valid until the next text is read.
   std::string_view text() const { return {bytes_.data(), length_}; }
+
+  // How much room there is for texts, in bytes of UTF-8.
+  size_t room() const { return bytes_.size(); }
 
   // How much the text takes from the one before, in bytes or units, as the file states it.
   uint32_t shared_length() const { return shared_length_; }

@@ -122,7 +122,19 @@ void TermVectorsReader::SeekTerms(size_t field) {
 void TermVectorsReader::PassTerms() {
   text_.Clear();
   at_first_ = true;
+  terms_passed_ = term_count_;
+  text_passed_ = occurrences_passed_ = 0;
   for (; term_count_ > 0; --term_count_) ReadTerm();
+}
+
+uint64_t TermVectorsReader::LibraryMemory() const {
+  constexpr uint64_t kPerTerm = 128;
+  constexpr uint64_t kPerCharacter = 4;
+  constexpr uint64_t kPerPosition = 8;
+  constexpr uint64_t kPerOffsets = 96;
+  const uint64_t per_occurrence =
+      ((flags_ & kPositions) != 0 ? kPerPosition : 0) + ((flags_ & kOffsets) != 0 ? kPerOffsets : 0);
+  return terms_passed_ * kPerTerm + text_passed_ * kPerCharacter + occurrences_passed_ * per_occurrence;
 }
 
 void TermVectorsReader::ReadTerm() {
@@ -137,6 +149,8 @@ void TermVectorsReader::ReadTerm() {
   if (frequency == 0 || frequency > static_cast<uint32_t>(std::numeric_limits<int32_t>::max())) {
     fields_.Damaged(frequency_start, "frequency is " + std::to_string(static_cast<int32_t>(frequency)));
   }
+  text_passed_ += text_.text().size();
+  occurrences_passed_ += frequency;
   if (flags_ != 0) PassPlaces(frequency);
 }
 

@@ -75,6 +75,9 @@ class TermVectorsReader {
   // Moves past all terms of the field. They must ascend, be valid, and hold as many positions and offsets as
   // announced. Takes time in proportion to the bytes that are read, however long the texts are that terms share.
   void PassTerms();
+  // About how much memory the index library takes for the field that PassTerms() has passed: it keeps the texts as a
+  // whole, however much they share in the file, and an object for each pair of offsets.
+  uint64_t LibraryMemory() const;
   uint64_t terms_end() const { return fields_.offset(); }
 
  private:
@@ -102,6 +105,10 @@ class TermVectorsReader {
   uint32_t term_count_ = 0;
   uint8_t flags_ = 0;
   bool at_first_ = true;
+  // Passed of the field.
+  uint64_t terms_passed_ = 0;
+  uint64_t text_passed_ = 0;
+  uint64_t occurrences_passed_ = 0;
   TermText text_{true};
   OrderOfTerms order_{true};
 };

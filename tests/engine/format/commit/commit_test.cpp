@@ -225,7 +225,7 @@ TEST(CommitTest, RefusesMoreNormGenerationsThanThereIsRoomFor) {
     return out.bytes();
   };
   EXPECT_EQ(Read(commit_of(kSegments)).segments.size(), static_cast<size_t>(kSegments));
-  ExpectIndexError("the commit has more than 2097152 norm generations",
+  ExpectIndexError("the commit has more than 524288 norm generations",
                    [&] { Read(commit_of(kSegments + 1)); });
 }
 
@@ -246,8 +246,8 @@ TEST(CommitTest, SaysWhichChecksumItFoundAndExpected) {
 TEST(CommitTest, RefusesCountsThatCannotBe) {
   const ByteWriter head = ByteWriter().Int(-9).Long(1).Int(1);
   ExpectDamage(16, "segment count is -1", [&] { Read(ByteWriter(head).Int(-1).bytes()); });
-  ExpectDamage(16, "segment count is 65537", [&] { Read(ByteWriter(head).Int(65537).bytes()); });
-  ExpectDamage(20, "more bytes", [&] { Read(ByteWriter(head).Int(65536).bytes()); });
+  ExpectDamage(16, "segment count is 4097", [&] { Read(ByteWriter(head).Int(4097).bytes()); });
+  ExpectDamage(20, "more bytes", [&] { Read(ByteWriter(head).Int(4096).bytes()); });
   const ByteWriter one = ByteWriter(head).Int(1).String("_0");
   ExpectDamage(23, "document count is -2", [&] { Read(ByteWriter(one).Int(-2).bytes()); });
   ExpectDamage(27, "generation of deletions is -2", [&] { Read(ByteWriter(one).Int(1).Long(-2).bytes()); });
@@ -259,6 +259,17 @@ TEST(CommitTest, RefusesCountsThatCannotBe) {
                [&] { Read(ByteWriter(norms).Int(2).Long(1).Raw("short").bytes()); });
   const ByteWriter strings = ByteWriter(norms).Int(-1).Byte(1).Int(0).Byte(1);
   ExpectDamage(54, "more bytes", [&] { Read(ByteWriter(strings).Int(0x7fffffff).bytes()); });
+  const auto read_strings = [&](uint64_t count, const std::string& text) {
+    ByteWriter commit = ByteWriter(strings);
+    commit.Int(static_cast<int64_t>(count / 2));
+    for (uint64_t left = count; left > 0; --left) commit.String(text);
+    return Read(commit.Int(0).Checksum().bytes());
+  };
+  EXPECT_NO_THROW(read_strings(kMostCommitStrings, ""));
+  ExpectIndexError("more than 131072 strings", [&] { read_strings(kMostCommitStrings + 2, ""); });
+  EXPECT_NO_THROW(read_strings(2, std::string(kMostCommitStringBytes / 2, 'x')));
+  ExpectIndexError("more than 2097152 bytes",
+                   [&] { read_strings(2, std::string(kMostCommitStringBytes / 2 + 1, 'x')); });
   ExpectDamage(59, "wanted to skip 4294967295 bytes",
                [&] { Read(ByteWriter(strings).Int(1).VInt(-1).bytes()); });
 }

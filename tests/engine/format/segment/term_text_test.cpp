@@ -27,8 +27,7 @@ std::string RandomBytes(std::mt19937& random) {
       "\xef\xbf", "\xbe",     "\xef\xbf\xbe", "\xbf",
       "\xff",     "\xf0\x9f", "\xef\xbf\xbd", "abcdefghijklmnopqrstuvwxyz"};
   std::string bytes;
-  for (auto left = static_cast<uint32_t>(random() % 5); left > 0; --left)
-    bytes += kPieces[random() % kPieces.size()];
+  for (auto left = random() % 5; left > 0; --left) bytes += kPieces[random() % kPieces.size()];
   return bytes;
 }
 
@@ -82,8 +81,7 @@ std::u16string RandomUnits(std::mt19937& random) {
   static constexpr char16_t kUnits[] = {u'a',   u'b',   0xe4,   0x4e2d, 0xd83d, 0xde00,
                                         0xde01, 0xd83d, 0xde00, 0xe000, 0xfffd};
   std::u16string units;
-  for (auto left = static_cast<uint32_t>(random() % 5); left > 0; --left)
-    units.push_back(kUnits[random() % std::size(kUnits)]);
+  for (auto left = random() % 5; left > 0; --left) units.push_back(kUnits[random() % std::size(kUnits)]);
   return units;
 }
 
