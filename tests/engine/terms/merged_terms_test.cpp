@@ -57,7 +57,7 @@ std::string RandomText(std::mt19937& random) {
   static const std::vector<std::string> kPieces = {"a",        "b",        "\xc3\xa4",         "\xc3\xb6",
                                                    "\xe4\xb8", "\xf0\x9f", "aaaaaaaaaaaaaaaa", ""};
   std::string text;
-  for (auto left = static_cast<uint32_t>(random() % 6); left > 0; --left) {
+  for (auto left = random() % 6; left > 0; --left) {
     const std::string& piece = kPieces[random() % kPieces.size()];
     text += piece;
     if (piece == "\xe4\xb8") text += random() % 2 == 0 ? "\xad" : "\xae";
@@ -75,12 +75,11 @@ TEST(MergedTermsTest, AreTheTermsOfAllSegmentsInOrderEachOnce) {
     if (round % 3 == 0) selection.text = "a";
     std::map<Term, uint64_t> expected;
     std::vector<std::unique_ptr<SelectedTerms>> segments;
-    for (auto left = static_cast<uint32_t>(random() % 9); left > 0; --left) {
+    for (auto left = random() % 9; left > 0; --left) {
       std::vector<std::string> fields = {"f", "abc", "z"};
       std::shuffle(fields.begin(), fields.end(), random);
       std::set<Term> terms;
-      for (auto i = static_cast<uint32_t>(random() % 40); i > 0; --i)
-        terms.insert({fields[random() % 3], RandomText(random)});
+      for (auto i = random() % 40; i > 0; --i) terms.insert({fields[random() % 3], RandomText(random)});
       for (const Term& term : terms) {
         if ((has_field && term.first != "f") || !term.second.starts_with(selection.text)) continue;
         expected[term] += term.second.size() + 1;
