@@ -34,7 +34,7 @@ class StoredFieldsReader {
   // kFreelyInflated bytes beyond. So the time that a file takes is bounded by its size, and that of small
   // files in many segments by the number of segments.
   static constexpr uint64_t kMostInflation = 32;
-  static constexpr uint64_t kFreelyInflated = uint64_t{256} << 10;
+  static constexpr uint64_t kFreelyInflated = uint64_t{1} << 20;
 
   // The headers are read and checked. Throws IndexDamagedError, IndexIoError, as does everything below.
   StoredFieldsReader(std::shared_ptr<const ByteSource> index, std::shared_ptr<const ByteSource> records);

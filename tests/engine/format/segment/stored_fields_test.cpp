@@ -112,8 +112,8 @@ TEST(StoredFieldsTest, RefusesCompressedValuesThatBecomeTooManyBytesTogether) {
     return ReadOne(1, record);
   };
   // A small store may hold what compresses to nearly nothing.
-  EXPECT_EQ(read(size_t{1} << 16, 4), 4);
-  EXPECT_THROW(read(size_t{1} << 16, 5), IndexDamagedError);
+  EXPECT_EQ(read(size_t{1} << 18, 4), 4);
+  EXPECT_THROW(read(size_t{1} << 18, 5), IndexDamagedError);
   // 8 MiB that would become 8 GiB.
   ExpectDamage(8, "compressed values up to this one inflate to more than 32 times their size",
                [&] { read(StoredFieldsReader::kLongestInflated, 512); });
