@@ -19,7 +19,7 @@ void MakeManifest(const std::string& path) {
   format::Manifest manifest;
   format::UseNewestCommit(
       folder, [&](const format::Commit& commit) { manifest = format::MakeManifest(folder, commit); });
-  std::ofstream file(JoinPath(path, format::kManifestName), std::ios::binary);
+  std::ofstream file(vantrel::elastic::JoinPath(path, format::kManifestName), std::ios::binary);
   file << format::WriteManifest(manifest);
   if (!file.flush()) throw std::runtime_error("cannot write the manifest");
 }
