@@ -2,11 +2,11 @@
 // against the library's without; whole processes, as ratios in one run.
 
 #include <cstdint>
-#include <filesystem>
 #include <string>
 #include <vector>
 
 #include "support/figures.h"
+#include "support/folder_size.h"
 #include "support/run_benchmark.h"
 #include "support/timed_run.h"
 
@@ -15,6 +15,7 @@ namespace {
 using quorelastic::bench::Compare;
 using quorelastic::bench::Comparison;
 using quorelastic::bench::Figures;
+using quorelastic::bench::FolderSize;
 using quorelastic::bench::Run;
 
 constexpr int64_t kMebibyte = 1 << 20;
@@ -30,12 +31,6 @@ std::vector<std::string> OnOne(std::vector<std::string> command) {
 
 std::vector<std::string> Check(const std::string& index) {
   return {QUORELASTIC_TOOL, "-a", "check", "-d", index};
-}
-
-uint64_t SizeOf(const std::string& folder) {
-  uint64_t size = 0;
-  for (const auto& entry : std::filesystem::directory_iterator(folder)) size += entry.file_size();
-  return size;
 }
 
 void MeasureChecks(Figures& figures, const std::string& index) {
@@ -63,7 +58,7 @@ void MeasureManifests(Figures& figures, const std::string& index, const std::str
     std::filesystem::create_hard_link(entry.path(), std::filesystem::path(with) / entry.path().filename());
   }
   Run({QUORELASTIC_MAKE_MANIFEST, with});
-  const double milliseconds = kMostMillisecondsPerGigabyte * static_cast<double>(SizeOf(index)) / 1e9;
+  const double milliseconds = kMostMillisecondsPerGigabyte * static_cast<double>(FolderSize(index)) / 1e9;
   const Comparison check = Compare(OnOne(Check(with)), OnOne(Check(index)), kManifestRuns);
   figures.AddDifference("check with a manifest on one processor, against without", check, milliseconds);
   figures.AddPeak("peak memory of check with a manifest", check.ours.peak_bytes, 64 * kMebibyte);

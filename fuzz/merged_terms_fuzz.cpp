@@ -24,10 +24,8 @@ extern "C" int LLVMFuzzerTestOneInput(const uint8_t* data, size_t size) {
   input.TakeFiles(folder);
   return quorelastic::fuzz::DecodeWithinBounds([&] {
     std::vector<std::unique_ptr<SelectedTerms>> segments;
-    for (format::SegmentFiles& files : format::OpenNewestSegments(folder, format::Need::kAll)) {
-      segments.push_back(std::make_unique<SelectedTerms>(
-          std::move(files), format::TermSelection{.field = field, .text = prefix}));
-    }
+    AddSelectedTerms(format::OpenNewestSegments(folder, format::Need::kAll), {.field = field, .text = prefix},
+                     segments);
     try {
       MergedTerms terms(std::move(segments));
       for (std::string before; terms.Next(); before = terms.text()) {

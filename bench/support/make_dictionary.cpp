@@ -6,14 +6,11 @@
 // compressed by gzip.
 
 #include <lucene++/LuceneHeaders.h>
-// Not without the headers above.
-#include <lucene++/SerialMergeScheduler.h>
 #include <zlib.h>
 
 #include <cstdint>
 #include <cstdlib>
 #include <exception>
-#include <filesystem>
 #include <fstream>
 #include <iostream>
 #include <memory>
@@ -21,6 +18,8 @@
 #include <string>
 #include <string_view>
 #include <vector>
+
+#include "support/sized_index.h"
 
 namespace {
 
@@ -76,7 +75,7 @@ std::string ReadTexts(const std::string& path) {
   return texts;
 }
 
-Lucene::DocumentPtr MakeDocument(const Entry& entry, const std::string& texts, uint64_t number) {
+Lucene::DocumentPtr MakeDocument(const Entry& entry, const std::string& texts, int number) {
   const auto document = newLucene<Lucene::Document>();
   const auto add = [&](const String& name, const String& value, AbstractField::Index index,
                        AbstractField::TermVector vector) {
@@ -91,28 +90,15 @@ Lucene::DocumentPtr MakeDocument(const Entry& entry, const std::string& texts, u
   return document;
 }
 
-uint64_t SizeOf(const std::string& folder) {
-  uint64_t size = 0;
-  for (const auto& entry : std::filesystem::directory_iterator(folder)) size += entry.file_size();
-  return size;
-}
-
 void Write(const std::string& folder, const std::string& dictionary, uint64_t wanted) {
   const std::vector<Entry> entries = ReadEntries(dictionary + ".index");
   const std::string texts = ReadTexts(dictionary + ".dict.dz");
   for (const Entry& entry : entries) {
     if (entry.offset > texts.size()) throw std::runtime_error(dictionary + ": an entry lies past the texts");
   }
-  const auto writer = newLucene<Lucene::IndexWriter>(
-      Lucene::FSDirectory::open(StringUtils::toUnicode(folder)), newLucene<Lucene::WhitespaceAnalyzer>(),
-      true, Lucene::IndexWriter::MaxFieldLengthUNLIMITED);
-  writer->setMergeScheduler(newLucene<Lucene::SerialMergeScheduler>());
-  writer->setUseCompoundFile(false);
-  writer->setRAMBufferSizeMB(128);
-  for (uint64_t number = 0; number % 10000 != 0 || SizeOf(folder) < wanted; ++number) {
-    writer->addDocument(MakeDocument(entries[number % entries.size()], texts, number));
-  }
-  writer->close();
+  quorelastic::bench::WriteSizedIndex(folder, wanted, [&](int number) {
+    return MakeDocument(entries[static_cast<size_t>(number) % entries.size()], texts, number);
+  });
 }
 
 }  // namespace

@@ -3,16 +3,15 @@
 // index library alone, merged as its defaults have it.
 
 #include <lucene++/LuceneHeaders.h>
-// Not without the headers above.
-#include <lucene++/SerialMergeScheduler.h>
 
 #include <cmath>
 #include <cstdint>
 #include <cstdlib>
-#include <filesystem>
 #include <iostream>
 #include <random>
 #include <string>
+
+#include "support/sized_index.h"
 
 namespace {
 
@@ -58,12 +57,6 @@ Lucene::DocumentPtr MakeDocument(Words& words, int number) {
   return document;
 }
 
-uint64_t SizeOf(const std::string& folder) {
-  uint64_t size = 0;
-  for (const auto& entry : std::filesystem::directory_iterator(folder)) size += entry.file_size();
-  return size;
-}
-
 }  // namespace
 
 int main(int argc, char** argv) {
@@ -71,17 +64,8 @@ int main(int argc, char** argv) {
     std::cerr << "usage: make_documents FOLDER MEBIBYTES\n";
     return 2;
   }
-  const uint64_t wanted = std::strtoull(argv[2], nullptr, 10) * kMebibyte;
-  const auto writer = newLucene<Lucene::IndexWriter>(
-      Lucene::FSDirectory::open(StringUtils::toUnicode(argv[1])), newLucene<Lucene::WhitespaceAnalyzer>(),
-      true, Lucene::IndexWriter::MaxFieldLengthUNLIMITED);
-  writer->setMergeScheduler(newLucene<Lucene::SerialMergeScheduler>());
-  writer->setUseCompoundFile(false);
-  writer->setRAMBufferSizeMB(128);
   Words words;
-  for (int number = 0; number % 10000 != 0 || SizeOf(argv[1]) < wanted; ++number) {
-    writer->addDocument(MakeDocument(words, number));
-  }
-  writer->close();
+  quorelastic::bench::WriteSizedIndex(argv[1], std::strtoull(argv[2], nullptr, 10) * kMebibyte,
+                                      [&](int number) { return MakeDocument(words, number); });
   return 0;
 }

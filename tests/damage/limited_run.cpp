@@ -52,8 +52,6 @@ class Capture {
 
 }  // namespace
 
-int RunsEvery() { return kIsSanitized ? 10 : 1; }
-
 LimitedRun RunToolLimited(const std::vector<std::string>& arguments) {
   return RunLimited(QUORELASTIC_TOOL, arguments);
 }

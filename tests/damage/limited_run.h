@@ -20,7 +20,4 @@ LimitedRun RunLimited(const std::string& program, const std::vector<std::string>
 // The same for the tool.
 LimitedRun RunToolLimited(const std::vector<std::string>& arguments);
 
-// A run takes many times as long with a sanitizer: only each so many-th case is run then.
-int RunsEvery();
-
 }  // namespace quorelastic::testing

@@ -26,6 +26,7 @@
 #include "engine/check/health_shapes.h"
 #include "support/files.h"
 #include "support/run_size.h"
+#include "support/sanitized.h"
 #include "support/temporary_folder.h"
 #include "vantrel/elastic/library_setup.h"
 
@@ -223,7 +224,7 @@ INSTANTIATE_TEST_SUITE_P(, ReliabilityDamage, ::testing::ValuesIn(HealthShapes()
                          [](const auto& test) { return test.param.name; });
 
 TEST_P(ReliabilityDamage, EveryOfflineActionEndsByItselfOrByAnUncaughtException) {
-  const int damages = RunSize("QUORELASTIC_TOOL_DAMAGES", 24) / RunsEvery();
+  const int damages = RunSize("QUORELASTIC_TOOL_DAMAGES", 24) / kFewer;
   for (int i = 0; i < damages; ++i) {
     const std::vector<std::string> files = ListFolder(index_);
     const Damage damage = RandomDamageTo(index_, files[Below(files.size())], random_);
@@ -245,7 +246,7 @@ TEST_P(ReliabilityDamage, EveryOfflineActionEndsByItselfOrByAnUncaughtException)
 // An index without a manifest is checked as a whole before it is used, one with a manifest block by block: then nothing
 // but what was written is ever answered. Without a digest are the settings, and without a checksum older commits.
 TEST_P(ReliabilityDamage, SearchingAndMergingEndsInAnAnswerOrAnErrorOfTheEngine) {
-  const int damages = std::max(1, RunSize("QUORELASTIC_USE_DAMAGES", 8) / RunsEvery());
+  const int damages = std::max(1, RunSize("QUORELASTIC_USE_DAMAGES", 8) / kFewer);
   WriteSettings();
   const std::string manifest = ManifestOfIndex();
   std::map<size_t, std::string> intact;

@@ -11,6 +11,8 @@
 #include <string>
 #include <vector>
 
+#include "support/descriptor.h"
+
 namespace quorelastic::testing {
 
 // How many files a process has open; of this one, without what it takes to look.
@@ -25,11 +27,10 @@ inline size_t CountOpenFiles(pid_t process = getpid()) {
 class FewOpenFiles {
  public:
   explicit FewOpenFiles(size_t more) {
-    std::vector<int> next;
-    while (next.size() <= more) next.push_back(open("/dev/null", O_RDONLY | O_CLOEXEC));
-    for (const int descriptor : next) close(descriptor);
+    std::vector<Descriptor> next;
+    while (next.size() <= more) next.emplace_back(open("/dev/null", O_RDONLY | O_CLOEXEC));
     getrlimit(RLIMIT_NOFILE, &before_);
-    const rlimit lower = {static_cast<rlim_t>(next.back()), before_.rlim_max};
+    const rlimit lower = {static_cast<rlim_t>(next.back().get()), before_.rlim_max};
     setrlimit(RLIMIT_NOFILE, &lower);
   }
   FewOpenFiles(const FewOpenFiles&) = delete;

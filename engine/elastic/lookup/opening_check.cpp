@@ -103,11 +103,11 @@ void OpeningCheck::CheckCommit(const Source& source, int64_t generation) {
   if (FirstInt(source) < format::kNewestCommitFormat) return;
   format::Commit commit = ReadCommit(source, generation, format::CommitChecksum::kPassOver);
   segments_.reserve(commit.segments.size());
-  for (const SegmentInfo& segment : commit.segments) {
+  for (SegmentInfo& segment : commit.segments) {
     const uint64_t norms = segment.norm_generations.has_value() ? segment.norm_generations->size() : 0;
     CountMemory(source->name(), kPerSegment + kPerNormGeneration * norms);
+    segments_.push_back({.info = std::move(segment)});
   }
-  for (SegmentInfo& segment : commit.segments) segments_.push_back({.info = std::move(segment)});
 }
 
 // The library opens the files within on its own.

@@ -49,10 +49,8 @@ TEST(SelectedTermsTest, HoldsOnlyTheFilesOpenThatItStillReads) {
     index.Commit();
   }
   std::vector<std::unique_ptr<SelectedTerms>> walks;
-  for (auto& files : format::OpenNewestSegments(format::DiskFolder(folder.path()), format::Need::kAll)) {
-    walks.push_back(std::make_unique<SelectedTerms>(std::move(files),
-                                                    format::TermSelection{.field = "body", .text = "te"}));
-  }
+  AddSelectedTerms(format::OpenNewestSegments(format::DiskFolder(folder.path()), format::Need::kAll),
+                   {.field = "body", .text = "te"}, walks);
   ASSERT_EQ(walks.size(), static_cast<size_t>(kSegments));
   const std::map<std::string, int> expected = {{".tis", kSegments}, {".frq", 1}, {".del", 1}};
   EXPECT_EQ(OpenFilesByEnding(folder.path()), expected);

@@ -136,7 +136,8 @@ void TermText::AppendConverted(std::u16string_view units) {
   length_ += converted_.size();
 }
 
-// Whether what follows is ASCII, if it is no longer than the room behind the text.
+// Whether the text from `offset` on is ASCII. False also where it is empty, or longer than kSlack bytes: only two words are
+// read.
 bool TermText::IsShortAsciiFrom(size_t offset) const {
   static_assert(std::endian::native == std::endian::little, "the first byte of a word is its lowest");
   constexpr uint64_t kHighBits = 0x8080808080808080;
